@@ -1,0 +1,92 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <mutex>
+
+#include "support/Locker.h"
+#include "support/Status.h"
+
+namespace glimmet {
+
+class MediaTrack;
+
+/// One mono track of the document: signed 16-bit samples placed on the
+/// timeline at a first frame, with its own mute flag, selection flag and pan.
+///
+/// Every operation takes the channel's own lock, so the audio thread may read
+/// a channel while the GUI thread edits it. Edits that change the amount of
+/// data build a new array and swap it in; nothing is resized in place.
+class Channel {
+public:
+    static constexpr int8_t kPanLeft = -128;
+    static constexpr int8_t kPanMiddle = 0;
+    static constexpr int8_t kPanRight = 127;
+
+    Channel();
+    ~Channel();
+    Channel(const Channel&) = delete;
+    Channel& operator=(const Channel&) = delete;
+
+    /// Adopts samples (allocated with new[]) as this channel's data; false,
+    /// changing nothing, for a null pointer or a count below 1. Meant for a
+    /// freshly made channel: the first frame is left as it is.
+    bool SetTo(int16_t* samples, int64_t count);
+
+    /// Writes count samples of the channel's timeline from start into buffer:
+    /// zeros where the channel is silent. False for a null buffer, and for a
+    /// request that starts exactly at the end of the data ("what the....?").
+    bool FillBuffer(int16_t* buffer, int64_t start, int64_t count);
+
+    status_t InsertFrames(const int16_t* frames, int64_t count, int64_t at);
+    status_t ReplaceFrames(const int16_t* frames, int64_t count, int64_t from, int64_t to);
+    status_t RemoveFrames(int64_t from, int64_t to);
+
+    bool IsMuted();
+    void SetMuted(bool muted);
+    bool IsSelected();
+    void SetSelected(bool selected);
+    int8_t PanPosition();
+    /// Stores -128, 0 or 127 as given; any other value becomes 0.
+    void SetPanPosition(int8_t pan);
+
+    int64_t FirstFrame();
+    /// A negative offset is stored as 0.
+    void SetStartFrameOffset(int64_t first);
+    float FrameRate();
+    int64_t FrameCount();
+
+    /// The sample array itself, valid only while no edit runs (callers hold
+    /// the document lock). Null for a channel that never held data.
+    int16_t* Data();
+
+    /// Loading from a track stores the decoded rate here.
+    void SetFrameRate(float rate);
+
+private:
+    using SampleArray = std::unique_ptr<int16_t[]>;
+
+    /// An uninitialised array of count samples, or null when it cannot be had
+    /// (arrays are limited to 2^32 - 1 samples).
+    static SampleArray Allocate(int64_t count);
+    /// Copies count samples of the current array from index on; positions
+    /// outside the array read as 0.
+    void CopyOut(int16_t* destination, int64_t index, int64_t count) const;
+    void Install(SampleArray samples, int64_t count);
+    status_t InsertIntoData(const int16_t* frames, int64_t count, int64_t at);
+    status_t ReplaceInData(const int16_t* frames, int64_t count, int64_t from, int64_t to);
+    status_t ReplaceAll(const int16_t* frames, int64_t count, int64_t first);
+    int64_t End() const { return first_ + count_; }
+
+    // All fields are guarded by lock_.
+    SampleArray samples_;
+    int64_t count_ = 0;
+    int64_t first_ = 0;
+    float frameRate_ = 0;
+    bool selected_ = false;
+    bool muted_ = false;
+    int8_t pan_ = kPanMiddle;
+    Locker lock_;
+};
+
+}  // namespace glimmet

@@ -1,0 +1,363 @@
+#include "sound/ChannelManager.h"
+
+#include <algorithm>
+#include <cmath>
+#include <mutex>
+
+#include "sound/Channel.h"
+#include "sound/DocumentWindow.h"
+#include "sound/SoftClip.h"
+#include "support/Message.h"
+#include "support/MessageCodes.h"
+
+namespace glimmet {
+
+namespace {
+
+constexpr float kSampleScale = 3.0517578125e-05f;  // 1 / 32768
+constexpr float kOutputScale = 32767.0f;
+
+// One side of the mix: nothing heard gives silence, a single channel passes
+// unchanged (a lone full-scale channel is never bent), more go through the
+// soft-clipping curve. There is no division by the number of channels.
+inline float CombineSide(float sum, int32_t contributors)
+{
+    if (contributors == 0)
+        return 0.0f;
+    if (contributors == 1)
+        return sum;
+    return soft_clip(sum);
+}
+
+// Rounds to nearest as the processor does by default. A value outside the
+// 16-bit range stores the integer-indefinite value, -32768, as a 16-bit
+// integer store of the FPU does.
+inline int16_t ToSample(float value)
+{
+    const float scaled = value * kOutputScale;
+    if (!(scaled >= -32768.5f && scaled < 32767.5f))
+        return INT16_MIN;
+    return int16_t(std::lrintf(scaled));
+}
+
+}  // namespace
+
+ChannelManager::ChannelManager(DocumentWindow* window) : window_(window) {}
+
+ChannelManager::~ChannelManager() = default;
+
+void ChannelManager::AddChannel(Channel* channel)
+{
+    if (channel == nullptr)
+        return;
+    std::lock_guard guard(lock_);
+    channels_.emplace_back(channel);
+}
+
+bool ChannelManager::AddChannel(Channel* channel, int32_t index)
+{
+    if (channel == nullptr)
+        return false;
+    std::lock_guard guard(lock_);
+    if (index < 0 || size_t(index) > channels_.size())
+        return false;
+    channels_.emplace(channels_.begin() + index, channel);
+    return true;
+}
+
+std::unique_ptr<Channel> ChannelManager::RemoveChannel(Channel* channel)
+{
+    std::lock_guard guard(lock_);
+    auto found = std::find_if(channels_.begin(), channels_.end(),
+        [channel](const std::unique_ptr<Channel>& item) { return item.get() == channel; });
+    if (found == channels_.end() || channel == nullptr)
+        return nullptr;
+    std::unique_ptr<Channel> removed = std::move(*found);
+    channels_.erase(found);
+    return removed;
+}
+
+bool ChannelManager::RemoveChannelAt(int32_t index)
+{
+    std::lock_guard guard(lock_);
+    if (index < 0 || size_t(index) >= channels_.size())
+        return false;
+    channels_.erase(channels_.begin() + index);
+    return true;
+}
+
+int32_t ChannelManager::CountChannels()
+{
+    std::lock_guard guard(lock_);
+    return int32_t(channels_.size());
+}
+
+Channel* ChannelManager::ChannelAt(int32_t index)
+{
+    std::lock_guard guard(lock_);
+    if (index < 0 || size_t(index) >= channels_.size())
+        return nullptr;
+    return channels_[size_t(index)].get();
+}
+
+int32_t ChannelManager::IndexOf(Channel* channel)
+{
+    std::lock_guard guard(lock_);
+    for (size_t i = 0; i < channels_.size(); ++i) {
+        if (channels_[i].get() == channel)
+            return int32_t(i);
+    }
+    return -1;
+}
+
+int64_t ChannelManager::FrameCount()
+{
+    std::lock_guard guard(lock_);
+    return FrameCountLocked();
+}
+
+int64_t ChannelManager::FrameCountLocked()
+{
+    int64_t total = 0;
+    for (const std::unique_ptr<Channel>& channel : channels_)
+        total = std::max(total, channel->FirstFrame() + channel->FrameCount());
+    return total;
+}
+
+void ChannelManager::PostToWindow(uint32_t what, const char* field, int64_t value)
+{
+    if (window_ == nullptr)
+        return;
+    Message message(what);
+    if (field != nullptr)
+        message.AddInt64(field, value);
+    window_->PostMessage(message);
+}
+
+// The window hears only of values the manager chose on its own; a value
+// stored exactly as asked is not announced.
+void ChannelManager::SetRangeStart(int64_t frame)
+{
+    const int64_t total = FrameCount();
+    if (frame >= total) {
+        rangeStart_ = total - 1;
+        PostToWindow(kMsgRangeStartChanged, "range start", total - 1);
+    } else {
+        rangeStart_ = frame;
+    }
+    // The end follows the argument as passed, not the clamped start.
+    if (rangeStart_ > rangeEnd_) {
+        rangeEnd_ = frame;
+        PostToWindow(kMsgRangeEndChanged, "range end", frame);
+    }
+}
+
+void ChannelManager::SetRangeEnd(int64_t frame)
+{
+    const int64_t total = FrameCount();
+    if (frame >= total) {
+        rangeEnd_ = total - 1;
+        PostToWindow(kMsgRangeEndChanged, "range end", total - 1);
+    } else {
+        rangeEnd_ = frame;
+    }
+    if (rangeStart_ > rangeEnd_) {
+        rangeStart_ = frame;
+        PostToWindow(kMsgRangeStartChanged, "range start", frame);
+    }
+}
+
+void ChannelManager::SetLoop(bool loop)
+{
+    std::lock_guard guard(lock_);
+    loop_ = loop;
+}
+
+void ChannelManager::SetPlayMode(int32_t mode)
+{
+    std::lock_guard guard(lock_);
+    playMode_ = mode;
+}
+
+void ChannelManager::ResetCurrentFrame()
+{
+    std::lock_guard guard(lock_);
+    const int32_t mode = playMode_;
+    if (mode == kPlayAll || mode == kPlayRange || mode == kPlayVisible)
+        currentFrame_ = 0;
+}
+
+void ChannelManager::SetFrameRate(float rate)
+{
+    if (rate > 0)
+        frameRate_ = rate;
+}
+
+void ChannelManager::PlayRange(int64_t total, int64_t* start, int64_t* end)
+{
+    *start = 0;
+    *end = total - 1;
+    const int32_t mode = playMode_;
+    if (mode == kPlayRange) {
+        const int64_t rangeStart = rangeStart_;
+        const int64_t rangeEnd = rangeEnd_;
+        if (rangeStart >= 0 && rangeStart <= rangeEnd) {
+            *start = rangeStart;
+            *end = rangeEnd;
+        }
+    } else if (mode == kPlayVisible && window_ != nullptr) {
+        // The window thread may be waiting for the document lock that this
+        // thread holds, so its lock is only tried, never waited for.
+        if (window_->LockWithTimeout(kWindowLockTimeoutMicros)) {
+            window_->GetVisibleFrames(start, end);
+            window_->UnlockWindow();
+        }
+    }
+    if (*start < 0)
+        *start = 0;
+    if (*end < 0)
+        *end = 0;
+    if (*start >= total)
+        *start = total - 1;
+    if (*end >= total)
+        *end = total - 1;
+    if (*end < *start)
+        *end = *start;
+}
+
+int16_t* ChannelManager::ScratchFor(int32_t channelCount, int64_t frames)
+{
+    // Grows only when the buffer or the channel count grows, so a steady
+    // playback allocates nothing per buffer.
+    const size_t needed = size_t(channelCount) * size_t(frames);
+    if (scratch_.size() < needed)
+        scratch_.resize(needed);
+    if (leftSum_.size() < size_t(frames)) {
+        leftSum_.resize(size_t(frames));
+        rightSum_.resize(size_t(frames));
+    }
+    return scratch_.data();
+}
+
+void ChannelManager::FillScratch(int32_t channelCount, int64_t frames, int64_t from, int64_t offset, int64_t count)
+{
+    for (int32_t c = 0; c < channelCount; ++c) {
+        int16_t* part = scratch_.data() + size_t(c) * size_t(frames) + offset;
+        if (!channels_[size_t(c)]->FillBuffer(part, from, count))
+            std::fill_n(part, count, int16_t(0));
+    }
+}
+
+void ChannelManager::ZeroScratch(int32_t channelCount, int64_t frames, int64_t offset, int64_t count)
+{
+    for (int32_t c = 0; c < channelCount; ++c)
+        std::fill_n(scratch_.data() + size_t(c) * size_t(frames) + offset, count, int16_t(0));
+}
+
+void ChannelManager::SumChannels(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount)
+{
+    float* left = leftSum_.data();
+    float* right = rightSum_.data();
+    std::fill_n(left, frames, 0.0f);
+    std::fill_n(right, frames, 0.0f);
+    *leftCount = 0;
+    *rightCount = 0;
+    // Channels are added in list order for every frame, as a frame-by-frame
+    // walk would, so the float sums are the same.
+    for (int32_t c = 0; c < channelCount; ++c) {
+        Channel* channel = channels_[size_t(c)].get();
+        if (channel->IsMuted())
+            continue;
+        const int8_t pan = channel->PanPosition();
+        const bool toLeft = pan == Channel::kPanMiddle || pan == Channel::kPanLeft;
+        const bool toRight = pan == Channel::kPanMiddle || pan == Channel::kPanRight;
+        const int16_t* samples = scratch_.data() + size_t(c) * size_t(frames);
+        if (toLeft) {
+            ++*leftCount;
+            for (int64_t i = 0; i < frames; ++i)
+                left[i] += float(samples[i]) * kSampleScale;
+        }
+        if (toRight) {
+            ++*rightCount;
+            for (int64_t i = 0; i < frames; ++i)
+                right[i] += float(samples[i]) * kSampleScale;
+        }
+    }
+}
+
+bool ChannelManager::FillBuffer(float* out, int64_t frames)
+{
+    std::lock_guard guard(lock_);
+    const int64_t total = FrameCountLocked();
+    int64_t start = 0;
+    int64_t end = 0;
+    PlayRange(total, &start, &end);
+
+    int64_t current = currentFrame_;
+    if (current < start || current > end)
+        current = start;
+
+    const int32_t channelCount = int32_t(channels_.size());
+    if (frames <= 0)
+        return false;
+    if (current + frames > end && frames > end - start + 1) {
+        currentFrame_ = current;
+        return false;
+    }
+    ScratchFor(channelCount, frames);
+
+    if (current + frames <= end) {
+        FillScratch(channelCount, frames, current, 0, frames);
+        current += frames;
+    } else {
+        const int64_t head = end - current + 1;
+        const int64_t tail = frames - head;
+        FillScratch(channelCount, frames, current, 0, head);
+        if (Loop()) {
+            FillScratch(channelCount, frames, start, head, tail);
+            current = start + tail;
+        } else {
+            ZeroScratch(channelCount, frames, head, tail);
+            PostToWindow(kMsgStop);
+            current = end + 1;
+        }
+    }
+    currentFrame_ = current;
+
+    int32_t leftCount = 0;
+    int32_t rightCount = 0;
+    SumChannels(channelCount, frames, &leftCount, &rightCount);
+    for (int64_t i = 0; i < frames; ++i) {
+        out[2 * i] = CombineSide(leftSum_[size_t(i)], leftCount);
+        out[2 * i + 1] = CombineSide(rightSum_[size_t(i)], rightCount);
+    }
+    return true;
+}
+
+bool ChannelManager::FillBuffer(int16_t* out, int64_t* frames)
+{
+    std::lock_guard guard(lock_);
+    const int64_t total = FrameCountLocked();
+    const int64_t current = currentFrame_;
+    if (current >= total || *frames <= 0)
+        return false;
+    if (current + *frames >= total)
+        *frames = total - current;
+    const int64_t count = *frames;
+
+    const int32_t channelCount = int32_t(channels_.size());
+    ScratchFor(channelCount, count);
+    FillScratch(channelCount, count, current, 0, count);
+
+    int32_t leftCount = 0;
+    int32_t rightCount = 0;
+    SumChannels(channelCount, count, &leftCount, &rightCount);
+    for (int64_t i = 0; i < count; ++i) {
+        out[2 * i] = leftCount == 0 ? 0 : ToSample(CombineSide(leftSum_[size_t(i)], leftCount));
+        out[2 * i + 1] = rightCount == 0 ? 0 : ToSample(CombineSide(rightSum_[size_t(i)], rightCount));
+    }
+    currentFrame_ = current + count;
+    return true;
+}
+
+}  // namespace glimmet

@@ -1,0 +1,124 @@
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <vector>
+
+#include "support/Locker.h"
+
+namespace glimmet {
+
+class Channel;
+class DocumentWindow;
+
+/// The document's sound: its ordered channels, frame rate, range, play mode,
+/// loop flag and play position, and the mixer that turns the channels into
+/// stereo for playback (float) and for saving (16-bit).
+///
+/// The channel list is guarded by the document lock (Lock/Unlock). The range,
+/// current frame, play mode, loop flag and rate are plain values read without
+/// the lock from any thread; they are atomics so that reading them while the
+/// window thread writes them is well defined.
+class ChannelManager {
+public:
+    static constexpr int32_t kPlayAll = 0;
+    static constexpr int32_t kPlayRange = 1;
+    static constexpr int32_t kPlayVisible = 2;
+
+    /// How long the mixer tries the window's lock in the visible mode.
+    static constexpr int64_t kWindowLockTimeoutMicros = 100;
+
+    explicit ChannelManager(DocumentWindow* window);
+    ~ChannelManager();
+    ChannelManager(const ChannelManager&) = delete;
+    ChannelManager& operator=(const ChannelManager&) = delete;
+
+    /// The document lock. Unlock by a thread that does not hold it does nothing.
+    void Lock() { lock_.Lock(); }
+    void Unlock() { lock_.Unlock(); }
+    Locker& DocumentLock() { return lock_; }
+
+    /// Appends the channel; the manager owns it from now on. Null is ignored.
+    void AddChannel(Channel* channel);
+    /// Inserts the channel at index (0 to CountChannels()); the manager owns
+    /// it when this returns true. Out of range or null: false, nothing taken.
+    bool AddChannel(Channel* channel, int32_t index);
+    /// Takes the channel out of the list without deleting it; ownership goes
+    /// to the caller. Null when the channel is not in the list.
+    std::unique_ptr<Channel> RemoveChannel(Channel* channel);
+    /// Removes and deletes the channel at index; true if there was one.
+    bool RemoveChannelAt(int32_t index);
+    int32_t CountChannels();
+    /// Null when index is out of range.
+    Channel* ChannelAt(int32_t index);
+    int32_t IndexOf(Channel* channel);
+
+    /// The largest first frame + frame count over all channels; 0 without any.
+    int64_t FrameCount();
+
+    int64_t RangeStart() const { return rangeStart_.load(std::memory_order_relaxed); }
+    int64_t RangeEnd() const { return rangeEnd_.load(std::memory_order_relaxed); }
+    void SetRangeStart(int64_t frame);
+    void SetRangeEnd(int64_t frame);
+
+    bool Loop() const { return loop_.load(std::memory_order_relaxed); }
+    void SetLoop(bool loop);
+    int32_t PlayMode() const { return playMode_.load(std::memory_order_relaxed); }
+    void SetPlayMode(int32_t mode);
+
+    int64_t CurrentFrame() const { return currentFrame_.load(std::memory_order_relaxed); }
+    void SetCurrentFrame(int64_t frame) { currentFrame_.store(frame, std::memory_order_relaxed); }
+    void ResetCurrentFrame();
+
+    float FrameRate() const { return frameRate_.load(std::memory_order_relaxed); }
+    /// Only a rate above 0 is stored.
+    void SetFrameRate(float rate);
+
+    DocumentWindow* Window() const { return window_; }
+
+    /// Playback mix: frames interleaved stereo float frames from the current
+    /// frame within the play range, looping or posting a stop at its end.
+    /// False, writing nothing, when the play range is shorter than the buffer.
+    bool FillBuffer(float* out, int64_t frames);
+
+    /// Save mix: up to *frames interleaved stereo 16-bit frames from the
+    /// current frame to the end of the document; *frames becomes the number
+    /// produced. False when the current frame has reached the end.
+    bool FillBuffer(int16_t* out, int64_t* frames);
+
+private:
+    /// The channels' samples for one buffer, with how each one is heard.
+    struct MixSource {
+        const int16_t* samples;
+        bool left;
+        bool right;
+    };
+
+    int64_t FrameCountLocked();
+    void PlayRange(int64_t total, int64_t* start, int64_t* end);
+    int16_t* ScratchFor(int32_t channelCount, int64_t frames);
+    void FillScratch(int32_t channelCount, int64_t frames, int64_t from, int64_t offset, int64_t count);
+    void ZeroScratch(int32_t channelCount, int64_t frames, int64_t offset, int64_t count);
+    /// Sums the scratch arrays into the two sides; returns how many channels
+    /// are heard on the left and on the right.
+    void SumChannels(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount);
+    void PostToWindow(uint32_t what, const char* field = nullptr, int64_t value = 0);
+
+    // Guarded by lock_.
+    std::vector<std::unique_ptr<Channel>> channels_;
+    std::vector<int16_t> scratch_;
+    std::vector<float> leftSum_;
+    std::vector<float> rightSum_;
+
+    DocumentWindow* window_;
+    std::atomic<float> frameRate_{44100.0f};
+    std::atomic<int64_t> currentFrame_{0};
+    std::atomic<int32_t> playMode_{kPlayAll};
+    std::atomic<bool> loop_{true};
+    std::atomic<int64_t> rangeStart_{-1};
+    std::atomic<int64_t> rangeEnd_{-1};
+    Locker lock_;
+};
+
+}  // namespace glimmet

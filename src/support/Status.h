@@ -1,0 +1,44 @@
+#pragma once
+
+#include <cstdint>
+
+namespace glimmet {
+
+/// A 32-bit status code: 0 for success, negative for a failure. The numeric
+/// values are those of the platform the editor's diagnostics were first
+/// written for, because texts and tests compare them.
+using status_t = int32_t;
+
+inline constexpr status_t kGeneralErrorBase = INT32_MIN;
+inline constexpr status_t kMediaErrorBase = kGeneralErrorBase + 0x4000;
+inline constexpr status_t kStorageErrorBase = kGeneralErrorBase + 0x6000;
+
+inline constexpr status_t B_OK = 0;
+inline constexpr status_t B_ERROR = -1;
+inline constexpr status_t B_NO_MEMORY = kGeneralErrorBase + 0;
+inline constexpr status_t B_IO_ERROR = kGeneralErrorBase + 1;
+inline constexpr status_t B_PERMISSION_DENIED = kGeneralErrorBase + 2;
+inline constexpr status_t B_BAD_INDEX = kGeneralErrorBase + 3;
+inline constexpr status_t B_BAD_TYPE = kGeneralErrorBase + 4;
+inline constexpr status_t B_BAD_VALUE = kGeneralErrorBase + 5;
+inline constexpr status_t B_NAME_NOT_FOUND = kGeneralErrorBase + 7;
+inline constexpr status_t B_TIMED_OUT = kGeneralErrorBase + 9;
+inline constexpr status_t B_NO_INIT = kGeneralErrorBase + 13;
+inline constexpr status_t B_BAD_DATA = kGeneralErrorBase + 16;
+
+inline constexpr status_t B_ENTRY_NOT_FOUND = kStorageErrorBase + 3;
+inline constexpr status_t B_IS_A_DIRECTORY = kStorageErrorBase + 9;
+inline constexpr status_t B_DEVICE_FULL = kStorageErrorBase + 10;
+
+inline constexpr status_t B_MEDIA_BAD_FORMAT = kMediaErrorBase + 0x10;
+inline constexpr status_t B_MEDIA_NO_HANDLER = kMediaErrorBase + 0x1a;
+inline constexpr status_t B_LAST_BUFFER_ERROR = kMediaErrorBase + 0x24;
+inline constexpr status_t B_MEDIA_BAD_NODE = kMediaErrorBase + 0x101;
+inline constexpr status_t B_MEDIA_NOT_CONNECTED = kMediaErrorBase + 0x10a;
+
+/// The human-readable text of a status code, as printed by diagnostics
+/// ("Error doing undo: %s\n"). Never returns null; unknown codes get a
+/// generic text.
+const char* StatusText(status_t status);
+
+}  // namespace glimmet
