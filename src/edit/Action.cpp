@@ -1,0 +1,138 @@
+#include "edit/Action.h"
+
+#include <cstdint>
+#include <new>
+
+#include "edit/ChannelContainer.h"
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+
+namespace glimmet {
+
+Action::Action(MessageTarget* window) : window_(window) {}
+
+Action::~Action() = default;
+
+std::unique_ptr<int16_t[]> Action::AllocateSamples(int64_t count)
+{
+    if (count < 1 || count > int64_t(UINT32_MAX))
+        return nullptr;
+    return std::unique_ptr<int16_t[]>(new (std::nothrow) int16_t[size_t(count)]());
+}
+
+status_t Action::InitCheck()
+{
+    if (manager_ == nullptr || container_ == nullptr)
+        return B_NO_INIT;
+    return B_OK;
+}
+
+status_t Action::SetTo(ChannelManager* manager, ChannelContainer* container)
+{
+    if (manager == nullptr || container == nullptr)
+        return B_BAD_VALUE;
+    manager_ = manager;
+    rangeStart_ = manager->RangeStart();
+    rangeEnd_ = manager->RangeEnd();
+    container_ = container;
+    cursor_ = container->CursorFrame();
+    frameCount_ = rangeEnd_ - rangeStart_ + 1;
+    TakeSnapshot();
+    return B_OK;
+}
+
+void Action::TakeSnapshot()
+{
+    manager_->Lock();
+    savedChannels_.clear();
+    for (int32_t i = 0; Channel* channel = manager_->ChannelAt(i); i++) {
+        if (!channel->IsSelected())
+            continue;
+        SavedChannel record;
+        record.index = i;
+        record.data = AllocateSamples(frameCount_);
+        if (record.data != nullptr)
+            channel->FillBuffer(record.data.get(), rangeStart_, frameCount_);
+        savedChannels_.push_back(std::move(record));
+    }
+    manager_->Unlock();
+}
+
+int64_t Action::SnapshotBytes() const
+{
+    int64_t bytes = 0;
+    for (const SavedChannel& record : savedChannels_) {
+        if (record.data != nullptr)
+            bytes += frameCount_ * int64_t(sizeof(int16_t));
+    }
+    return bytes;
+}
+
+status_t Action::Go()
+{
+    return B_ERROR;
+}
+
+void Action::RestoreSelection(bool writeSamples)
+{
+    size_t next = 0;
+    for (int32_t i = 0; next < savedChannels_.size(); i++) {
+        Channel* channel = manager_->ChannelAt(i);
+        if (channel == nullptr)
+            break;
+        const SavedChannel& record = savedChannels_[next];
+        if (record.index != i) {
+            channel->SetSelected(false);
+            continue;
+        }
+        channel->SetSelected(true);
+        if (writeSamples && record.data != nullptr)
+            channel->ReplaceFrames(record.data.get(), frameCount_, rangeStart_, rangeEnd_);
+        next++;
+    }
+}
+
+void Action::RestoreRange()
+{
+    manager_->SetRangeStart(rangeStart_);
+    manager_->SetRangeEnd(rangeEnd_);
+}
+
+status_t Action::Undo()
+{
+    if (manager_ == nullptr)
+        return B_ERROR;
+    manager_->Lock();
+    RestoreSelection(true);
+    RestoreRange();
+    manager_->Unlock();
+    return B_OK;
+}
+
+status_t Action::Redo()
+{
+    if (manager_ == nullptr)
+        return B_ERROR;
+    manager_->Lock();
+    RestoreRange();
+    RestoreSelection(false);
+    manager_->Unlock();
+    return Go();
+}
+
+const char* Action::Name()
+{
+    return "Name of action goes here.";
+}
+
+const char* Action::PreferredMenu()
+{
+    return "Tools";
+}
+
+bool Action::SupportsConfiguration()
+{
+    return false;
+}
+
+}  // namespace glimmet

@@ -1,0 +1,92 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <vector>
+
+#include "support/Status.h"
+
+namespace glimmet {
+
+class ChannelContainer;
+class ChannelManager;
+class MessageTarget;
+
+/// One undoable change to a document.
+///
+/// SetTo binds the action to a document and takes a snapshot of the range of
+/// every selected channel; the base Undo writes that snapshot back and the
+/// base Redo restores range and selection and runs Go again. Actions run in
+/// the window's thread; everything that touches sound data takes the
+/// document lock (ChannelManager::Lock) for its sample work.
+class Action {
+public:
+    /// window receives the messages of the action's parameter dialog; it is
+    /// not owned and may be null for actions without a dialog.
+    explicit Action(MessageTarget* window);
+    virtual ~Action();
+    Action(const Action&) = delete;
+    Action& operator=(const Action&) = delete;
+
+    /// B_OK once SetTo bound a manager and a container, else B_NO_INIT.
+    virtual status_t InitCheck();
+    /// Binds the action and snapshots the range of every selected channel.
+    /// B_BAD_VALUE, changing nothing, when either pointer is null.
+    virtual status_t SetTo(ChannelManager* manager, ChannelContainer* container);
+    /// Performs the action; the base version does nothing and fails.
+    virtual status_t Go();
+    /// Writes the snapshot back and restores range and selection.
+    virtual status_t Undo();
+    /// Restores range and selection, then runs Go again.
+    virtual status_t Redo();
+    virtual const char* Name();
+    /// The menu the window lists the action's command under.
+    virtual const char* PreferredMenu();
+    /// True when the action asks for parameters in a dialog before it runs.
+    virtual bool SupportsConfiguration();
+
+    MessageTarget* Window() const { return window_; }
+    ChannelManager* Manager() const { return manager_; }
+    ChannelContainer* Container() const { return container_; }
+    int64_t RangeStart() const { return rangeStart_; }
+    int64_t RangeEnd() const { return rangeEnd_; }
+    int64_t Cursor() const { return cursor_; }
+    /// Frames in the range as stored at SetTo (range end - range start + 1).
+    int64_t FrameCount() const { return frameCount_; }
+    int32_t SavedChannelCount() const { return int32_t(savedChannels_.size()); }
+    /// Bytes of sample data the snapshot keeps.
+    int64_t SnapshotBytes() const;
+
+    /// A zeroed sample array of count samples, or null when count is not a
+    /// size a channel can hold (below 1 or above 2^32 - 1) or memory is short.
+    static std::unique_ptr<int16_t[]> AllocateSamples(int64_t count);
+
+protected:
+    /// One selected channel's range as it was at SetTo.
+    struct SavedChannel {
+        std::unique_ptr<int16_t[]> data;  // null when it could not be had
+        int32_t index = 0;                // position in the manager
+    };
+
+    /// Selects the recorded channels and deselects the other channels met
+    /// before the last record; with writeSamples, also puts the recorded
+    /// samples back over the range. Caller holds the document lock.
+    void RestoreSelection(bool writeSamples);
+    void RestoreRange();
+
+    const std::vector<SavedChannel>& SavedChannels() const { return savedChannels_; }
+
+private:
+    void TakeSnapshot();
+
+    MessageTarget* window_;
+    ChannelManager* manager_ = nullptr;
+    ChannelContainer* container_ = nullptr;
+    int64_t rangeStart_ = 0;
+    int64_t rangeEnd_ = 0;
+    int64_t cursor_ = 0;
+    std::vector<SavedChannel> savedChannels_;
+    int64_t frameCount_ = 0;
+};
+
+}  // namespace glimmet

@@ -1,0 +1,82 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <vector>
+
+#include "support/Locker.h"
+#include "support/Status.h"
+
+namespace glimmet {
+
+class Action;
+
+/// A document's undo and redo stacks.
+///
+/// The history is its own lock (the history lock): every operation holds it
+/// for its whole duration, including the call into the action, so the lock
+/// order is always history lock, then document lock. Both stacks grow
+/// without bound.
+class HistoryManager : public Locker {
+public:
+    HistoryManager();
+    ~HistoryManager();
+    HistoryManager(const HistoryManager&) = delete;
+    HistoryManager& operator=(const HistoryManager&) = delete;
+
+    /// Records an action that is about to be performed and discards
+    /// everything that could have been redone. The history owns the action
+    /// only when this returns B_OK; an action that fails its InitCheck is
+    /// returned to the caller untouched (its status is the result). B_ERROR
+    /// for null.
+    status_t AddAction(Action* action);
+
+    /// Takes back the last action; B_ERROR with nothing to undo. An action
+    /// whose Undo fails leaves the history for good.
+    status_t Undo();
+    /// Performs the last undone action again; B_ERROR with nothing to redo.
+    /// An action whose Redo fails leaves the history for good.
+    status_t Redo();
+
+    /// Name of the action Undo would take back; null when there is none.
+    const char* UndoName();
+    /// Name of the action Redo would perform; null when there is none.
+    const char* RedoName();
+
+    /// Deletes every recorded action. The saved marker is kept.
+    void Clear();
+    /// Marks the present state as the one on disk.
+    void Save();
+    /// True with nothing to undo, or when the last action is the one that
+    /// was on top when the document was last saved.
+    bool IsSaved();
+
+private:
+    /// A recorded action with the serial number it got when it was added.
+    /// The saved marker compares serials rather than addresses, so an action
+    /// deleted by Clear can never be mistaken for a new one.
+    struct Entry {
+        std::unique_ptr<Action> action;
+        uint64_t serial = 0;
+    };
+    using Stack = std::vector<Entry>;
+
+    static const char* TopName(const Stack& stack);
+    /// Pops the top of from, runs step on it and pushes it on to when step
+    /// succeeds; otherwise the action goes to the dropped list.
+    template <typename Step>
+    status_t Move(Stack& from, Stack& to, Step step);
+
+    // All fields are guarded by the history lock (this object).
+    Stack undoStack_;
+    Stack redoStack_;
+    /// Serial of the action on top of the undo stack at the last Save; 0
+    /// before any save that had something to mark.
+    uint64_t savedSerial_ = 0;
+    uint64_t nextSerial_ = 1;
+    /// Actions whose undo or redo failed: out of the history, but kept alive
+    /// as they were never deleted; freed with the history.
+    std::vector<std::unique_ptr<Action>> dropped_;
+};
+
+}  // namespace glimmet
