@@ -1,0 +1,601 @@
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cmath>
+#include <thread>
+#include <vector>
+
+#include "FakeDocumentWindow.h"
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+#include "sound/SoftClip.h"
+#include "support/MessageCodes.h"
+
+namespace glimmet {
+namespace {
+
+using Samples = std::vector<int16_t>;
+
+Channel* MakeChannel(const Samples& samples, int64_t first = 0, int8_t pan = 0)
+{
+    auto* channel = new Channel();
+    if (!samples.empty()) {
+        EXPECT_EQ(channel->InsertFrames(samples.data(), int64_t(samples.size()), first), B_OK);
+    }
+    channel->SetPanPosition(pan);
+    return channel;
+}
+
+// Frame i holds the value i (wrapping), so every frame tells where it came from.
+Samples Counting(int64_t count, int16_t offset = 0)
+{
+    Samples samples = Samples(size_t(count));
+    for (int64_t i = 0; i < count; ++i)
+        samples[size_t(i)] = int16_t(i + offset);
+    return samples;
+}
+
+float Level(int16_t sample) { return float(sample) / 32768.0f; }
+
+struct ManagerFixture : ::testing::Test {
+    FakeDocumentWindow window;
+    ChannelManager manager{&window};
+
+    std::vector<float> Mix(int64_t frames, bool* result = nullptr)
+    {
+        std::vector<float> out(size_t(frames) * 2, -9.0f);
+        const bool filled = manager.FillBuffer(out.data(), frames);
+        if (result != nullptr)
+            *result = filled;
+        return out;
+    }
+
+    // The left outputs of a mono channel at pan middle equal the samples.
+    void ExpectMonoFrames(const std::vector<float>& out, const Samples& expected)
+    {
+        ASSERT_EQ(out.size(), expected.size() * 2);
+        for (size_t i = 0; i < expected.size(); ++i) {
+            EXPECT_EQ(out[2 * i], Level(expected[i])) << "frame " << i;
+            EXPECT_EQ(out[2 * i + 1], Level(expected[i])) << "frame " << i;
+        }
+    }
+
+    std::vector<uint32_t> Codes()
+    {
+        std::vector<uint32_t> codes;
+        for (const Message& message : window.TakeMessages())
+            codes.push_back(message.what);
+        return codes;
+    }
+};
+
+TEST_F(ManagerFixture, InitialState)
+{
+    EXPECT_EQ(manager.FrameRate(), 44100.0f);
+    EXPECT_EQ(manager.CurrentFrame(), 0);
+    EXPECT_EQ(manager.PlayMode(), 0);
+    EXPECT_TRUE(manager.Loop());
+    EXPECT_EQ(manager.RangeStart(), -1);
+    EXPECT_EQ(manager.RangeEnd(), -1);
+    EXPECT_EQ(manager.CountChannels(), 0);
+    EXPECT_EQ(manager.FrameCount(), 0);
+}
+
+TEST_F(ManagerFixture, FrameCountIsTheLatestEnd)
+{
+    manager.AddChannel(MakeChannel(Counting(10), 0));
+    manager.AddChannel(MakeChannel(Counting(5), 20));
+    EXPECT_EQ(manager.FrameCount(), 25);
+}
+
+TEST_F(ManagerFixture, ChannelListOperations)
+{
+    Channel* a = MakeChannel(Counting(3));
+    Channel* b = MakeChannel(Counting(3));
+    Channel* c = MakeChannel(Counting(3));
+    manager.AddChannel(a);
+    manager.AddChannel(c);
+    EXPECT_TRUE(manager.AddChannel(b, 1));
+    EXPECT_EQ(manager.ChannelAt(0), a);
+    EXPECT_EQ(manager.ChannelAt(1), b);
+    EXPECT_EQ(manager.ChannelAt(2), c);
+    EXPECT_EQ(manager.ChannelAt(3), nullptr);
+    EXPECT_EQ(manager.ChannelAt(-1), nullptr);
+
+    Channel stranger;
+    EXPECT_FALSE(manager.AddChannel(&stranger, 7));
+    EXPECT_EQ(manager.RemoveChannel(&stranger), nullptr);
+    manager.AddChannel(nullptr);
+    EXPECT_EQ(manager.CountChannels(), 3);
+
+    std::unique_ptr<Channel> removed = manager.RemoveChannel(b);
+    EXPECT_EQ(removed.get(), b);
+    EXPECT_EQ(manager.CountChannels(), 2);
+    EXPECT_TRUE(manager.RemoveChannelAt(0));
+    EXPECT_FALSE(manager.RemoveChannelAt(5));
+    EXPECT_EQ(manager.ChannelAt(0), c);
+    EXPECT_EQ(manager.IndexOf(c), 0);
+    EXPECT_EQ(manager.IndexOf(b), -1);
+}
+
+TEST_F(ManagerFixture, FrameRateIgnoresNonPositiveValues)
+{
+    manager.SetFrameRate(0);
+    EXPECT_EQ(manager.FrameRate(), 44100.0f);
+    manager.SetFrameRate(-3);
+    manager.SetFrameRate(std::nanf(""));
+    EXPECT_EQ(manager.FrameRate(), 44100.0f);
+    manager.SetFrameRate(48000);
+    EXPECT_EQ(manager.FrameRate(), 48000.0f);
+}
+
+TEST_F(ManagerFixture, CurrentFrameIsStoredWithoutClamping)
+{
+    manager.SetCurrentFrame(-77);
+    EXPECT_EQ(manager.CurrentFrame(), -77);
+    manager.SetPlayMode(7);
+    EXPECT_EQ(manager.PlayMode(), 7);
+    manager.ResetCurrentFrame();
+    EXPECT_EQ(manager.CurrentFrame(), -77);
+    for (int32_t mode : {0, 1, 2}) {
+        manager.SetCurrentFrame(55);
+        manager.SetPlayMode(mode);
+        manager.ResetCurrentFrame();
+        EXPECT_EQ(manager.CurrentFrame(), 0);
+    }
+}
+
+TEST_F(ManagerFixture, RangeValuesStoredAsAskedAreNotAnnounced)
+{
+    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.SetRangeEnd(500);
+    manager.SetRangeStart(100);
+    EXPECT_EQ(manager.RangeStart(), 100);
+    EXPECT_EQ(manager.RangeEnd(), 500);
+    EXPECT_TRUE(window.TakeMessages().empty());
+}
+
+TEST_F(ManagerFixture, StartAboveTheEndPullsTheEndAlong)
+{
+    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.SetRangeStart(300);
+    EXPECT_EQ(manager.RangeEnd(), 300);
+    std::vector<Message> messages = window.TakeMessages();
+    ASSERT_EQ(messages.size(), 1u);
+    EXPECT_EQ(messages[0].what, kMsgRangeEndChanged);
+    int64_t value = 0;
+    EXPECT_EQ(messages[0].FindInt64("range end", &value), B_OK);
+    EXPECT_EQ(value, 300);
+}
+
+TEST_F(ManagerFixture, RangeStartPastTheEndIsClampedAndEndFollowsTheArgument)
+{
+    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.SetRangeEnd(-1);
+    window.TakeMessages();
+    manager.SetRangeStart(1010);
+    EXPECT_EQ(manager.RangeStart(), 999);
+    EXPECT_EQ(manager.RangeEnd(), 1010);
+    std::vector<Message> messages = window.TakeMessages();
+    ASSERT_EQ(messages.size(), 2u);
+    int64_t value = 0;
+    EXPECT_EQ(messages[0].what, kMsgRangeStartChanged);
+    EXPECT_EQ(messages[0].FindInt64("range start", &value), B_OK);
+    EXPECT_EQ(value, 999);
+    EXPECT_EQ(messages[1].what, kMsgRangeEndChanged);
+    EXPECT_EQ(messages[1].FindInt64("range end", &value), B_OK);
+    EXPECT_EQ(value, 1010);
+}
+
+TEST_F(ManagerFixture, RangeEndPastTheEndIsClampedAndStartFollowsTheArgument)
+{
+    manager.AddChannel(MakeChannel(Counting(100)));
+    manager.SetRangeStart(50);
+    window.TakeMessages();
+    manager.SetRangeEnd(20);
+    EXPECT_EQ(manager.RangeStart(), 20);
+    EXPECT_EQ(manager.RangeEnd(), 20);
+    std::vector<Message> messages = window.TakeMessages();
+    ASSERT_EQ(messages.size(), 1u);
+    EXPECT_EQ(messages[0].what, kMsgRangeStartChanged);
+
+    manager.SetRangeEnd(300);
+    EXPECT_EQ(manager.RangeEnd(), 99);
+    messages = window.TakeMessages();
+    ASSERT_EQ(messages.size(), 1u);
+    int64_t value = 0;
+    EXPECT_EQ(messages[0].what, kMsgRangeEndChanged);
+    EXPECT_EQ(messages[0].FindInt64("range end", &value), B_OK);
+    EXPECT_EQ(value, 99);
+}
+
+TEST_F(ManagerFixture, ClearingTheRange)
+{
+    manager.AddChannel(MakeChannel(Counting(100)));
+    manager.SetRangeStart(10);
+    manager.SetRangeEnd(20);
+    window.TakeMessages();
+    manager.SetRangeStart(-1);
+    manager.SetRangeEnd(-1);
+    EXPECT_EQ(manager.RangeStart(), -1);
+    EXPECT_EQ(manager.RangeEnd(), -1);
+    EXPECT_TRUE(window.TakeMessages().empty());
+}
+
+// Mixing --------------------------------------------------------------------
+
+TEST_F(ManagerFixture, EmptyDocument)
+{
+    EXPECT_EQ(manager.FrameCount(), 0);
+    bool filled = true;
+    std::vector<float> out = Mix(64, &filled);
+    EXPECT_FALSE(filled);
+    EXPECT_EQ(out, std::vector<float>(128, -9.0f));
+    EXPECT_EQ(manager.CurrentFrame(), -1);
+
+    // Saving starts from frame 0, which is already the end.
+    manager.SetCurrentFrame(0);
+    int16_t saved[8] = {1, 1, 1, 1, 1, 1, 1, 1};
+    int64_t frames = 4;
+    EXPECT_FALSE(manager.FillBuffer(saved, &frames));
+    EXPECT_EQ(frames, 4);
+    EXPECT_EQ(saved[0], 1);
+}
+
+TEST_F(ManagerFixture, OneFrameBufferOfTheEmptyDocumentLoopsInPlace)
+{
+    bool filled = false;
+    std::vector<float> out = Mix(1, &filled);
+    EXPECT_TRUE(filled);
+    EXPECT_EQ(out, std::vector<float>({0.0f, 0.0f}));
+    EXPECT_TRUE(Codes().empty());
+    EXPECT_EQ(manager.CurrentFrame(), -1);
+}
+
+TEST_F(ManagerFixture, OneFrameBufferOfTheEmptyDocumentStops)
+{
+    manager.SetLoop(false);
+    bool filled = false;
+    std::vector<float> out = Mix(1, &filled);
+    EXPECT_TRUE(filled);
+    EXPECT_EQ(out, std::vector<float>({0.0f, 0.0f}));
+    EXPECT_EQ(Codes(), std::vector<uint32_t>({kMsgStop}));
+}
+
+TEST_F(ManagerFixture, PanPositions)
+{
+    manager.AddChannel(MakeChannel({1000, -2000}, 0, Channel::kPanLeft));
+    manager.AddChannel(MakeChannel({300, 400}, 0, Channel::kPanRight));
+    std::vector<float> out = Mix(2);
+    EXPECT_EQ(out, std::vector<float>({Level(1000), Level(300), Level(-2000), Level(400)}));
+}
+
+TEST_F(ManagerFixture, MiddleGoesToBothSidesAndMutedToNone)
+{
+    manager.AddChannel(MakeChannel({1000, -2000}, 0, Channel::kPanMiddle));
+    Channel* muted = MakeChannel({5000, 5000}, 0, Channel::kPanMiddle);
+    muted->SetMuted(true);
+    manager.AddChannel(muted);
+    std::vector<float> out = Mix(2);
+    EXPECT_EQ(out, std::vector<float>({Level(1000), Level(1000), Level(-2000), Level(-2000)}));
+}
+
+TEST_F(ManagerFixture, OneFullScaleChannelIsNotBent)
+{
+    manager.AddChannel(MakeChannel({32767, 32767}));
+    std::vector<float> out = Mix(2);
+    for (float value : out)
+        EXPECT_EQ(value, 32767.0f / 32768.0f);
+}
+
+TEST_F(ManagerFixture, TwoContributorsGoThroughTheCurve)
+{
+    manager.AddChannel(MakeChannel({32767, 100}));
+    manager.AddChannel(MakeChannel({32767, 200}));
+    std::vector<float> out = Mix(2);
+    const float loud = soft_clip(32767.0f / 32768.0f + 32767.0f / 32768.0f);
+    EXPECT_EQ(out[0], loud);
+    EXPECT_EQ(out[1], loud);
+    EXPECT_NEAR(loud, soft_clip(1.99994f), 1e-6f);
+    const float quiet = Level(100) + Level(200);
+    EXPECT_EQ(out[2], quiet);
+    EXPECT_EQ(out[3], quiet);
+}
+
+TEST_F(ManagerFixture, OneSideWithOneContributorTheOtherWithTwo)
+{
+    manager.AddChannel(MakeChannel({20000}, 0, Channel::kPanLeft));
+    manager.AddChannel(MakeChannel({20000}, 0, Channel::kPanMiddle));
+    std::vector<float> out = Mix(1);
+    EXPECT_EQ(out[0], soft_clip(Level(20000) + Level(20000)));
+    EXPECT_EQ(out[1], Level(20000));
+}
+
+TEST_F(ManagerFixture, ChannelsStartingLateAreSilentBefore)
+{
+    manager.AddChannel(MakeChannel(Counting(4, 1), 2, Channel::kPanLeft));
+    manager.AddChannel(MakeChannel(Counting(6, 10), 0, Channel::kPanRight));
+    std::vector<float> out = Mix(6);
+    const std::vector<float> expected = {0, Level(10), 0, Level(11), Level(1), Level(12), Level(2), Level(13),
+        Level(3), Level(14), Level(4), Level(15)};
+    EXPECT_EQ(out, expected);
+}
+
+TEST_F(ManagerFixture, AllModeWalksTheDocumentInBuffers)
+{
+    manager.AddChannel(MakeChannel(Counting(200)));
+    manager.SetLoop(false);
+    Samples all = Counting(200);
+    ExpectMonoFrames(Mix(64), Samples(all.begin(), all.begin() + 64));
+    EXPECT_EQ(manager.CurrentFrame(), 64);
+    ExpectMonoFrames(Mix(64), Samples(all.begin() + 64, all.begin() + 128));
+    ExpectMonoFrames(Mix(64), Samples(all.begin() + 128, all.begin() + 192));
+    EXPECT_TRUE(Codes().empty());
+    Samples last(all.begin() + 192, all.end());
+    last.resize(64, 0);
+    ExpectMonoFrames(Mix(64), last);
+    EXPECT_EQ(manager.CurrentFrame(), 200);
+    EXPECT_EQ(Codes(), std::vector<uint32_t>({kMsgStop}));
+    // Past the end the next buffer starts over until the window stops.
+    ExpectMonoFrames(Mix(64), Samples(all.begin(), all.begin() + 64));
+}
+
+TEST_F(ManagerFixture, ABufferEndingExactlyAtTheEndStops)
+{
+    manager.AddChannel(MakeChannel(Counting(128)));
+    manager.SetLoop(false);
+    Mix(64);
+    ExpectMonoFrames(Mix(64), Counting(64, 64));
+    EXPECT_EQ(manager.CurrentFrame(), 128);
+    EXPECT_EQ(Codes(), std::vector<uint32_t>({kMsgStop}));
+}
+
+TEST_F(ManagerFixture, RangeModeLooping)
+{
+    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.SetRangeStart(100);
+    manager.SetRangeEnd(199);
+    manager.SetPlayMode(ChannelManager::kPlayRange);
+    manager.SetCurrentFrame(0);
+    window.TakeMessages();
+    ExpectMonoFrames(Mix(64), Counting(64, 100));
+    EXPECT_EQ(manager.CurrentFrame(), 164);
+    Samples expected = Counting(36, 164);
+    Samples wrapped = Counting(28, 100);
+    expected.insert(expected.end(), wrapped.begin(), wrapped.end());
+    ExpectMonoFrames(Mix(64), expected);
+    EXPECT_EQ(manager.CurrentFrame(), 128);
+    EXPECT_TRUE(Codes().empty());
+}
+
+TEST_F(ManagerFixture, RangeModeNotLooping)
+{
+    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.SetRangeStart(100);
+    manager.SetRangeEnd(199);
+    manager.SetPlayMode(ChannelManager::kPlayRange);
+    manager.SetLoop(false);
+    window.TakeMessages();
+    Mix(64);
+    Samples expected = Counting(36, 164);
+    expected.resize(64, 0);
+    ExpectMonoFrames(Mix(64), expected);
+    EXPECT_EQ(manager.CurrentFrame(), 200);
+    EXPECT_EQ(Codes(), std::vector<uint32_t>({kMsgStop}));
+}
+
+TEST_F(ManagerFixture, RangeModeWithoutRangePlaysEverything)
+{
+    manager.AddChannel(MakeChannel(Counting(300)));
+    manager.SetPlayMode(ChannelManager::kPlayRange);
+    EXPECT_EQ(manager.RangeStart(), -1);
+    manager.SetCurrentFrame(250);
+    ExpectMonoFrames(Mix(40), Counting(40, 250));
+}
+
+TEST_F(ManagerFixture, RangeShorterThanTheBuffer)
+{
+    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.SetRangeStart(10);
+    manager.SetRangeEnd(20);
+    manager.SetPlayMode(ChannelManager::kPlayRange);
+    bool filled = true;
+    std::vector<float> out = Mix(64, &filled);
+    EXPECT_FALSE(filled);
+    EXPECT_EQ(out, std::vector<float>(128, -9.0f));
+    EXPECT_EQ(manager.CurrentFrame(), 10);
+    // A buffer exactly as long as the range is played and ends it.
+    manager.SetLoop(false);
+    window.TakeMessages();
+    ExpectMonoFrames(Mix(11), Counting(11, 10));
+    EXPECT_EQ(Codes(), std::vector<uint32_t>({kMsgStop}));
+}
+
+TEST_F(ManagerFixture, VisibleModeAsksTheWindowWhenItsLockIsFree)
+{
+    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.SetPlayMode(ChannelManager::kPlayVisible);
+    window.visibleFirst = 300;
+    window.visibleLast = 399;
+    ExpectMonoFrames(Mix(32), Counting(32, 300));
+    ASSERT_FALSE(window.LockTimeouts().empty());
+    EXPECT_EQ(window.LockTimeouts().back(), 100);
+    EXPECT_FALSE(window.windowLock.IsLockedByCurrentThread());
+}
+
+TEST_F(ManagerFixture, VisibleModeFallsBackToTheDocumentWhenTheWindowIsBusy)
+{
+    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.SetPlayMode(ChannelManager::kPlayVisible);
+    window.visibleFirst = 300;
+    window.visibleLast = 399;
+    std::atomic<bool> held{false};
+    std::atomic<bool> release{false};
+    std::thread holder([&] {
+        window.windowLock.Lock();
+        held = true;
+        while (!release)
+            std::this_thread::yield();
+        window.windowLock.Unlock();
+    });
+    while (!held)
+        std::this_thread::yield();
+    manager.SetCurrentFrame(500);
+    ExpectMonoFrames(Mix(32), Counting(32, 500));
+    release = true;
+    holder.join();
+}
+
+TEST_F(ManagerFixture, VisibleRangeIsClampedToTheDocument)
+{
+    manager.AddChannel(MakeChannel(Counting(100)));
+    manager.SetPlayMode(ChannelManager::kPlayVisible);
+    manager.SetLoop(true);
+    window.visibleFirst = -50;
+    window.visibleLast = 5000;
+    manager.SetCurrentFrame(90);
+    Samples expected = Counting(10, 90);
+    Samples wrapped = Counting(6, 0);
+    expected.insert(expected.end(), wrapped.begin(), wrapped.end());
+    ExpectMonoFrames(Mix(16), expected);
+    EXPECT_EQ(manager.CurrentFrame(), 6);
+}
+
+TEST_F(ManagerFixture, SaveMixConvertsAndReportsShortLastBuffer)
+{
+    manager.AddChannel(MakeChannel({32767, -32768, 1, 0, 16384}, 0, Channel::kPanLeft));
+    int16_t out[8];
+    int64_t frames = 4;
+    EXPECT_TRUE(manager.FillBuffer(out, &frames));
+    EXPECT_EQ(frames, 4);
+    const int16_t expected[8] = {32766, 0, -32767, 0, 1, 0, 0, 0};
+    for (int i = 0; i < 8; ++i)
+        EXPECT_EQ(out[i], expected[i]) << i;
+    frames = 4;
+    EXPECT_TRUE(manager.FillBuffer(out, &frames));
+    EXPECT_EQ(frames, 1);
+    EXPECT_EQ(out[0], 16384);  // 0.5 * 32767 = 16383.5 rounds to even
+    EXPECT_EQ(out[1], 0);
+    frames = 4;
+    EXPECT_FALSE(manager.FillBuffer(out, &frames));
+}
+
+TEST_F(ManagerFixture, SaveMixIgnoresModeRangeAndLoop)
+{
+    manager.AddChannel(MakeChannel(Counting(50)));
+    manager.SetRangeStart(10);
+    manager.SetRangeEnd(20);
+    manager.SetPlayMode(ChannelManager::kPlayRange);
+    manager.SetCurrentFrame(30);
+    std::vector<int16_t> out(200);
+    int64_t frames = 100;
+    EXPECT_TRUE(manager.FillBuffer(out.data(), &frames));
+    EXPECT_EQ(frames, 20);
+    for (int64_t i = 0; i < frames; ++i)
+        EXPECT_EQ(out[size_t(2 * i)], int16_t(std::lrintf(Level(int16_t(30 + i)) * 32767.0f)));
+    EXPECT_EQ(manager.CurrentFrame(), 50);
+}
+
+TEST_F(ManagerFixture, SaveMixOfManyLoudChannels)
+{
+    for (int i = 0; i < 4; ++i)
+        manager.AddChannel(MakeChannel({32767, 8000}));
+    int16_t out[4];
+    int64_t frames = 2;
+    EXPECT_TRUE(manager.FillBuffer(out, &frames));
+    // Four full-scale channels fold the curve below -1: out of the 16-bit
+    // range the conversion stores -32768.
+    EXPECT_LT(soft_clip(4 * Level(32767)) * 32767.0f, -32768.5f);
+    EXPECT_EQ(out[0], -32768);
+    EXPECT_EQ(out[2], int16_t(std::lrintf(soft_clip(4 * Level(8000)) * 32767.0f)));
+}
+
+TEST_F(ManagerFixture, RemovedChannelsAreNotMixedAndDeletedOnesFreed)
+{
+    manager.AddChannel(MakeChannel({100}));
+    Channel* second = MakeChannel({200});
+    manager.AddChannel(second);
+    std::unique_ptr<Channel> kept = manager.RemoveChannel(second);
+    ExpectMonoFrames(Mix(1), {100});
+}
+
+// Edits on one thread while another mixes, as the window and the audio
+// thread do; run under ThreadSanitizer in CI.
+TEST(ChannelManagerStress, MixingWhileEditing)
+{
+    FakeDocumentWindow window;
+    ChannelManager manager(&window);
+    manager.AddChannel(MakeChannel(Counting(20000)));
+    manager.AddChannel(MakeChannel(Counting(15000), 300, Channel::kPanLeft));
+    manager.SetPlayMode(ChannelManager::kPlayVisible);
+    window.visibleFirst = 0;
+    window.visibleLast = 30000;
+
+    std::atomic<bool> stop{false};
+    std::atomic<int64_t> buffers{0};
+    std::thread mixer([&] {
+        std::vector<float> out(512);
+        while (!stop) {
+            manager.FillBuffer(out.data(), 256);
+            ++buffers;
+        }
+    });
+
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(2);
+    uint32_t seed = 12345;
+    auto next = [&seed] {
+        seed = seed * 1664525u + 1013904223u;
+        return seed >> 8;
+    };
+    const Samples block = Counting(700);
+    int64_t edits = 0;
+    while (std::chrono::steady_clock::now() < deadline) {
+        manager.Lock();
+        const int32_t count = manager.CountChannels();
+        Channel* channel = count > 0 ? manager.ChannelAt(int32_t(next() % uint32_t(count))) : nullptr;
+        switch (next() % 6) {
+            case 0:
+                if (channel != nullptr)
+                    channel->InsertFrames(block.data(), 1 + next() % 700, next() % 20000);
+                break;
+            case 1:
+                if (channel != nullptr) {
+                    const int64_t from = next() % 20000;
+                    channel->ReplaceFrames(block.data(), 1 + next() % 700, from, from + next() % 900);
+                }
+                break;
+            case 2:
+                if (channel != nullptr) {
+                    const int64_t from = next() % 20000;
+                    channel->RemoveFrames(from, from + next() % 900);
+                }
+                break;
+            case 3:
+                if (count < 8)
+                    manager.AddChannel(MakeChannel(Counting(1 + next() % 5000), next() % 3000));
+                break;
+            case 4:
+                if (count > 1)
+                    manager.RemoveChannelAt(int32_t(next() % uint32_t(count)));
+                break;
+            default:
+                if (channel != nullptr) {
+                    channel->SetMuted(next() % 2 == 0);
+                    channel->SetPanPosition(int8_t(next() % 3 == 0 ? -128 : 0));
+                }
+                manager.SetPlayMode(int32_t(next() % 3));
+                manager.SetRangeStart(next() % 10000);
+                manager.SetRangeEnd(10000 + next() % 10000);
+                break;
+        }
+        manager.Unlock();
+        ++edits;
+    }
+    stop = true;
+    mixer.join();
+    EXPECT_GT(buffers.load(), 0);
+    EXPECT_GT(edits, 0);
+}
+
+}  // namespace
+}  // namespace glimmet
