@@ -1,6 +1,7 @@
 #include "edit/Action.h"
 
 #include <cstdint>
+#include <mutex>
 #include <new>
 
 #include "edit/ChannelContainer.h"
@@ -66,6 +67,30 @@ int64_t Action::SnapshotBytes() const
             bytes += frameCount_ * int64_t(sizeof(int16_t));
     }
     return bytes;
+}
+
+status_t Action::TransformSelectedRanges(const RangeTransform& transform, bool writeBack)
+{
+    // A range that ends before it starts has no frames: every channel
+    // operation below then refuses it and nothing changes.
+    std::unique_ptr<int16_t[]> buffer;
+    if (frameCount_ >= 1) {
+        buffer = AllocateSamples(frameCount_);
+        if (buffer == nullptr)
+            return B_NO_MEMORY;
+    }
+    std::lock_guard guard(manager_->DocumentLock());
+    if (buffer == nullptr)
+        return B_OK;
+    for (int32_t i = 0; Channel* channel = manager_->ChannelAt(i); i++) {
+        if (!channel->IsSelected())
+            continue;
+        channel->FillBuffer(buffer.get(), rangeStart_, frameCount_);
+        transform(buffer.get(), frameCount_);
+        if (writeBack)
+            channel->ReplaceFrames(buffer.get(), frameCount_, rangeStart_, rangeEnd_);
+    }
+    return B_OK;
 }
 
 status_t Action::Go()

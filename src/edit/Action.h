@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <vector>
 
@@ -75,6 +76,19 @@ protected:
     void RestoreRange();
 
     const std::vector<SavedChannel>& SavedChannels() const { return savedChannels_; }
+
+    /// Rewrites the samples of one channel's range in place.
+    using RangeTransform = std::function<void(int16_t* samples, int64_t count)>;
+
+    /// The common frame of the in-place transforms: for every selected
+    /// channel in order, copies the stored range into one working buffer
+    /// (allocated once, zeroed, and reused from channel to channel, so a
+    /// channel whose copy fails gets what the previous one left there),
+    /// runs transform on it and, with writeBack, writes it over the range.
+    /// Takes the document lock for the whole run; the caller may hold it
+    /// already to make several passes one step. B_NO_MEMORY, changing
+    /// nothing, when no buffer of the range's size can be had.
+    status_t TransformSelectedRanges(const RangeTransform& transform, bool writeBack = true);
 
 private:
     void TakeSnapshot();
