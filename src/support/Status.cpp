@@ -25,6 +25,10 @@ const char* StatusText(status_t status)
         case B_LAST_BUFFER_ERROR: return "Last buffer";
         case B_MEDIA_BAD_NODE: return "Bad media node";
         case B_MEDIA_NOT_CONNECTED: return "Media nodes not connected";
+        case B_MEDIA_SYSTEM_FAILURE: return "Media system failure";
+        case B_MEDIA_BAD_SOURCE: return "Bad media source";
+        case B_MEDIA_BAD_DESTINATION: return "Bad media destination";
+        case B_MEDIA_ALREADY_CONNECTED: return "Media nodes already connected";
         default: return "Unknown error";
     }
 }

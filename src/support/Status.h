@@ -35,6 +35,10 @@ inline constexpr status_t B_MEDIA_NO_HANDLER = kMediaErrorBase + 0x1a;
 inline constexpr status_t B_LAST_BUFFER_ERROR = kMediaErrorBase + 0x24;
 inline constexpr status_t B_MEDIA_BAD_NODE = kMediaErrorBase + 0x101;
 inline constexpr status_t B_MEDIA_NOT_CONNECTED = kMediaErrorBase + 0x10a;
+inline constexpr status_t B_MEDIA_SYSTEM_FAILURE = kMediaErrorBase + 0x100;
+inline constexpr status_t B_MEDIA_BAD_SOURCE = kMediaErrorBase + 0x107;
+inline constexpr status_t B_MEDIA_BAD_DESTINATION = kMediaErrorBase + 0x108;
+inline constexpr status_t B_MEDIA_ALREADY_CONNECTED = kMediaErrorBase + 0x109;
 
 /// The human-readable text of a status code, as printed by diagnostics
 /// ("Error doing undo: %s\n"). Never returns null; unknown codes get a

@@ -1,0 +1,80 @@
+#include "playback/PlaymarkRelay.h"
+
+#include <sys/eventfd.h>
+#include <unistd.h>
+
+#include <QSocketNotifier>
+
+#include "support/Message.h"
+#include "support/MessageCodes.h"
+#include "support/MessageTarget.h"
+
+namespace glimmet {
+
+PlaymarkRelay::PlaymarkRelay(MessageTarget* window) : window_(window)
+{
+    wakeFd_ = eventfd(0, EFD_NONBLOCK | EFD_CLOEXEC);
+    if (wakeFd_ >= 0) {
+        notifier_ = std::make_unique<QSocketNotifier>(wakeFd_, QSocketNotifier::Read);
+        QObject::connect(notifier_.get(), &QSocketNotifier::activated, [this] { Drain(); });
+    }
+}
+
+PlaymarkRelay::~PlaymarkRelay()
+{
+    notifier_.reset();
+    if (wakeFd_ >= 0)
+        close(wakeFd_);
+}
+
+void PlaymarkRelay::Post(int64_t currentFrame, int64_t time)
+{
+    const size_t head = head_.load(std::memory_order_relaxed);
+    const size_t tail = tail_.load(std::memory_order_acquire);
+    if (head - tail >= kCapacity) {
+        dropped_.fetch_add(1, std::memory_order_relaxed);
+        return;
+    }
+    ring_[head % kCapacity] = Update{currentFrame, time};
+    head_.store(head + 1);
+    // Only the first update after a drain needs to wake the window.
+    if (!wakePending_.exchange(true))
+        Wake();
+}
+
+void PlaymarkRelay::Wake()
+{
+    if (wakeFd_ < 0)
+        return;
+    const uint64_t one = 1;
+    // A full counter already means "wake up"; nothing to do on failure.
+    [[maybe_unused]] ssize_t written = write(wakeFd_, &one, sizeof one);
+}
+
+void PlaymarkRelay::Drain()
+{
+    if (wakeFd_ >= 0) {
+        uint64_t count = 0;
+        [[maybe_unused]] ssize_t got = read(wakeFd_, &count, sizeof count);
+    }
+    // Cleared before reading the ring: an update stored after this point
+    // either is read below or wakes us again.
+    // Sequentially consistent on both sides, so that this store and the
+    // producer's head store cannot both be missed.
+    wakePending_.store(false);
+    size_t tail = tail_.load(std::memory_order_relaxed);
+    const size_t head = head_.load();
+    while (tail != head) {
+        const Update update = ring_[tail % kCapacity];
+        ++tail;
+        tail_.store(tail, std::memory_order_release);
+        if (window_ != nullptr) {
+            Message message(kMsgUpdatePlaymark);
+            message.AddInt64("current frame", update.currentFrame);
+            message.AddInt64("time", update.time);
+            window_->PostMessage(message);
+        }
+    }
+}
+
+}  // namespace glimmet
