@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <mutex>
+#include <type_traits>
 
 #include "sound/Channel.h"
 #include "sound/DocumentWindow.h"
@@ -17,27 +18,118 @@ namespace {
 constexpr float kSampleScale = 3.0517578125e-05f;  // 1 / 32768
 constexpr float kOutputScale = 32767.0f;
 
-// One side of the mix: nothing heard gives silence, a single channel passes
-// unchanged (a lone full-scale channel is never bent), more go through the
-// soft-clipping curve. There is no division by the number of channels.
-inline float CombineSide(float sum, int32_t contributors)
-{
-    if (contributors == 0)
-        return 0.0f;
-    if (contributors == 1)
-        return sum;
-    return soft_clip(sum);
-}
+// Every channel sample enters the mix as s / 32768, and such values add up
+// exactly in single precision as long as no partial sum reaches 512 in
+// magnitude: with fewer than 512 contributors per side the float sum in
+// channel order equals the integer sum of the samples, scaled once. The mix
+// therefore sums integers, which is exact and fast, and scales at the end.
+constexpr int32_t kExactIntegerSumLimit = 511;
 
-// Rounds to nearest as the processor does by default. A value outside the
-// 16-bit range stores the integer-indefinite value, -32768, as a 16-bit
-// integer store of the FPU does.
+// Rounds to nearest even as the processor does by default, and stores the
+// integer-indefinite value -32768 for anything outside the 16-bit range, as
+// a 16-bit integer store of the FPU does. Written without branches or calls
+// so that the conversion loop vectorises; adding and removing 1.5 * 2^23
+// rounds exactly for every magnitude that passes the range test.
 inline int16_t ToSample(float value)
 {
     const float scaled = value * kOutputScale;
-    if (!(scaled >= -32768.5f && scaled < 32767.5f))
-        return INT16_MIN;
-    return int16_t(std::lrintf(scaled));
+    const bool inRange = scaled >= -32768.5f && scaled < 32767.5f;
+    constexpr float kRoundingMagic = 12582912.0f;
+    const float rounded = (scaled + kRoundingMagic) - kRoundingMagic;
+    return int16_t(int32_t(inRange ? rounded : -32768.0f));
+}
+
+// How one side of the mix is heard: nothing heard gives silence, a single
+// channel passes unchanged (a lone full-scale channel is never bent), more go
+// through the soft-clipping curve. There is no division by the number of
+// channels.
+enum class SideMode { kSilent, kSingle, kCurve };
+
+SideMode ModeFor(int32_t contributors)
+{
+    if (contributors == 0)
+        return SideMode::kSilent;
+    return contributors == 1 ? SideMode::kSingle : SideMode::kCurve;
+}
+
+template <SideMode mode>
+inline float SideValue(float sum)
+{
+    if constexpr (mode == SideMode::kSilent)
+        return 0.0f;
+    else if constexpr (mode == SideMode::kSingle)
+        return sum;
+    else
+        return soft_clip(sum);
+}
+
+// The last pass of a mix: scale the integer sums, combine each side and
+// interleave. One instance per pair of side modes keeps the loop free of
+// branches, so the common cases vectorise.
+template <SideMode left, SideMode right>
+void WriteFrames(const int32_t* leftSums, const int32_t* rightSums, int64_t frames, float* out)
+{
+    for (int64_t i = 0; i < frames; ++i) {
+        out[2 * i] = SideValue<left>(float(leftSums[i]) * kSampleScale);
+        out[2 * i + 1] = SideValue<right>(float(rightSums[i]) * kSampleScale);
+    }
+}
+
+template <SideMode left, SideMode right>
+void WriteFrames(const int32_t* leftSums, const int32_t* rightSums, int64_t frames, int16_t* out)
+{
+    for (int64_t i = 0; i < frames; ++i) {
+        out[2 * i] = ToSample(SideValue<left>(float(leftSums[i]) * kSampleScale));
+        out[2 * i + 1] = ToSample(SideValue<right>(float(rightSums[i]) * kSampleScale));
+    }
+}
+
+template <typename Sample, SideMode left>
+void WriteFramesFor(SideMode right, const int32_t* leftSums, const int32_t* rightSums, int64_t frames, Sample* out)
+{
+    switch (right) {
+        case SideMode::kSilent: WriteFrames<left, SideMode::kSilent>(leftSums, rightSums, frames, out); break;
+        case SideMode::kSingle: WriteFrames<left, SideMode::kSingle>(leftSums, rightSums, frames, out); break;
+        case SideMode::kCurve: WriteFrames<left, SideMode::kCurve>(leftSums, rightSums, frames, out); break;
+    }
+}
+
+template <typename Sample>
+void WriteMix(int32_t leftCount, int32_t rightCount, const int32_t* leftSums, const int32_t* rightSums,
+    int64_t frames, Sample* out)
+{
+    const SideMode right = ModeFor(rightCount);
+    switch (ModeFor(leftCount)) {
+        case SideMode::kSilent:
+            WriteFramesFor<Sample, SideMode::kSilent>(right, leftSums, rightSums, frames, out);
+            break;
+        case SideMode::kSingle:
+            WriteFramesFor<Sample, SideMode::kSingle>(right, leftSums, rightSums, frames, out);
+            break;
+        case SideMode::kCurve:
+            WriteFramesFor<Sample, SideMode::kCurve>(right, leftSums, rightSums, frames, out);
+            break;
+    }
+}
+
+// The generic side value, for the crowded documents mixed in float.
+float CombineSide(float sum, int32_t contributors)
+{
+    if (contributors == 0)
+        return 0.0f;
+    return contributors == 1 ? sum : soft_clip(sum);
+}
+
+void AddSamples(const int16_t* samples, int64_t frames, int32_t* sums)
+{
+    for (int64_t i = 0; i < frames; ++i)
+        sums[i] += samples[i];
+}
+
+void CopySamples(const int16_t* samples, int64_t frames, int32_t* sums)
+{
+    for (int64_t i = 0; i < frames; ++i)
+        sums[i] = samples[i];
 }
 
 }  // namespace
@@ -235,6 +327,8 @@ int16_t* ChannelManager::ScratchFor(int32_t channelCount, int64_t frames)
     if (leftSum_.size() < size_t(frames)) {
         leftSum_.resize(size_t(frames));
         rightSum_.resize(size_t(frames));
+        integerLeft_.resize(size_t(frames));
+        integerRight_.resize(size_t(frames));
     }
     return scratch_.data();
 }
@@ -254,33 +348,75 @@ void ChannelManager::ZeroScratch(int32_t channelCount, int64_t frames, int64_t o
         std::fill_n(scratch_.data() + size_t(c) * size_t(frames) + offset, count, int16_t(0));
 }
 
-void ChannelManager::SumChannels(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount)
+bool ChannelManager::SumChannels(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount)
 {
-    float* left = leftSum_.data();
-    float* right = rightSum_.data();
-    std::fill_n(left, frames, 0.0f);
-    std::fill_n(right, frames, 0.0f);
     *leftCount = 0;
     *rightCount = 0;
-    // Channels are added in list order for every frame, as a frame-by-frame
-    // walk would, so the float sums are the same.
     for (int32_t c = 0; c < channelCount; ++c) {
         Channel* channel = channels_[size_t(c)].get();
         if (channel->IsMuted())
             continue;
         const int8_t pan = channel->PanPosition();
-        const bool toLeft = pan == Channel::kPanMiddle || pan == Channel::kPanLeft;
-        const bool toRight = pan == Channel::kPanMiddle || pan == Channel::kPanRight;
         const int16_t* samples = scratch_.data() + size_t(c) * size_t(frames);
-        if (toLeft) {
+        if (pan == Channel::kPanMiddle || pan == Channel::kPanLeft) {
+            (*leftCount == 0 ? CopySamples : AddSamples)(samples, frames, integerLeft_.data());
             ++*leftCount;
-            for (int64_t i = 0; i < frames; ++i)
-                left[i] += float(samples[i]) * kSampleScale;
         }
-        if (toRight) {
+        if (pan == Channel::kPanMiddle || pan == Channel::kPanRight) {
+            (*rightCount == 0 ? CopySamples : AddSamples)(samples, frames, integerRight_.data());
             ++*rightCount;
-            for (int64_t i = 0; i < frames; ++i)
-                right[i] += float(samples[i]) * kSampleScale;
+        }
+    }
+    if (*leftCount == 0)
+        std::fill_n(integerLeft_.data(), frames, 0);
+    if (*rightCount == 0)
+        std::fill_n(integerRight_.data(), frames, 0);
+    return *leftCount <= kExactIntegerSumLimit && *rightCount <= kExactIntegerSumLimit;
+}
+
+// The plain frame-by-frame float sum in channel order, for documents so
+// crowded that the integer sum might differ from it.
+void ChannelManager::SumChannelsInFloat(int32_t channelCount, int64_t frames)
+{
+    float* left = leftSum_.data();
+    float* right = rightSum_.data();
+    std::fill_n(left, frames, 0.0f);
+    std::fill_n(right, frames, 0.0f);
+    for (int32_t c = 0; c < channelCount; ++c) {
+        Channel* channel = channels_[size_t(c)].get();
+        if (channel->IsMuted())
+            continue;
+        const int8_t pan = channel->PanPosition();
+        const int16_t* samples = scratch_.data() + size_t(c) * size_t(frames);
+        for (int64_t i = 0; i < frames; ++i) {
+            const float value = float(samples[i]) * kSampleScale;
+            if (pan == Channel::kPanMiddle || pan == Channel::kPanLeft)
+                left[i] += value;
+            if (pan == Channel::kPanMiddle || pan == Channel::kPanRight)
+                right[i] += value;
+        }
+    }
+}
+
+template <typename Sample>
+void ChannelManager::MixScratch(int32_t channelCount, int64_t frames, Sample* out)
+{
+    int32_t leftCount = 0;
+    int32_t rightCount = 0;
+    if (SumChannels(channelCount, frames, &leftCount, &rightCount)) {
+        WriteMix(leftCount, rightCount, integerLeft_.data(), integerRight_.data(), frames, out);
+        return;
+    }
+    SumChannelsInFloat(channelCount, frames);
+    for (int64_t i = 0; i < frames; ++i) {
+        const float left = CombineSide(leftSum_[size_t(i)], leftCount);
+        const float right = CombineSide(rightSum_[size_t(i)], rightCount);
+        if constexpr (std::is_same_v<Sample, float>) {
+            out[2 * i] = left;
+            out[2 * i + 1] = right;
+        } else {
+            out[2 * i] = ToSample(left);
+            out[2 * i + 1] = ToSample(right);
         }
     }
 }
@@ -324,13 +460,7 @@ bool ChannelManager::FillBuffer(float* out, int64_t frames)
     }
     currentFrame_ = current;
 
-    int32_t leftCount = 0;
-    int32_t rightCount = 0;
-    SumChannels(channelCount, frames, &leftCount, &rightCount);
-    for (int64_t i = 0; i < frames; ++i) {
-        out[2 * i] = CombineSide(leftSum_[size_t(i)], leftCount);
-        out[2 * i + 1] = CombineSide(rightSum_[size_t(i)], rightCount);
-    }
+    MixScratch(channelCount, frames, out);
     return true;
 }
 
@@ -349,13 +479,7 @@ bool ChannelManager::FillBuffer(int16_t* out, int64_t* frames)
     ScratchFor(channelCount, count);
     FillScratch(channelCount, count, current, 0, count);
 
-    int32_t leftCount = 0;
-    int32_t rightCount = 0;
-    SumChannels(channelCount, count, &leftCount, &rightCount);
-    for (int64_t i = 0; i < count; ++i) {
-        out[2 * i] = leftCount == 0 ? 0 : ToSample(CombineSide(leftSum_[size_t(i)], leftCount));
-        out[2 * i + 1] = rightCount == 0 ? 0 : ToSample(CombineSide(rightSum_[size_t(i)], rightCount));
-    }
+    MixScratch(channelCount, count, out);
     currentFrame_ = current + count;
     return true;
 }

@@ -88,21 +88,19 @@ public:
     bool FillBuffer(int16_t* out, int64_t* frames);
 
 private:
-    /// The channels' samples for one buffer, with how each one is heard.
-    struct MixSource {
-        const int16_t* samples;
-        bool left;
-        bool right;
-    };
-
     int64_t FrameCountLocked();
     void PlayRange(int64_t total, int64_t* start, int64_t* end);
     int16_t* ScratchFor(int32_t channelCount, int64_t frames);
     void FillScratch(int32_t channelCount, int64_t frames, int64_t from, int64_t offset, int64_t count);
     void ZeroScratch(int32_t channelCount, int64_t frames, int64_t offset, int64_t count);
-    /// Sums the scratch arrays into the two sides; returns how many channels
-    /// are heard on the left and on the right.
-    void SumChannels(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount);
+    /// Sums the scratch arrays of the heard channels into the integer sums of
+    /// each side and counts the channels heard on each. False when a side has
+    /// so many that only the float sum gives the exact mix.
+    bool SumChannels(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount);
+    void SumChannelsInFloat(int32_t channelCount, int64_t frames);
+    /// Mixes the scratch arrays into interleaved stereo frames.
+    template <typename Sample>
+    void MixScratch(int32_t channelCount, int64_t frames, Sample* out);
     void PostToWindow(uint32_t what, const char* field = nullptr, int64_t value = 0);
 
     // Guarded by lock_.
@@ -110,6 +108,8 @@ private:
     std::vector<int16_t> scratch_;
     std::vector<float> leftSum_;
     std::vector<float> rightSum_;
+    std::vector<int32_t> integerLeft_;
+    std::vector<int32_t> integerRight_;
 
     DocumentWindow* window_;
     std::atomic<float> frameRate_{44100.0f};

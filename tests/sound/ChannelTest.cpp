@@ -96,7 +96,7 @@ TEST(ChannelTest, FlagsAreKept)
 TEST(ChannelTest, AdoptingAnArray)
 {
     Channel channel;
-    EXPECT_FALSE(channel.SetTo(nullptr, 5));
+    EXPECT_FALSE(channel.SetTo(static_cast<int16_t*>(nullptr), 5));
     int16_t* samples = new int16_t[3]{7, 8, 9};
     EXPECT_FALSE(channel.SetTo(samples, 0));
     EXPECT_FALSE(channel.SetTo(samples, -1));

@@ -1,0 +1,40 @@
+#pragma once
+
+#include <chrono>
+#include <cstdio>
+#include <cstring>
+#include <vector>
+
+namespace glimmet::bench {
+
+/// Best (lowest) mean wall time in nanoseconds of calling work `repetitions`
+/// times, over `rounds` rounds: the least disturbed measurement.
+template <typename Work>
+double BestNanoseconds(int rounds, int repetitions, Work&& work)
+{
+    double best = 0;
+    for (int round = 0; round < rounds; ++round) {
+        const auto start = std::chrono::steady_clock::now();
+        for (int i = 0; i < repetitions; ++i)
+            work();
+        const auto elapsed = std::chrono::steady_clock::now() - start;
+        const double mean = std::chrono::duration<double, std::nano>(elapsed).count() / repetitions;
+        if (round == 0 || mean < best)
+            best = mean;
+    }
+    return best;
+}
+
+/// memcpy of `bytes`, timed like the work it is compared with.
+inline double MemcpyNanoseconds(size_t bytes, int rounds, int repetitions)
+{
+    std::vector<char> source(bytes, 1);
+    std::vector<char> target(bytes, 0);
+    std::memcpy(target.data(), source.data(), bytes);  // fault the pages in first
+    return BestNanoseconds(rounds, repetitions, [&] {
+        std::memcpy(target.data(), source.data(), bytes);
+        asm volatile("" : : "r"(target.data()) : "memory");
+    });
+}
+
+}  // namespace glimmet::bench
