@@ -28,6 +28,16 @@ public:
     Channel(const Channel&) = delete;
     Channel& operator=(const Channel&) = delete;
 
+    /// Loads channel index of an audio track: the track's frame count, its
+    /// decoded rate, its samples (signed 16-bit), and the pan of a stereo
+    /// pair (odd index right, even index left). False when the track is
+    /// missing or not audio, cannot be decoded to 16-bit, has no frames, or
+    /// the array cannot be had; the frame count (and from the decoded format
+    /// on, the rate) stay stored even then. A decode that yields fewer frames
+    /// than counted leaves the rest silent; frames beyond the count are
+    /// dropped. Decodes the whole track from its start.
+    bool SetTo(MediaTrack* track, uint32_t index);
+
     /// Adopts samples (allocated with new[]) as this channel's data; false,
     /// changing nothing, for a null pointer or a count below 1. Meant for a
     /// freshly made channel: the first frame is left as it is.
@@ -73,6 +83,9 @@ private:
     /// outside the array read as 0.
     void CopyOut(int16_t* destination, int64_t index, int64_t count) const;
     void Install(SampleArray samples, int64_t count);
+    /// Steps of loading from a track; each false ends the load.
+    bool AcceptTrackFormat(MediaTrack* track, uint32_t index, int32_t* channels, size_t* bufferSize);
+    void ReadTrackChannel(MediaTrack* track, uint32_t index, int32_t channels, size_t bufferSize);
     status_t InsertIntoData(const int16_t* frames, int64_t count, int64_t at);
     status_t ReplaceInData(const int16_t* frames, int64_t count, int64_t from, int64_t to);
     status_t ReplaceAll(const int16_t* frames, int64_t count, int64_t first);
