@@ -1,0 +1,165 @@
+#include "files/DocumentLoader.h"
+
+#include <algorithm>
+#include <new>
+#include <system_error>
+
+#include "edit/ChannelContainer.h"
+#include "files/LoadTarget.h"
+#include "files/MediaFile.h"
+#include "files/MediaFormat.h"
+#include "files/MediaTrack.h"
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+#include "support/MessageCodes.h"
+
+namespace glimmet {
+
+namespace {
+
+constexpr const char* kTitlePrefix = "Glimmet - ";
+
+bool IsAudio(const media_format& format)
+{
+    return format.type == B_MEDIA_RAW_AUDIO || format.type == B_MEDIA_ENCODED_AUDIO;
+}
+
+media_format ShortAudioRequest()
+{
+    media_format request;
+    request.type = B_MEDIA_RAW_AUDIO;
+    request.raw_audio = media_raw_audio_format::wildcard;
+    request.raw_audio.format = B_AUDIO_SHORT;
+    return request;
+}
+
+std::unique_ptr<int16_t[]> AllocateSamples(int64_t count)
+{
+    if (count <= 0 || count > int64_t(UINT32_MAX))
+        return nullptr;
+    return std::unique_ptr<int16_t[]>(new (std::nothrow) int16_t[size_t(count)]);
+}
+
+/// Reads the whole track once and spreads its interleaved frames over the
+/// arrays (null entries are skipped); frames past count are dropped and a
+/// short decode leaves zeros.
+void Deinterleave(MediaTrack* track, size_t bufferSize, int64_t count,
+                  std::vector<std::unique_ptr<int16_t[]>>& arrays)
+{
+    const size_t channels = arrays.size();
+    std::vector<int16_t> buffer(2 * bufferSize / sizeof(int16_t) + 1);
+    int64_t seekTo = 0;
+    track->SeekToFrame(&seekTo, 0);
+    int64_t stored = 0;
+    int64_t framesRead = 0;
+    while (stored < count && track->ReadFrames(buffer.data(), &framesRead) == B_OK) {
+        const int64_t frames = std::min({framesRead, count - stored, int64_t(buffer.size() / channels)});
+        for (size_t k = 0; k < channels; ++k) {
+            int16_t* to = arrays[k].get();
+            if (to == nullptr)
+                continue;
+            const int16_t* from = buffer.data() + k;
+            for (int64_t frame = 0; frame < frames; ++frame)
+                to[stored + frame] = from[size_t(frame) * channels];
+        }
+        stored += frames;
+    }
+    for (auto& array : arrays) {
+        if (array != nullptr)
+            std::fill(array.get() + stored, array.get() + count, int16_t(0));
+    }
+}
+
+}  // namespace
+
+status_t DocumentLoader::Load(const std::filesystem::path& file, LoadTarget& target)
+{
+    MediaFile media(file);
+    status_t status = media.InitCheck();
+    if (status != B_OK)
+        return status;
+
+    const std::filesystem::path entry = FollowLinks(file);
+    target.ReplaceFileEntry(entry);
+    const std::string name = entry.filename().string();
+    if (!target.IsAppendOnLoad() && !name.empty())
+        target.SetWindowTitle(kTitlePrefix + name);
+
+    for (int32_t index = 0;; ++index) {
+        MediaTrack* track = media.TrackAt(index);
+        if (track == nullptr)
+            break;
+        LoadTrack(track, target, &status);
+        media.ReleaseTrack(track);
+    }
+    return status;
+}
+
+void DocumentLoader::LoadTrack(MediaTrack* track, LoadTarget& target, status_t* status)
+{
+    media_format encoded;
+    if (track->EncodedFormat(&encoded) != B_OK || !IsAudio(encoded))
+        return;
+    ChannelManager* manager = target.DocumentManager();
+    ChannelContainer* container = target.DocumentContainer();
+    if (manager == nullptr || container == nullptr)
+        return;
+    if (!target.IsAppendOnLoad())
+        EmptyDocument(target);
+
+    media_format decoded = ShortAudioRequest();
+    *status = track->DecodedFormat(&decoded);
+    if (*status != B_OK)
+        return;
+    for (std::unique_ptr<Channel>& channel : LoadChannels(track, decoded)) {
+        if (channel == nullptr)
+            continue;
+        Channel* added = channel.release();
+        manager->AddChannel(added);
+        container->AddChannel(added);
+    }
+    target.PostToSelf(kMsgShowAll);
+}
+
+void DocumentLoader::EmptyDocument(LoadTarget& target)
+{
+    while (target.DocumentManager()->RemoveChannelAt(0))
+        target.DocumentContainer()->RemoveSampleViewAt(0);
+}
+
+std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* track, const media_format& decoded)
+{
+    const size_t channelCount = decoded.raw_audio.channel_count;
+    std::vector<std::unique_ptr<Channel>> channels(channelCount);
+    media_format encoded;
+    const int64_t count = track->CountFrames();
+    if (count <= 0 || channelCount == 0 || track->EncodedFormat(&encoded) != B_OK || !IsAudio(encoded))
+        return channels;
+
+    std::vector<std::unique_ptr<int16_t[]>> arrays(channelCount);
+    for (size_t k = 0; k < channelCount; ++k)
+        arrays[k] = AllocateSamples(count);
+    Deinterleave(track, decoded.raw_audio.buffer_size, count, arrays);
+
+    for (size_t k = 0; k < channelCount; ++k) {
+        if (arrays[k] == nullptr)
+            continue;
+        channels[k] = std::make_unique<Channel>();
+        channels[k]->SetFrameRate(decoded.raw_audio.frame_rate);
+        channels[k]->SetPanPosition(k % 2 == 1 ? Channel::kPanRight : Channel::kPanLeft);
+        channels[k]->SetTo(arrays[k].release(), count);
+    }
+    return channels;
+}
+
+std::filesystem::path DocumentLoader::FollowLinks(const std::filesystem::path& file)
+{
+    std::error_code error;
+    std::filesystem::path resolved = std::filesystem::canonical(file, error);
+    if (!error)
+        return resolved;
+    resolved = std::filesystem::absolute(file, error);
+    return error ? file : resolved;
+}
+
+}  // namespace glimmet

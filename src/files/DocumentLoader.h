@@ -1,0 +1,45 @@
+#pragma once
+
+#include <cstdint>
+#include <filesystem>
+#include <memory>
+#include <vector>
+
+#include "support/Status.h"
+
+namespace glimmet {
+
+class Channel;
+class LoadTarget;
+class MediaTrack;
+struct media_format;
+
+/// Loads a sound file into a document: every channel of every audio track
+/// becomes a Channel of the document's manager and gets a strip in its
+/// container view.
+class DocumentLoader {
+public:
+    /// Opens file and loads it into target. Returns the file's open status
+    /// when it cannot be opened (the document is untouched), otherwise the
+    /// status of the last decoded-format negotiation (B_OK for a file without
+    /// audio). Unless target appends, each audio track first empties the
+    /// document, so only the last audio track's channels remain. Each audio
+    /// track that decodes posts 'shal' to the target, loaded channels or not.
+    static status_t Load(const std::filesystem::path& file, LoadTarget& target);
+
+    /// The channels of an audio track from one decoding pass, in track order;
+    /// a channel that could not be had (no frames, no memory) is null. The
+    /// result is what Channel::SetTo(track, k) gives for each k, without
+    /// decoding the track once per channel. decoded is the format the track
+    /// agreed to.
+    static std::vector<std::unique_ptr<Channel>> LoadChannels(MediaTrack* track, const media_format& decoded);
+
+private:
+    /// Loads one track; *status takes the decoded-format result of an audio
+    /// track.
+    static void LoadTrack(MediaTrack* track, LoadTarget& target, status_t* status);
+    static void EmptyDocument(LoadTarget& target);
+    static std::filesystem::path FollowLinks(const std::filesystem::path& file);
+};
+
+}  // namespace glimmet
