@@ -1,0 +1,559 @@
+#include "views/ChannelContainerView.h"
+
+#include <algorithm>
+#include <cmath>
+
+#include <QCoreApplication>
+#include <QFontMetricsF>
+#include <QPainter>
+
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+#include "sound/DocumentWindow.h"
+#include "support/MessageCodes.h"
+#include "support/MessageEvent.h"
+#include "views/PixelCanvas.h"
+#include "views/SampleView.h"
+#include "views/ZoomSlider.h"
+
+namespace glimmet {
+
+namespace {
+
+const QColor kBackground(216, 216, 216);
+const QColor kSunkenDark(152, 152, 152);
+const QColor kSunkenLight(255, 255, 255);
+const QColor kFocus(0, 0, 229);
+
+constexpr int kMinimumHeight = 30;
+constexpr int kMaximumSize = 2000;
+// Each sample view is framed by one pixel on every side.
+constexpr int kFrameAllowance = 2;
+
+const char* const kEmptyText = "Drag files with audio tracks into here!";
+
+void FillPixels(QPainter& painter, float x0, float y0, float x1, float y1, const QColor& colour)
+{
+    const int left = PixelCanvas::RoundToPixel(std::min(x0, x1));
+    const int right = PixelCanvas::RoundToPixel(std::max(x0, x1));
+    const int top = PixelCanvas::RoundToPixel(std::min(y0, y1));
+    const int bottom = PixelCanvas::RoundToPixel(std::max(y0, y1));
+    painter.fillRect(QRect(QPoint(left, top), QPoint(right, bottom)), colour);
+}
+
+// The four lines of a frame around r: left and top in the first colour,
+// right and bottom in the second.
+void DrawFrameLines(QPainter& painter, const ViewRect& r, const QColor& topLeft, const QColor& bottomRight)
+{
+    FillPixels(painter, r.left, r.bottom, r.left, r.top, topLeft);
+    FillPixels(painter, r.left + 1, r.top, r.right, r.top, topLeft);
+    FillPixels(painter, r.right, r.top + 1, r.right, r.bottom, bottomRight);
+    FillPixels(painter, r.right - 1, r.bottom, r.left + 1, r.bottom, bottomRight);
+}
+
+}  // namespace
+
+ChannelContainerView::ChannelContainerView(ChannelManager* manager, ZoomSlider* zoomSlider, DocumentWindow* window,
+                                           QWidget* parent)
+    : QWidget(parent), zoomSlider_(zoomSlider), manager_(manager), window_(window)
+{
+    setObjectName("sample view");
+    setAttribute(Qt::WA_OpaquePaintEvent);
+    setSizePolicy(QSizePolicy::Expanding, QSizePolicy::Expanding);
+    lastFrame_ = MaxFrameCount() - 1;
+    resize(11, 16);
+    CheckZoomSlider(true);
+    if (zoomSlider_ != nullptr)
+        zoomSlider_->setParent(this);
+    UpdateSizeLimits();
+}
+
+ChannelContainerView::~ChannelContainerView() = default;
+
+float ChannelContainerView::Width() const
+{
+    return Bounds().Width();
+}
+
+ViewRect ChannelContainerView::Bounds() const
+{
+    return {0, 0, float(width() - 1), float(height() - 1)};
+}
+
+FrameMapping ChannelContainerView::Mapping() const
+{
+    return FrameMapping(Width(), firstFrame_, lastFrame_);
+}
+
+float ChannelContainerView::PosAt(int64_t frame) const
+{
+    return Mapping().PosAt(frame);
+}
+
+int64_t ChannelContainerView::FirstFrameAt(float x) const
+{
+    return Mapping().FirstFrameAt(x);
+}
+
+int64_t ChannelContainerView::LastFrameAt(float x) const
+{
+    return Mapping().LastFrameAt(x);
+}
+
+int64_t ChannelContainerView::FrameAt(float x) const
+{
+    return Mapping().FrameAt(x);
+}
+
+int64_t ChannelContainerView::MaxFrameCount() const
+{
+    return manager_ != nullptr ? manager_->FrameCount() : 0;
+}
+
+SampleView* ChannelContainerView::SampleViewAt(QPointF point) const
+{
+    for (SampleView* view : sampleViews_) {
+        if (view->Frame().Contains(point.x(), point.y()))
+            return view;
+    }
+    return nullptr;
+}
+
+SampleView* ChannelContainerView::SampleViewAtIndex(int32_t index) const
+{
+    if (index < 0 || size_t(index) >= sampleViews_.size())
+        return nullptr;
+    return sampleViews_[size_t(index)];
+}
+
+int32_t ChannelContainerView::IndexOf(const SampleView* view) const
+{
+    const auto found = std::find(sampleViews_.begin(), sampleViews_.end(), view);
+    return found == sampleViews_.end() ? -1 : int32_t(found - sampleViews_.begin());
+}
+
+// Deliberately 0, not -1, when no view has the focus.
+int32_t ChannelContainerView::FocusedChannel()
+{
+    for (size_t i = 0; i < sampleViews_.size(); ++i) {
+        if (sampleViews_[i]->IsFocus())
+            return int32_t(i);
+    }
+    return 0;
+}
+
+int32_t ChannelContainerView::CountChannelViews()
+{
+    return int32_t(sampleViews_.size());
+}
+
+ChannelView* ChannelContainerView::ChannelViewAt(int32_t index)
+{
+    return SampleViewAtIndex(index);
+}
+
+void ChannelContainerView::SetDisplayRange(int64_t first, int64_t last)
+{
+    firstFrame_ = first;
+    lastFrame_ = last;
+    const int64_t count = MaxFrameCount();
+    int64_t columns = int64_t(std::trunc(Width())) - 1;
+    if (columns >= count - 1)
+        columns = count - 1;
+    // Never more than one column per frame.
+    if (first + columns - 1 > last) {
+        lastFrame_ = first + columns - 1;
+        CheckZoomSlider(false);
+    }
+    for (SampleView* view : sampleViews_)
+        view->Update();
+    if (window_ != nullptr && zoomSlider_ != nullptr) {
+        Message message(kMsgDisplayRangeChanged);
+        message.AddInt64("low value", firstFrame_);
+        message.AddInt64("high value", lastFrame_);
+        zoomSlider_->PostMessage(message);
+    }
+}
+
+// The range, centred and widened to one frame per column; shifted left
+// rather than reaching past the end of the document.
+void ChannelContainerView::ZoomRange()
+{
+    const int64_t count = MaxFrameCount();
+    int64_t first = RangeStart();
+    int64_t last = RangeEnd();
+    if (first < -1 || last < -1 || first > count || last > count)
+        return;
+    const int64_t columns = int64_t(std::trunc(Width())) - 1;
+    if (last - first < columns) {
+        const int64_t widening = (columns - (last - first)) / 2;
+        const int64_t shortfall = first - widening < 0 ? widening - first : 0;
+        first = std::max<int64_t>(first - widening, 0);
+        last = last + widening + shortfall;
+    }
+    if (last > count) {
+        const int64_t excess = last - count;
+        first -= excess;
+        last -= excess;
+    }
+    firstFrame_ = first;
+    lastFrame_ = last;
+    for (SampleView* view : sampleViews_)
+        view->Update();
+    UpdateZoomSlider();
+}
+
+// The first frame is deliberately left alone: the slider's notification
+// through the window sets the display range.
+void ChannelContainerView::ShowAll()
+{
+    lastFrame_ = MaxFrameCount() - 1;
+    if (zoomSlider_ != nullptr)
+        zoomSlider_->SetBoth(0.0f, 1.0f);
+}
+
+void ChannelContainerView::CheckZoomSlider(bool notify)
+{
+    const int64_t count = MaxFrameCount();
+    if (zoomSlider_ == nullptr || count - 1 <= 0)
+        return;
+    zoomSlider_->SetLowValue(0, notify);
+    zoomSlider_->SetHighValue(count - 1, notify);
+    zoomSlider_->SetMinRange(std::min(int64_t(std::trunc(Width())) - 1, count - 1));
+}
+
+// These expressions are based on the width and not on the displayed span;
+// they place the handles exactly as the original does.
+void ChannelContainerView::UpdateZoomSlider()
+{
+    const int64_t count = MaxFrameCount();
+    if (zoomSlider_ == nullptr || count <= 0)
+        return;
+    const int64_t n = int64_t(std::trunc(Width())) - 2;
+    if (lastFrame_ < count - 1) {
+        zoomSlider_->SetLeft(float(firstFrame_) / float(count - n), false);
+        zoomSlider_->SetRight(float(lastFrame_ - n) / float(count - n), false);
+    } else {
+        zoomSlider_->SetLeft(float(firstFrame_) / float(lastFrame_ - n), false);
+        zoomSlider_->SetRight(float(lastFrame_ - n) / float(lastFrame_ - n), false);
+    }
+}
+
+void ChannelContainerView::RedrawColumns(SampleView* view, float left, float right)
+{
+    if (view == nullptr)
+        return;
+    ViewRect rect = view->Bounds();
+    rect.left = left;
+    rect.right = right;
+    view->Update(rect);
+}
+
+void ChannelContainerView::RedrawColumnInAll(float x)
+{
+    for (SampleView* view : sampleViews_)
+        RedrawColumns(view, x, x);
+}
+
+void ChannelContainerView::SetCursorFrame(int64_t frame)
+{
+    if (frame > MaxFrameCount())
+        return;
+    float oldX = PosAt(cursorFrame_);
+    if (oldX == -1)
+        oldX = 0;
+    cursorFrame_ = frame;
+    const float newX = PosAt(frame);
+    RedrawColumnInAll(oldX);
+    RedrawColumnInAll(newX);
+}
+
+void ChannelContainerView::SetPlaymarkFrame(int64_t frame)
+{
+    if (frame <= MaxFrameCount()) {
+        float oldX = PosAt(playmarkFrame_);
+        if (oldX == -1)
+            oldX = 0;
+        const bool oldVisible = firstFrame_ <= playmarkFrame_ && playmarkFrame_ <= lastFrame_;
+        playmarkFrame_ = frame;
+        const bool newVisible = firstFrame_ <= frame && frame <= lastFrame_;
+        if (oldVisible)
+            RedrawColumnInAll(oldX);
+        if (newVisible)
+            RedrawColumnInAll(PosAt(frame));
+    }
+    // The window sends the next play position only after this answer.
+    if (window_ != nullptr)
+        window_->PostMessage(kMsgPlaymarkUpdated);
+}
+
+void ChannelContainerView::SetPlaymarkToCursor()
+{
+    if (manager_ != nullptr)
+        manager_->SetCurrentFrame(cursorFrame_);
+}
+
+int64_t ChannelContainerView::RangeStart() const
+{
+    return manager_ != nullptr ? manager_->RangeStart() : -1;
+}
+
+int64_t ChannelContainerView::RangeEnd() const
+{
+    return manager_ != nullptr ? manager_->RangeEnd() : -1;
+}
+
+void ChannelContainerView::SetRangeStart(int64_t frame)
+{
+    if (manager_ != nullptr)
+        manager_->SetRangeStart(frame);
+}
+
+void ChannelContainerView::SetRangeEnd(int64_t frame)
+{
+    if (manager_ != nullptr)
+        manager_->SetRangeEnd(frame);
+}
+
+void ChannelContainerView::SelectAll()
+{
+    const int64_t count = MaxFrameCount();
+    SetRangeStart(0);
+    SetRangeEnd(count - 1);
+    SetCursorFrame(count - 1);
+    if (manager_ != nullptr) {
+        for (int32_t i = 0; i < manager_->CountChannels(); ++i)
+            manager_->ChannelAt(i)->SetSelected(true);
+    }
+    for (SampleView* view : sampleViews_)
+        view->Update();
+}
+
+void ChannelContainerView::DeselectAll()
+{
+    const float startX = PosAt(RangeStart());
+    const float endX = PosAt(RangeEnd());
+    for (SampleView* view : sampleViews_) {
+        Channel* channel = view->GetChannel();
+        if (channel == nullptr || !channel->IsSelected())
+            continue;
+        channel->SetSelected(false);
+        RedrawColumns(view, startX - 2, endX + 1);
+    }
+    SetRangeStart(-1);
+    SetRangeEnd(-1);
+}
+
+void ChannelContainerView::RangeChanged()
+{
+    for (SampleView* view : sampleViews_) {
+        if (view->GetChannel() != nullptr && view->GetChannel()->IsSelected())
+            view->Update();
+    }
+}
+
+SampleView* ChannelContainerView::AddChannel(Channel* channel)
+{
+    auto* view = new SampleView(channel, this, this);
+    InsertSampleView(view, int32_t(sampleViews_.size()));
+    return view;
+}
+
+void ChannelContainerView::AddChannelAt(Channel* channel, int32_t index)
+{
+    InsertSampleView(new SampleView(channel, this, this), index);
+}
+
+// An index outside the list appends, so that every view made here is laid
+// out and drawn.
+void ChannelContainerView::InsertSampleView(SampleView* view, int32_t index)
+{
+    const size_t position = (index < 0 || size_t(index) > sampleViews_.size()) ? sampleViews_.size() : size_t(index);
+    sampleViews_.insert(sampleViews_.begin() + std::ptrdiff_t(position), view);
+    view->show();
+    if (lastFrame_ <= 0)
+        lastFrame_ = MaxFrameCount() - 1;
+    CheckZoomSlider(true);
+    UpdateSizeLimits();
+    LayoutChildren();
+    update();
+}
+
+void ChannelContainerView::RemoveSampleView(ChannelView* view)
+{
+    const auto found = std::find_if(sampleViews_.begin(), sampleViews_.end(),
+                                    [view](SampleView* candidate) { return candidate == view; });
+    if (found == sampleViews_.end())
+        return;
+    RemoveSampleViewAt(int32_t(found - sampleViews_.begin()));
+}
+
+void ChannelContainerView::RemoveSampleViewAt(int32_t index)
+{
+    SampleView* view = SampleViewAtIndex(index);
+    if (view == nullptr)
+        return;
+    sampleViews_.erase(sampleViews_.begin() + index);
+    delete view;
+    UpdateSizeLimits();
+    LayoutChildren();
+    update();
+}
+
+void ChannelContainerView::UpdateAll()
+{
+    for (SampleView* view : sampleViews_)
+        view->Update();
+    CheckZoomSlider(true);
+}
+
+status_t ChannelContainerView::PostMessage(const Message& message)
+{
+    QCoreApplication::postEvent(this, new MessageEvent(message));
+    return B_OK;
+}
+
+void ChannelContainerView::customEvent(QEvent* event)
+{
+    if (event->type() == MessageEvent::EventType())
+        MessageReceived(static_cast<MessageEvent*>(event)->message());
+    else
+        QWidget::customEvent(event);
+}
+
+Channel* ChannelContainerView::ContextChannelPointer() const
+{
+    return manager_ != nullptr ? manager_->ChannelAt(contextChannel_) : nullptr;
+}
+
+void ChannelContainerView::MessageReceived(const Message& message)
+{
+    if (message.what == kMsgSampleMoved) {
+        // A sample view finished drawing: a move may ask for the next redraw.
+        moveRedrawPermission_ = 1;
+        return;
+    }
+    Channel* channel = ContextChannelPointer();
+    if (channel == nullptr)
+        return;
+    switch (message.what) {
+    case kMsgToggleMute:
+        channel->SetMuted(!channel->IsMuted());
+        break;
+    case kMsgPanLeft:
+        channel->SetPanPosition(Channel::kPanLeft);
+        break;
+    case kMsgPanMiddle:
+        channel->SetPanPosition(Channel::kPanMiddle);
+        break;
+    case kMsgPanRight:
+        channel->SetPanPosition(Channel::kPanRight);
+        break;
+    default:
+        break;
+    }
+}
+
+// Layout
+
+QSize ChannelContainerView::minimumSizeHint() const
+{
+    int height = kMinimumHeight;
+    if (zoomSlider_ != nullptr)
+        height += zoomSlider_->minimumSizeHint().height();
+    for (const SampleView* view : sampleViews_)
+        height += view->minimumSizeHint().height() + kFrameAllowance;
+    return {0, height};
+}
+
+QSize ChannelContainerView::sizeHint() const
+{
+    return minimumSizeHint().expandedTo(QSize(400, 200));
+}
+
+void ChannelContainerView::UpdateSizeLimits()
+{
+    const int maximumHeight = kMaximumSize + int(sampleViews_.size()) * (kMaximumSize + kFrameAllowance);
+    setMaximumSize(kMaximumSize, std::min(maximumHeight, QWIDGETSIZE_MAX));
+    setMinimumSize(minimumSizeHint());
+    updateGeometry();
+}
+
+void ChannelContainerView::resizeEvent(QResizeEvent* event)
+{
+    QWidget::resizeEvent(event);
+    LayoutChildren();
+    update();
+}
+
+// A view wider than the display range shows one frame per column; the
+// range is shifted left rather than past the end of the document.
+void ChannelContainerView::WidenToOneFramePerColumn()
+{
+    const int64_t count = MaxFrameCount();
+    if (count > 0) {
+        const int64_t n = int64_t(std::trunc(Width())) - 2;
+        if (lastFrame_ - firstFrame_ < n)
+            lastFrame_ = firstFrame_ + n - 1;
+        const int64_t excess = lastFrame_ - count + 1;
+        if (excess > 0) {
+            firstFrame_ -= excess;
+            lastFrame_ -= excess;
+        }
+    }
+    UpdateZoomSlider();
+}
+
+void ChannelContainerView::LayoutChildren()
+{
+    WidenToOneFramePerColumn();
+    const ViewRect bounds = Bounds();
+    if (zoomSlider_ != nullptr)
+        zoomSliderHeight_ = float(zoomSlider_->minimumSizeHint().height());
+    const float count = float(sampleViews_.size());
+    const float channelHeight = (bounds.Height() - zoomSliderHeight_ - 2 * count) / count;
+    float previousBottom = 0;
+    for (size_t i = 0; i < sampleViews_.size(); ++i) {
+        const float top = i == 0 ? 1 : previousBottom + 3;
+        const float bottom = i == 0 ? channelHeight : previousBottom + 3 + channelHeight;
+        previousBottom = sampleViews_[i]->Layout({1, top, bounds.right - 1, bottom}).bottom;
+    }
+    if (zoomSlider_ != nullptr) {
+        const float top = sampleViews_.empty() ? bounds.bottom - zoomSliderHeight_ + 1 : previousBottom + 2;
+        zoomSlider_->Layout({0, top, bounds.right, bounds.bottom});
+    }
+    CheckZoomSlider(false);
+}
+
+// Drawing: only the frames around the sample views and the empty state;
+// the waveforms are the sample views' own.
+void ChannelContainerView::paintEvent(QPaintEvent*)
+{
+    QPainter painter(this);
+    painter.fillRect(rect(), kBackground);
+    for (SampleView* view : sampleViews_) {
+        const ViewRect r = view->Frame().InsetBy(-1, -1);
+        if (view->IsFocus())
+            DrawFrameLines(painter, r, kFocus, kFocus);
+        else
+            DrawFrameLines(painter, r, kSunkenDark, kSunkenLight);
+    }
+    if (sampleViews_.empty())
+        DrawEmptyState(painter);
+}
+
+void ChannelContainerView::DrawEmptyState(QPainter& painter)
+{
+    const ViewRect bounds = Bounds();
+    const float bottom = bounds.bottom - zoomSliderHeight_;
+    DrawFrameLines(painter, {bounds.left, bounds.top, bounds.right, bottom}, kSunkenDark, kSunkenLight);
+    FillPixels(painter, bounds.left + 1, bounds.top + 1, bounds.right - 1, bottom - 1, kBackground);
+    const QString text = QString::fromUtf8(kEmptyText);
+    const QFontMetricsF metrics(font());
+    const qreal x = (bounds.left + bounds.right) / 2 - metrics.horizontalAdvance(text) / 2;
+    const qreal baseline = (bounds.top + bottom) / 2;
+    painter.setPen(Qt::black);
+    painter.drawText(QPointF(x, baseline), text);
+}
+
+}  // namespace glimmet

@@ -1,0 +1,299 @@
+#include "views/SampleView.h"
+
+#include <algorithm>
+#include <cmath>
+
+#include <QApplication>
+#include <QCoreApplication>
+#include <QKeyEvent>
+#include <QMouseEvent>
+#include <QPainter>
+
+#include "sound/Channel.h"
+#include "sound/DocumentWindow.h"
+#include "support/MessageCodes.h"
+#include "support/MessageEvent.h"
+#include "support/SystemTime.h"
+#include "views/ChannelContainerView.h"
+#include "views/PixelCanvas.h"
+#include "views/WaveformRenderer.h"
+
+namespace glimmet {
+
+namespace {
+
+constexpr int kMinimumWidth = 10;
+constexpr int kMinimumHeight = 15;
+constexpr int kMaximumSize = 2000;
+// Key repeats closer together than this are not acted on.
+constexpr int64_t kKeyGateMicros = 15000;
+
+constexpr int kKeyLeftArrow = 0x1c;
+constexpr int kKeyDownArrow = 0x1f;
+constexpr int kKeyDelete = 0x7f;
+
+}  // namespace
+
+SampleView::SampleView(Channel* channel, ChannelContainerView* container, QWidget* parent)
+    : QWidget(parent), channel_(channel), container_(container), clock_(&system_time)
+{
+    setObjectName("sample view");
+    setAttribute(Qt::WA_OpaquePaintEvent);
+    setFocusPolicy(Qt::StrongFocus);
+    setSizePolicy(QSizePolicy::Expanding, QSizePolicy::Expanding);
+    lastMouseDown_ = clock_();
+    lastKeyDown_ = lastMouseDown_;
+    inLayout_ = true;
+    resize(11, 16);
+    inLayout_ = false;
+    FrameResized(Bounds().Width(), Bounds().Height());
+}
+
+SampleView::~SampleView() = default;
+
+ViewRect SampleView::Bounds() const
+{
+    return {0, 0, float(width() - 1), float(height() - 1)};
+}
+
+ViewRect SampleView::Frame() const
+{
+    return ViewRect::FromQRect(geometry());
+}
+
+ViewRect SampleView::Layout(const ViewRect& frame)
+{
+    inLayout_ = true;
+    setGeometry(PixelCanvas::RoundToPixel(frame.left), PixelCanvas::RoundToPixel(frame.top),
+                std::max(0, PixelCanvas::RoundToPixel(frame.Width()) + 1),
+                std::max(0, PixelCanvas::RoundToPixel(frame.Height()) + 1));
+    inLayout_ = false;
+    FrameResized(Frame().Width(), Frame().Height());
+    return Frame();
+}
+
+void SampleView::resizeEvent(QResizeEvent* event)
+{
+    QWidget::resizeEvent(event);
+    if (!inLayout_ && bitmap_.size() != size())
+        FrameResized(Bounds().Width(), Bounds().Height());
+}
+
+void SampleView::FrameResized(float width, float height)
+{
+    const int columns = PixelCanvas::RoundToPixel(width) + 1;
+    const int rows = PixelCanvas::RoundToPixel(height) + 1;
+    if (columns > 0 && rows > 0)
+        bitmap_ = QImage(columns, rows, QImage::Format_RGB32);
+    else
+        bitmap_ = QImage();
+    BuildRowTable(std::max(rows, 1));
+    Update();
+}
+
+// Row i of the table holds the row of the samples -32768 + 8i .. + 8i + 7.
+// q is one more than 65535 / rows, so the largest sample lands in the last
+// row at most and the table needs no per-sample division.
+void SampleView::BuildRowTable(int32_t rows)
+{
+    const uint32_t q = 65535u / uint32_t(rows) + 1;
+    for (int i = 0; i < kRowTableSize; ++i)
+        rowTable_[size_t(i)] = int16_t((8u * uint32_t(i)) / q);
+}
+
+int32_t SampleView::RowOf(int16_t sample) const
+{
+    return rowTable_[size_t((int32_t(sample) + 32768) >> 3)];
+}
+
+void SampleView::Update()
+{
+    Update(Bounds());
+}
+
+void SampleView::Update(ViewRect rect)
+{
+    if (channel_ == nullptr || container_ == nullptr)
+        return;
+    if (std::isnan(rect.left) || std::isnan(rect.right) || std::isnan(rect.top) || std::isnan(rect.bottom))
+        return;
+    const ViewRect bounds = Bounds();
+    rect.left = std::max(rect.left, bounds.left);
+    if (rect.left > bounds.right)
+        return;
+    rect.top = std::max(rect.top, bounds.top);
+    if (rect.top > bounds.bottom)
+        return;
+    rect.right = std::min(rect.right, bounds.right);
+    if (rect.right < bounds.left)
+        return;
+    rect.bottom = std::min(rect.bottom, bounds.bottom);
+    if (rect.bottom < bounds.top)
+        return;
+
+    if (!bitmap_.isNull()) {
+        WaveformScene scene;
+        scene.firstFrame = container_->FirstDisplayedFrame();
+        scene.lastFrame = container_->LastDisplayedFrame();
+        scene.rangeStart = container_->RangeStart();
+        scene.rangeEnd = container_->RangeEnd();
+        scene.cursorFrame = container_->CursorFrame();
+        scene.playmarkFrame = container_->PlaymarkFrame();
+        scene.selected = channel_->IsSelected();
+        scene.channelFirstFrame = channel_->FirstFrame();
+        scene.channelFrameCount = channel_->FrameCount();
+        scene.samples = channel_->Data();
+        scene.framesPerColumn = float(scene.lastFrame - scene.firstFrame + 1) / (bounds.Width() + 1);
+        const int32_t rows = int32_t(bounds.Height() + 1);
+        WaveformRenderer renderer(bitmap_, rowTable_.data(), rows, scene);
+        renderer.RenderColumns(rect.left, int32_t(rect.right - rect.left + 1));
+    }
+    const int left = int(std::floor(rect.left));
+    const int top = int(std::floor(rect.top));
+    update(QRect(QPoint(left, top), QPoint(int(std::ceil(rect.right)), int(std::ceil(rect.bottom)))));
+}
+
+bool SampleView::IsFocus() const
+{
+    return hasFocus();
+}
+
+status_t SampleView::PostMessage(const Message& message)
+{
+    QCoreApplication::postEvent(this, new MessageEvent(message));
+    return B_OK;
+}
+
+void SampleView::customEvent(QEvent* event)
+{
+    if (event->type() == MessageEvent::EventType())
+        MessageReceived(static_cast<MessageEvent*>(event)->message());
+    else
+        QWidget::customEvent(event);
+}
+
+void SampleView::MessageReceived(const Message& message)
+{
+    if (message.what == kMsgMovingSample)
+        Update();
+}
+
+void SampleView::paintEvent(QPaintEvent* event)
+{
+    if (!bitmap_.isNull()) {
+        QPainter painter(this);
+        painter.drawImage(event->rect(), bitmap_, event->rect());
+    }
+    // Tells the container that this redraw is done, so that a channel being
+    // moved may ask for the next one.
+    if (container_ != nullptr)
+        container_->PostMessage(kMsgSampleMoved);
+}
+
+void SampleView::mousePressEvent(QMouseEvent* event)
+{
+    setFocus(Qt::MouseFocusReason);
+    if (container_ != nullptr)
+        container_->update();
+    const int64_t now = clock_();
+    const int64_t doubleClickMicros = int64_t(QApplication::doubleClickInterval()) * 1000;
+    if (container_ != nullptr) {
+        if (now - lastMouseDown_ < doubleClickMicros)
+            container_->DoubleClicked(this, event->position(), event->button(), event->modifiers());
+        else
+            container_->Clicked(this, event->position(), event->button(), event->modifiers());
+    }
+    lastMouseDown_ = now;
+}
+
+QPointF SampleView::ToContainer(QPointF point) const
+{
+    return point + QPointF(pos());
+}
+
+// The container follows the pointer while a button is held.
+void SampleView::mouseMoveEvent(QMouseEvent* event)
+{
+    if (container_ != nullptr)
+        container_->MouseMoved(ToContainer(event->position()));
+}
+
+void SampleView::mouseReleaseEvent(QMouseEvent* event)
+{
+    if (container_ != nullptr)
+        container_->MouseUp(ToContainer(event->position()));
+}
+
+int SampleView::KeyByte(const QKeyEvent* event)
+{
+    switch (event->key()) {
+    case Qt::Key_Left:
+        return 0x1c;
+    case Qt::Key_Right:
+        return 0x1d;
+    case Qt::Key_Up:
+        return 0x1e;
+    case Qt::Key_Down:
+        return 0x1f;
+    case Qt::Key_Delete:
+        return kKeyDelete;
+    case Qt::Key_Space:
+        return ' ';
+    default:
+        break;
+    }
+    const QString text = event->text();
+    return text.isEmpty() ? 0 : int(text.at(0).unicode());
+}
+
+void SampleView::keyPressEvent(QKeyEvent* event)
+{
+    const int64_t now = clock_();
+    if (now - kKeyGateMicros <= lastKeyDown_) {
+        QWidget::keyPressEvent(event);
+        return;
+    }
+    const int key = KeyByte(event);
+    if (key == 0)
+        return;
+    DocumentWindow* window = container_ != nullptr ? container_->Window() : nullptr;
+    if (key == ' ') {
+        if (window != nullptr)
+            window->PostMessage(event->modifiers().testFlag(Qt::ShiftModifier) ? kMsgPlayFromCursor : kMsgTogglePlay);
+    } else if (key >= kKeyLeftArrow && key <= kKeyDownArrow) {
+        // The arrows are swallowed.
+    } else if (key == kKeyDelete) {
+        if (window != nullptr)
+            window->PostMessage(kMsgRemove);
+        QWidget::keyPressEvent(event);
+    } else {
+        QWidget::keyPressEvent(event);
+    }
+    lastKeyDown_ = now;
+}
+
+void SampleView::focusInEvent(QFocusEvent* event)
+{
+    QWidget::focusInEvent(event);
+    if (container_ != nullptr)
+        container_->update();
+}
+
+void SampleView::focusOutEvent(QFocusEvent* event)
+{
+    QWidget::focusOutEvent(event);
+    if (container_ != nullptr)
+        container_->update();
+}
+
+QSize SampleView::minimumSizeHint() const
+{
+    return {kMinimumWidth, kMinimumHeight};
+}
+
+QSize SampleView::sizeHint() const
+{
+    return {kMaximumSize / 4, 100};
+}
+
+}  // namespace glimmet

@@ -1,0 +1,107 @@
+#pragma once
+
+#include <array>
+#include <cstdint>
+
+#include <QImage>
+#include <QWidget>
+
+#include "edit/ChannelView.h"
+#include "support/MessageTarget.h"
+#include "views/ViewRect.h"
+
+namespace glimmet {
+
+class Channel;
+class ChannelContainerView;
+
+/// One channel's waveform inside the channel container. It renders into an
+/// off-screen RGB32 image, column by column, as a density picture of the
+/// samples under each pixel column, with the range, the edit cursor and the
+/// play mark as colourings of whole columns. The horizontal scale is the
+/// container's.
+///
+/// Clicks go to the container; Space, Shift+Space and Delete become 'cnpl',
+/// 'pfcr' and 'rmov' for the window; every paint posts a bare 'smmd' to the
+/// container (the redraw handshake of channel moves) and a posted 'mvsm'
+/// re-renders the whole view.
+///
+/// GUI thread only. The channel and container are not owned.
+class SampleView : public QWidget, public ChannelView, public MessageTarget {
+    Q_OBJECT
+
+public:
+    /// Time source in microseconds; system_time() unless a test replaces it.
+    using Clock = int64_t (*)();
+
+    SampleView(Channel* channel, ChannelContainerView* container, QWidget* parent = nullptr);
+    ~SampleView() override;
+
+    Channel* GetChannel() const { return channel_; }
+    ChannelContainerView* Container() const { return container_; }
+
+    /// Places the view in its parent, then rebuilds bitmap and row table and
+    /// re-renders, even when the size did not change. Returns Frame().
+    ViewRect Layout(const ViewRect& frame);
+    /// Rebuilds the bitmap and the row table for the size, then re-renders.
+    void FrameResized(float width, float height);
+    /// The view's own rectangle (0, 0, width - 1, height - 1).
+    ViewRect Bounds() const;
+    /// The view's rectangle in its parent's coordinates.
+    ViewRect Frame() const;
+
+    /// Re-renders the whole view.
+    void Update() override;
+    /// Re-renders the columns of rect (always over the full height) and
+    /// schedules a repaint of it.
+    void Update(ViewRect rect);
+    bool IsFocus() const override;
+
+    /// The off-screen image: one pixel per view pixel, null when it could not
+    /// be made.
+    const QImage& Bitmap() const { return bitmap_; }
+    /// The pixel row of a sample value.
+    int32_t RowOf(int16_t sample) const;
+
+    using MessageTarget::PostMessage;
+    /// Queues the message for MessageReceived in the GUI thread.
+    status_t PostMessage(const Message& message) override;
+    void MessageReceived(const Message& message);
+
+    /// Tests replace the clock behind the double-click and key timing.
+    void SetClock(Clock clock) { clock_ = clock; }
+
+    QSize minimumSizeHint() const override;
+    QSize sizeHint() const override;
+
+protected:
+    void paintEvent(QPaintEvent* event) override;
+    void mousePressEvent(QMouseEvent* event) override;
+    void mouseMoveEvent(QMouseEvent* event) override;
+    void mouseReleaseEvent(QMouseEvent* event) override;
+    void keyPressEvent(QKeyEvent* event) override;
+    void focusInEvent(QFocusEvent* event) override;
+    void focusOutEvent(QFocusEvent* event) override;
+    void resizeEvent(QResizeEvent* event) override;
+    void customEvent(QEvent* event) override;
+
+private:
+    static constexpr int kRowTableSize = 8192;
+
+    void BuildRowTable(int32_t rows);
+    /// The key as one character of the original key map (arrows 0x1c to
+    /// 0x1f, Delete 0x7f); 0 for a key that produces no character.
+    static int KeyByte(const QKeyEvent* event);
+    QPointF ToContainer(QPointF point) const;
+
+    Channel* channel_;
+    ChannelContainerView* container_;
+    QImage bitmap_;
+    int64_t lastMouseDown_;
+    int64_t lastKeyDown_;
+    std::array<int16_t, kRowTableSize> rowTable_{};
+    Clock clock_;
+    bool inLayout_ = false;
+};
+
+}  // namespace glimmet
