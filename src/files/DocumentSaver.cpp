@@ -1,0 +1,64 @@
+#include "files/DocumentSaver.h"
+
+#include <cstdio>
+#include <mutex>
+#include <system_error>
+
+#include "edit/HistoryManager.h"
+#include "files/FileTypeAttribute.h"
+#include "files/SaveTarget.h"
+#include "files/WavFileWriter.h"
+#include "sound/ChannelManager.h"
+
+namespace glimmet {
+
+status_t DocumentSaver::SaveFile(const std::filesystem::path& file, SaveTarget& target)
+{
+    const std::filesystem::path destination = FollowLinks(file);
+    WavFileWriter writer(destination);
+    if (writer.InitCheck() == B_OK) {
+        if (writer.CommitHeader() == B_OK)
+            WriteDocument(target.DocumentManager(), writer);
+        if (HistoryManager* history = target.DocumentHistory())
+            history->Save();
+        target.SetSaveItemEnabled(false);
+    }
+    const status_t released = writer.Finish();
+    if (released != B_OK) {
+        std::printf("Error releasing tracks: %s\n", StatusText(released));
+        std::fflush(stdout);
+    }
+    return SetFileType(destination, kWavType);
+}
+
+status_t DocumentSaver::WriteDocument(ChannelManager* manager, FrameWriter& writer)
+{
+    if (manager == nullptr)
+        return B_OK;
+    int16_t buffer[kFramesPerBuffer * 2];
+    std::lock_guard documentLock(manager->DocumentLock());
+    manager->SetCurrentFrame(0);
+    const int64_t total = manager->FrameCount();
+    int64_t written = 0;
+    while (written < total) {
+        int64_t frames = kFramesPerBuffer;
+        if (!manager->FillBuffer(buffer, &frames))
+            break;
+        const status_t status = writer.WriteFrames(buffer, frames);
+        if (status != B_OK)
+            return status;
+        written += frames;
+    }
+    return B_OK;
+}
+
+std::filesystem::path DocumentSaver::FollowLinks(const std::filesystem::path& file)
+{
+    std::error_code error;
+    if (!std::filesystem::is_symlink(file, error))
+        return file;
+    const std::filesystem::path target = std::filesystem::canonical(file, error);
+    return error ? file : target;
+}
+
+}  // namespace glimmet

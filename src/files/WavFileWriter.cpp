@@ -1,0 +1,258 @@
+#include "files/WavFileWriter.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <random>
+#include <string>
+
+extern "C" {
+#include <libavformat/avformat.h>
+#include <libavutil/dict.h>
+#include <libavutil/mem.h>
+}
+
+#include "files/ErrnoStatus.h"
+#include "files/FFmpegStatus.h"
+
+namespace glimmet {
+
+namespace {
+
+constexpr int kIOBufferSize = 64 * 1024;
+constexpr int kBytesPerFrame = WavFileWriter::kChannelCount * int(sizeof(int16_t));
+// Names tried for the temporary file before giving up.
+constexpr int kTemporaryNameAttempts = 100;
+
+std::string RandomSuffix()
+{
+    static thread_local std::mt19937_64 generator{std::random_device{}()};
+    char text[17];
+    std::snprintf(text, sizeof(text), "%016llx", static_cast<unsigned long long>(generator()));
+    return text;
+}
+
+std::filesystem::path DirectoryOf(const std::filesystem::path& file)
+{
+    const std::filesystem::path parent = file.parent_path();
+    return parent.empty() ? std::filesystem::path(".") : parent;
+}
+
+/// Makes the rename durable: the directory entry reaches the disk too.
+void SyncDirectory(const std::filesystem::path& directory)
+{
+    const int fd = open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (fd < 0)
+        return;
+    fsync(fd);
+    close(fd);
+}
+
+}  // namespace
+
+WavFileWriter::WavFileWriter(const std::filesystem::path& destination) : destination_(destination)
+{
+    openStatus_ = CreateTemporaryFile();
+    if (openStatus_ == B_OK)
+        openStatus_ = CreateMuxer();
+    NoteFailure(openStatus_);
+}
+
+WavFileWriter::~WavFileWriter()
+{
+    Discard();
+    avformat_free_context(muxer_);
+    if (io_ != nullptr)
+        av_freep(&io_->buffer);
+    avio_context_free(&io_);
+}
+
+status_t WavFileWriter::CreateTemporaryFile()
+{
+    struct stat existing {};
+    const bool replacing = stat(destination_.c_str(), &existing) == 0;
+    if (replacing && S_ISDIR(existing.st_mode))
+        return B_IS_A_DIRECTORY;
+    const std::filesystem::path directory = DirectoryOf(destination_);
+    for (int attempt = 0; attempt < kTemporaryNameAttempts; ++attempt) {
+        const std::filesystem::path candidate =
+            directory / ("." + destination_.filename().string() + ".glimmet-" + RandomSuffix());
+        fd_ = open(candidate.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
+        if (fd_ >= 0) {
+            temporary_ = candidate;
+            // The new file takes the place of the old one, permissions included.
+            if (replacing)
+                fchmod(fd_, existing.st_mode & 07777);
+            return B_OK;
+        }
+        if (errno != EEXIST)
+            return StatusFromErrno(errno);
+    }
+    return B_ERROR;
+}
+
+status_t WavFileWriter::CreateMuxer()
+{
+    int error = avformat_alloc_output_context2(&muxer_, nullptr, "wav", nullptr);
+    if (error < 0 || muxer_ == nullptr)
+        return B_MEDIA_NO_HANDLER;
+    auto* buffer = static_cast<unsigned char*>(av_malloc(kIOBufferSize));
+    if (buffer == nullptr)
+        return B_NO_MEMORY;
+    io_ = avio_alloc_context(buffer, kIOBufferSize, 1, this, nullptr, WritePacket, Seek);
+    if (io_ == nullptr) {
+        av_free(buffer);
+        return B_NO_MEMORY;
+    }
+    muxer_->pb = io_;
+    // Bit-exact output leaves out the encoder's name, so the header is the
+    // canonical 44 bytes.
+    muxer_->flags |= AVFMT_FLAG_BITEXACT | AVFMT_FLAG_CUSTOM_IO;
+
+    AVStream* stream = avformat_new_stream(muxer_, nullptr);
+    if (stream == nullptr)
+        return B_NO_MEMORY;
+    AVCodecParameters* parameters = stream->codecpar;
+    parameters->codec_type = AVMEDIA_TYPE_AUDIO;
+    parameters->codec_id = AV_CODEC_ID_PCM_S16LE;
+    parameters->sample_rate = kFrameRate;
+    av_channel_layout_default(&parameters->ch_layout, kChannelCount);
+    parameters->format = AV_SAMPLE_FMT_S16;
+    parameters->bits_per_coded_sample = 16;
+    parameters->block_align = kBytesPerFrame;
+    parameters->bit_rate = int64_t(kFrameRate) * kBytesPerFrame * 8;
+    stream->time_base = AVRational{1, kFrameRate};
+    return B_OK;
+}
+
+status_t WavFileWriter::CommitHeader()
+{
+    if (openStatus_ != B_OK)
+        return openStatus_;
+    if (headerWritten_)
+        return B_OK;
+    AVDictionary* options = nullptr;
+    av_dict_set(&options, "rf64", "never", 0);
+    const int error = avformat_write_header(muxer_, &options);
+    av_dict_free(&options);
+    status_t status = StatusFromAVError(error);
+    if (status == B_OK) {
+        avio_flush(io_);
+        status = IOStatus();
+    }
+    headerWritten_ = status == B_OK;
+    NoteFailure(status);
+    return status;
+}
+
+status_t WavFileWriter::WriteFrames(const int16_t* frames, int64_t count)
+{
+    if (!headerWritten_)
+        return B_NO_INIT;
+    if (frames == nullptr || count <= 0 || count > INT32_MAX / kBytesPerFrame)
+        return B_BAD_VALUE;
+    AVPacket* packet = av_packet_alloc();
+    if (packet == nullptr)
+        return B_NO_MEMORY;
+    // The muxer writes the bytes out at once; it never keeps the pointer.
+    packet->data = const_cast<uint8_t*>(reinterpret_cast<const uint8_t*>(frames));
+    packet->size = int(count) * kBytesPerFrame;
+    packet->stream_index = 0;
+    packet->pts = packet->dts = framesWritten_;
+    packet->duration = count;
+    const int error = av_write_frame(muxer_, packet);
+    av_packet_free(&packet);
+    status_t status = StatusFromAVError(error);
+    if (status == B_OK)
+        status = IOStatus();
+    if (status == B_OK)
+        framesWritten_ += count;
+    NoteFailure(status);
+    return status;
+}
+
+status_t WavFileWriter::Finish()
+{
+    if (firstFailure_ == B_OK && !headerWritten_)
+        NoteFailure(B_NO_INIT);
+    if (firstFailure_ == B_OK)
+        NoteFailure(Complete());
+    if (firstFailure_ != B_OK)
+        Discard();
+    return firstFailure_;
+}
+
+status_t WavFileWriter::Complete()
+{
+    status_t status = StatusFromAVError(av_write_trailer(muxer_));
+    avio_flush(io_);
+    if (status == B_OK)
+        status = IOStatus();
+    if (status == B_OK && fsync(fd_) != 0)
+        status = StatusFromErrno(errno);
+    if (status != B_OK)
+        return status;
+    const int closed = close(fd_);
+    fd_ = -1;
+    if (closed != 0)
+        return StatusFromErrno(errno);
+    if (rename(temporary_.c_str(), destination_.c_str()) != 0)
+        return StatusFromErrno(errno);
+    temporary_.clear();
+    SyncDirectory(DirectoryOf(destination_));
+    return B_OK;
+}
+
+void WavFileWriter::Discard()
+{
+    if (fd_ >= 0) {
+        close(fd_);
+        fd_ = -1;
+    }
+    if (!temporary_.empty()) {
+        unlink(temporary_.c_str());
+        temporary_.clear();
+    }
+}
+
+void WavFileWriter::NoteFailure(status_t status)
+{
+    if (firstFailure_ == B_OK)
+        firstFailure_ = status;
+}
+
+status_t WavFileWriter::IOStatus() const
+{
+    return io_ == nullptr || io_->error == 0 ? B_OK : StatusFromAVError(io_->error);
+}
+
+int WavFileWriter::WritePacket(void* opaque, uint8_t* buffer, int size)
+{
+    auto* writer = static_cast<WavFileWriter*>(opaque);
+    int done = 0;
+    while (done < size) {
+        const ssize_t written = write(writer->fd_, buffer + done, size_t(size - done));
+        if (written < 0 && errno == EINTR)
+            continue;
+        if (written <= 0)
+            return AVERROR(written < 0 ? errno : EIO);
+        done += int(written);
+    }
+    return done;
+}
+
+int64_t WavFileWriter::Seek(void* opaque, int64_t offset, int whence)
+{
+    auto* writer = static_cast<WavFileWriter*>(opaque);
+    if (whence & AVSEEK_SIZE) {
+        struct stat info {};
+        return fstat(writer->fd_, &info) == 0 ? int64_t(info.st_size) : AVERROR(errno);
+    }
+    const off_t position = lseek(writer->fd_, off_t(offset), whence & ~AVSEEK_FORCE);
+    return position < 0 ? AVERROR(errno) : int64_t(position);
+}
+
+}  // namespace glimmet
