@@ -202,13 +202,16 @@ void PlaybackGraph::StopNodes()
 {
     if (!roster_ || producer_ == nullptr)
         return;
-    producer_->Stop(0, true);
-    // Wait out a period being served, so that no buffer is mixed after this
-    // returns: the next period runs the stop first.
-    if (device_ != 0) {
-        SDL_LockAudioDevice(device_);
-        SDL_UnlockAudioDevice(device_);
+    if (device_ == 0) {
+        producer_->Stop(0, true);
+        return;
     }
+    // With the device locked no period is being served, so the stop is run
+    // here and now: once this returns nothing more is mixed, and the window
+    // may reset the play position safely.
+    SDL_LockAudioDevice(device_);
+    producer_->HandleEvent(MediaEvent{B_STOP, 0}, 0, true);
+    SDL_UnlockAudioDevice(device_);
 }
 
 void PlaybackGraph::CloseDevice()
