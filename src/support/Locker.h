@@ -33,7 +33,7 @@ public:
 private:
     void NoteAcquired();
 
-    std::recursive_timed_mutex mutex_;
+    std::recursive_mutex mutex_;
     std::atomic<std::thread::id> owner_{};
     int32_t depth_ = 0;  // written only by the owner while it holds mutex_
 };
