@@ -475,7 +475,6 @@ void ChannelContainerView::UpdateSizeLimits()
 {
     const int maximumHeight = kMaximumSize + int(sampleViews_.size()) * (kMaximumSize + kFrameAllowance);
     setMaximumSize(kMaximumSize, std::min(maximumHeight, QWIDGETSIZE_MAX));
-    setMinimumSize(minimumSizeHint());
     updateGeometry();
 }
 
