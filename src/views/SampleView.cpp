@@ -39,7 +39,9 @@ SampleView::SampleView(Channel* channel, ChannelContainerView* container, QWidge
 {
     setObjectName("sample view");
     setAttribute(Qt::WA_OpaquePaintEvent);
-    setFocusPolicy(Qt::StrongFocus);
+    // Focus comes with a click, so that no channel is focused when a window
+    // opens.
+    setFocusPolicy(Qt::ClickFocus);
     setSizePolicy(QSizePolicy::Expanding, QSizePolicy::Expanding);
     lastMouseDown_ = clock_();
     lastKeyDown_ = lastMouseDown_;

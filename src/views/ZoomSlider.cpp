@@ -38,8 +38,6 @@ ZoomSlider::ZoomSlider(MessageTarget* target, int64_t low, int64_t high, int64_t
 {
     setObjectName("zoom slider");
     setAttribute(Qt::WA_OpaquePaintEvent);
-    setMinimumSize(kMinimumWidth, kFixedHeight);
-    setMaximumSize(kMaximumWidth, kFixedHeight);
     setSizePolicy(QSizePolicy::Expanding, QSizePolicy::Fixed);
     resize(11, 11);
     connect(repeatTimer_, &QTimer::timeout, this, [this] {
@@ -209,7 +207,7 @@ QSize ZoomSlider::minimumSizeHint() const
 
 QSize ZoomSlider::sizeHint() const
 {
-    return {200, kFixedHeight};
+    return {kMaximumWidth / 10, kFixedHeight};
 }
 
 status_t ZoomSlider::PostMessage(const Message& message)
