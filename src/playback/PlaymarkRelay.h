@@ -24,8 +24,9 @@ class MessageTarget;
 /// (the audio thread).
 class PlaymarkRelay {
 public:
-    /// Updates that may wait for the window; more are dropped, and counted.
-    static constexpr size_t kCapacity = 256;
+    /// Updates that may wait for the window (about 24 seconds of buffers);
+    /// more are dropped, and counted.
+    static constexpr size_t kCapacity = 4096;
 
     explicit PlaymarkRelay(MessageTarget* window);
     ~PlaymarkRelay();

@@ -177,6 +177,18 @@ int64_t ReferencePlayback::PositionAfter(int64_t current, int64_t buffers, int64
     return current;
 }
 
+std::vector<int64_t> ReferencePlayback::Positions(int64_t current, int64_t buffers, int64_t frames) const
+{
+    std::vector<int64_t> positions;
+    std::vector<float> ignored;
+    for (int64_t i = 0; i < buffers; i++) {
+        ignored.clear();
+        Buffer(&current, frames, &ignored);
+        positions.push_back(current);
+    }
+    return positions;
+}
+
 void AddChannels(ChannelManager* manager, const std::vector<ChannelSpec>& channels)
 {
     for (const ChannelSpec& spec : channels) {

@@ -72,6 +72,8 @@ public:
     std::vector<float> Play(int64_t current, int64_t buffers, int64_t frames = kBufferFrames) const;
     /// Where the play position lies after those buffers.
     int64_t PositionAfter(int64_t current, int64_t buffers, int64_t frames = kBufferFrames) const;
+    /// The play position after each of those buffers.
+    std::vector<int64_t> Positions(int64_t current, int64_t buffers, int64_t frames = kBufferFrames) const;
     int64_t FrameCount() const;
 
 private:
