@@ -78,8 +78,11 @@ status_t WavFileWriter::CreateTemporaryFile()
         return B_IS_A_DIRECTORY;
     const std::filesystem::path directory = DirectoryOf(destination_);
     for (int attempt = 0; attempt < kTemporaryNameAttempts; ++attempt) {
-        const std::filesystem::path candidate =
-            directory / ("." + destination_.filename().string() + ".glimmet-" + RandomSuffix());
+        std::string name = ".";
+        name += destination_.filename().string();
+        name += ".glimmet-";
+        name += RandomSuffix();
+        const std::filesystem::path candidate = directory / name;
         fd_ = open(candidate.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
         if (fd_ >= 0) {
             temporary_ = candidate;
