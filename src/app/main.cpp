@@ -1,12 +1,46 @@
-#include <cstdio>
+#include <QApplication>
+#include <QDir>
+#include <QStringList>
 
-// The document window is not built yet: this program only says so. The sound
-// engine it will drive is in place and exercised by the test suite.
+#include <filesystem>
+
+#include "app/InstanceServer.h"
+#include "app/Quillex.h"
+
+using glimmet::InstanceServer;
+using glimmet::Quillex;
+
+namespace {
+
+/// The command line's files as absolute paths, for a running instance whose
+/// working folder is not ours; names that resolve to nothing are left out.
+QStringList ResolvedFiles(const QStringList& arguments)
+{
+    QStringList files;
+    for (qsizetype index = 1; index < arguments.size(); ++index) {
+        std::filesystem::path resolved;
+        if (Quillex::ResolvePath(std::filesystem::path(arguments[index].toStdString()), &resolved))
+            files << QString::fromStdString(resolved.string());
+    }
+    return files;
+}
+
+}  // namespace
+
 int main(int argc, char** argv)
 {
-    std::printf("Glimmet %s: the editor window is not available in this build yet.\n", "0.1");
-    std::printf("This build contains the sound engine (channels, mixing) and its tests.\n");
-    for (int i = 1; i < argc; ++i)
-        std::printf("Not opened (no editor window yet): %s\n", argv[i]);
-    return 0;
+    QApplication toolkit(argc, argv);
+    QApplication::setApplicationName(QStringLiteral("Glimmet"));
+    QApplication::setDesktopFileName(QStringLiteral("glimmet"));
+    // Windows end through the application object, not by being closed.
+    QApplication::setQuitOnLastWindowClosed(false);
+
+    const QStringList arguments = QApplication::arguments();
+    const QString instanceName = InstanceServer::DefaultName();
+    if (InstanceServer::ForwardToRunningInstance(instanceName, ResolvedFiles(arguments)))
+        return 0;
+
+    Quillex application;
+    InstanceServer server(instanceName, &application);
+    return application.Run(arguments);
 }

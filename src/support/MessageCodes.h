@@ -27,6 +27,7 @@ inline constexpr uint32_t kMsgFeedback = FourCharCode("fdbk");
 inline constexpr uint32_t kMsgAboutRequested = FourCharCode("_ABR");
 inline constexpr uint32_t kMsgQuitRequested = FourCharCode("_QRQ");
 inline constexpr uint32_t kMsgCancel = FourCharCode("_CNC");
+inline constexpr uint32_t kMsgRefsReceived = FourCharCode("_RRC");
 inline constexpr uint32_t kMsgHelp = FourCharCode("help");
 
 // Standard editing commands.

@@ -1,0 +1,269 @@
+#include "app/Quillex.h"
+
+#include <QCoreApplication>
+#include <QDesktopServices>
+#include <QFileDialog>
+#include <QMimeDatabase>
+#include <QUrl>
+
+#include <algorithm>
+#include <mutex>
+
+#include "app/QuillexWindow.h"
+#include "support/MessageCodes.h"
+
+namespace glimmet {
+
+namespace {
+
+Quillex* gApplication = nullptr;
+
+/// "Sound files (*.wav *.mp3 ...)" from every audio type the system knows.
+QString SoundFileFilter()
+{
+    QStringList patterns;
+    for (const QMimeType& type : QMimeDatabase().allMimeTypes()) {
+        if (type.name().startsWith(QStringLiteral("audio")))
+            patterns << type.globPatterns();
+    }
+    patterns.removeDuplicates();
+    patterns.sort();
+    return QStringLiteral("Sound files (") + patterns.join(' ') + QStringLiteral(")");
+}
+
+}  // namespace
+
+Quillex::Quillex() : quitHook_([] { QCoreApplication::exit(0); })
+{
+    windows_.reserve(10);
+    gApplication = this;
+    CopyBuffer::SetApplicationBuffer(&copyBuffer_);
+}
+
+Quillex::~Quillex()
+{
+    // Windows still open when the application object goes (a test, or an
+    // event loop ended from outside) are ended with it.
+    std::vector<QuillexWindow*> remaining;
+    {
+        std::lock_guard guard(windowLock_);
+        remaining.swap(windows_);
+    }
+    for (QuillexWindow* window : remaining)
+        delete window;
+    CopyBuffer::SetApplicationBuffer(nullptr);
+    gApplication = nullptr;
+}
+
+Quillex* Quillex::Instance()
+{
+    return gApplication;
+}
+
+int Quillex::Run(const QStringList& arguments)
+{
+    ArgvReceived(arguments);
+    ReadyToRun();
+    return QCoreApplication::exec();
+}
+
+bool Quillex::ResolvePath(const std::filesystem::path& path, std::filesystem::path* resolved)
+{
+    std::error_code error;
+    if (path.empty() || !std::filesystem::exists(path, error))
+        return false;
+    const std::filesystem::path absolute = std::filesystem::absolute(path, error);
+    if (error)
+        return false;
+    *resolved = absolute.lexically_normal();
+    return true;
+}
+
+void Quillex::ArgvReceived(const QStringList& arguments)
+{
+    for (qsizetype index = 1; index < arguments.size(); ++index) {
+        std::filesystem::path path;
+        if (!ResolvePath(std::filesystem::path(arguments[index].toStdString()), &path))
+            continue;
+        if (QuillexWindow* window = NewWindow())
+            LoadInto(window, path);
+    }
+}
+
+void Quillex::RefsReceived(const Message& message)
+{
+    std::filesystem::path path;
+    for (int32_t index = 0; message.FindPath("refs", &path, index) == B_OK; ++index) {
+        if (QuillexWindow* requesting = openRequestingWindow_.data()) {
+            LoadInto(requesting, path);
+            openRequestingWindow_ = nullptr;
+        } else if (QuillexWindow* window = NewWindow()) {
+            LoadInto(window, path);
+        }
+    }
+}
+
+void Quillex::LoadInto(QuillexWindow* window, const std::filesystem::path& path)
+{
+    window->LockWindow();
+    window->SetTo(path);
+    window->UnlockWindow();
+}
+
+void Quillex::ReadyToRun()
+{
+    std::lock_guard guard(windowLock_);
+    if (windows_.empty())
+        NewWindow();
+}
+
+QuillexWindow* Quillex::NewWindow()
+{
+    std::lock_guard guard(windowLock_);
+    auto* window = new QuillexWindow();
+    windows_.push_back(window);
+    return window;
+}
+
+bool Quillex::DeleteWindow(QuillexWindow* window)
+{
+    std::lock_guard guard(windowLock_);
+    const auto found = std::find(windows_.begin(), windows_.end(), window);
+    if (window == nullptr || found == windows_.end())
+        return false;
+    windows_.erase(found);
+    window->LockWindow();
+    window->Quit();
+    if (windows_.empty())
+        PostMessage(kMsgQuitRequested);
+    return true;
+}
+
+bool Quillex::BroadcastMessage(const Message& message)
+{
+    std::lock_guard guard(windowLock_);
+    for (QuillexWindow* window : windows_)
+        window->PostMessage(message);
+    return true;
+}
+
+bool Quillex::QuitRequested()
+{
+    std::lock_guard guard(windowLock_);
+    if (windows_.empty())
+        return true;
+    BroadcastMessage(Message(kMsgQuitRequested));
+    return false;
+}
+
+bool Quillex::IsListed(QuillexWindow* window)
+{
+    std::lock_guard guard(windowLock_);
+    return std::find(windows_.begin(), windows_.end(), window) != windows_.end();
+}
+
+int32_t Quillex::CountWindows()
+{
+    std::lock_guard guard(windowLock_);
+    return int32_t(windows_.size());
+}
+
+QuillexWindow* Quillex::WindowAt(int32_t index)
+{
+    std::lock_guard guard(windowLock_);
+    if (index < 0 || size_t(index) >= windows_.size())
+        return nullptr;
+    return windows_[size_t(index)];
+}
+
+bool Quillex::SetCopyBuffer(std::vector<CopyBuffer::Samples> channels, int64_t frames)
+{
+    return copyBuffer_.SetCopyBuffer(std::move(channels), frames);
+}
+
+bool Quillex::GetCopyBuffer(std::vector<const int16_t*>& channels, int32_t& count, int64_t& frames) const
+{
+    return copyBuffer_.GetCopyBuffer(channels, count, frames);
+}
+
+void Quillex::MessageReceived(const Message& message)
+{
+    switch (message.what) {
+    case kMsgNewWindow:
+        NewWindow();
+        break;
+    case kMsgOpen: {
+        QuillexWindow* window = nullptr;
+        if (message.FindPointer("window", &window) == B_OK && IsListed(window))
+            openRequestingWindow_ = window;
+        ShowOpenPanel();
+        break;
+    }
+    case kMsgCancel:
+        openRequestingWindow_ = nullptr;
+        break;
+    case kMsgRefsReceived:
+        RefsReceived(message);
+        break;
+    case kMsgDeleteWindow: {
+        QuillexWindow* window = nullptr;
+        if (message.FindPointer("window", &window) == B_OK)
+            DeleteWindow(window);
+        break;
+    }
+    case kMsgToggleBubbleHelp:
+        ToggleBubbleHelp();
+        break;
+    case kMsgFeedback:
+        SendFeedback();
+        break;
+    case kMsgQuitRequested:
+        if (QuitRequested() && quitHook_)
+            quitHook_();
+        break;
+    default:
+        Handler::MessageReceived(message);
+        break;
+    }
+}
+
+void Quillex::ShowOpenPanel()
+{
+    if (!openPanel_) {
+        openPanel_ = std::make_unique<QFileDialog>();
+        openPanel_->setOption(QFileDialog::DontUseNativeDialog);
+        openPanel_->setFileMode(QFileDialog::ExistingFiles);
+        openPanel_->setAcceptMode(QFileDialog::AcceptOpen);
+        openPanel_->setNameFilters({SoundFileFilter(), QStringLiteral("All files (*)")});
+        connect(openPanel_.get(), &QFileDialog::filesSelected, this, &Quillex::OpenPanelChose);
+        connect(openPanel_.get(), &QFileDialog::rejected, this, [this] { PostMessage(kMsgCancel); });
+    } else {
+        // Re-reads the folder, which may have changed since last time.
+        openPanel_->setDirectory(openPanel_->directory());
+    }
+    openPanel_->show();
+    openPanel_->raise();
+}
+
+void Quillex::OpenPanelChose(const QStringList& files)
+{
+    Message refs(kMsgRefsReceived);
+    for (const QString& file : files)
+        refs.AddPath("refs", std::filesystem::path(file.toStdString()));
+    PostMessage(refs);
+}
+
+void Quillex::ToggleBubbleHelp()
+{
+    bubbleHelpEnabled_ = !bubbleHelpEnabled_;
+    Message mark(kMsgToggleBubbleHelp);
+    mark.AddBool("enable", bubbleHelpEnabled_);
+    BroadcastMessage(mark);
+}
+
+void Quillex::SendFeedback()
+{
+    QDesktopServices::openUrl(QUrl(QStringLiteral("mailto:") + QString::fromLatin1(kFeedbackAddress)));
+}
+
+}  // namespace glimmet

@@ -1,0 +1,179 @@
+#pragma once
+
+#include <QMainWindow>
+
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <vector>
+
+#include "sound/DocumentWindow.h"
+#include "support/Locker.h"
+#include "support/Message.h"
+
+class QAction;
+class QCheckBox;
+class QComboBox;
+class QFileDialog;
+class QMenuBar;
+
+namespace glimmet {
+
+class Action;
+class ChannelContainer;
+class ChannelManager;
+class HistoryManager;
+class TextControl;
+enum class KeptMenuItem;
+
+/// A document window: one open sound with its channels, history, views,
+/// menus and controls. Every command reaches it as a Message; MessageReceived
+/// is the program's main dispatch.
+///
+/// Widgets live in the GUI thread, so all dispatch runs there; the window
+/// lock is held around each dispatch so that the audio thread's timed try
+/// (visible play mode) knows when the view may be read.
+class QuillexWindow : public QMainWindow, public DocumentWindow {
+    Q_OBJECT
+
+public:
+    /// Answers of the "Save changes?" question, numbered left to right.
+    enum SaveAnswer { kDontSave = 0, kSave = 1, kDontQuit = 2 };
+    /// Asks the question for a window; the default shows the alert.
+    using SaveQuestion = std::function<int(QuillexWindow*)>;
+
+    QuillexWindow();
+    ~QuillexWindow() override;
+
+    // DocumentWindow: may be called from any thread.
+    using DocumentWindow::PostMessage;
+    status_t PostMessage(const Message& message) override;
+    bool LockWithTimeout(int64_t timeoutMicros) override;
+    void UnlockWindow() override;
+    void GetVisibleFrames(int64_t* first, int64_t* last) override;
+
+    void LockWindow();
+
+    /// Handles one command; see the window's message table.
+    void MessageReceived(const Message& message);
+
+    /// Asks about saving when needed and, when closing is agreed, asks the
+    /// application to delete the window. Always false: a window never ends
+    /// itself.
+    bool QuitRequested();
+    /// Ends the window for good: releases the window lock the caller took,
+    /// hides it and deletes it once control returns to the event loop.
+    void Quit();
+
+    /// Copies the range of every selected channel into the application's
+    /// copy buffer; with no channel selected the buffer stays as it was.
+    void Copy();
+    /// Makes action the pending one, binds it and, unless it asks for
+    /// parameters first, posts the command that runs it.
+    void SetupAction(Action* action);
+    /// Relabels and enables the undo, redo, delete history and save items
+    /// from the history.
+    void UpdateUndoMenu();
+
+    /// Loads a sound file: replaces the document's channels, or adds to them
+    /// when append on load is set. The result of the reader.
+    status_t SetTo(const std::filesystem::path& file);
+    /// Writes the document as a WAV file and marks the history saved.
+    status_t SaveFile(const std::filesystem::path& file);
+
+    /// The "Save changes?" alert with its three buttons; returns the index of
+    /// the button chosen.
+    static int AskSaveChanges(QuillexWindow* window);
+    /// Replaces the question asked on closing (null restores the alert).
+    static void SetSaveQuestion(SaveQuestion question);
+
+    ChannelManager* Manager() const { return manager_; }
+    HistoryManager* History() const { return history_; }
+    Action* PendingAction() const { return pendingAction_.get(); }
+    bool IsPlaying() const { return playing_; }
+    bool AppendOnLoad() const { return appendOnLoad_; }
+    void SetAppendOnLoad(bool append) { appendOnLoad_ = append; }
+    const std::optional<std::filesystem::path>& FileEntry() const { return fileEntry_; }
+    void SetFileEntry(std::optional<std::filesystem::path> entry) { fileEntry_ = std::move(entry); }
+    QAction* MenuItem(KeptMenuItem which) const;
+    TextControl* RangeStartField() const { return rangeStartField_; }
+    TextControl* RangeEndField() const { return rangeEndField_; }
+    QComboBox* PlayModePopup() const { return playModePopup_; }
+    QCheckBox* LoopBox() const { return loopBox_; }
+    /// The save panel, made on first use; null before.
+    QFileDialog* SavePanel() const { return savePanel_.get(); }
+
+protected:
+    void customEvent(QEvent* event) override;
+    void closeEvent(QCloseEvent* event) override;
+    void dragEnterEvent(QDragEnterEvent* event) override;
+    void dropEvent(QDropEvent* event) override;
+
+private:
+    QMenuBar* CreateMenu();
+    void KeepMenuItem(KeptMenuItem which, QAction* item);
+    QWidget* CreateControlRow();
+    QWidget* CreatePlayModePopup();
+    void PostToApplication(const Message& message);
+
+    // Handlers of the message table.
+    void HandlePlayMode();
+    void HandleLoop();
+    void HandleRangeStartChanged(const Message& message);
+    void HandleRangeEndChanged(const Message& message);
+    void HandleSetRangeStart();
+    void HandleSetRangeEnd();
+    void HandleActionGo();
+    void HandleActionCancel();
+    void HandleUndo();
+    void HandleRedo();
+    void HandleClearHistory();
+    void HandleBubbleHelpMark(const Message& message);
+    void HandleOpen(const Message& message);
+    void HandleAppend();
+    void HandleSave();
+    void HandleSavePanelChoice(const Message& message);
+    void HandleDrop(const Message& message);
+    bool HandleEditCommand(uint32_t what);
+
+    ChannelContainer* Container() const;
+    void UpdateChannelViews();
+    void UpdateZoomRangeItem();
+    void ShowSavePanel();
+    void SavePanelChose(const QString& file);
+    bool IsDocumentSaved();
+    void SetDocumentTitle(const std::filesystem::path& file);
+
+    // Declared first so that they outlive everything that points into them.
+    std::unique_ptr<ChannelManager> ownedManager_;
+    std::unique_ptr<HistoryManager> ownedHistory_;
+
+    ChannelManager* manager_;
+    HistoryManager* history_;
+    QAction* bubbleHelpItem_ = nullptr;
+    QAction* zoomRangeItem_ = nullptr;
+    QAction* undoItem_ = nullptr;
+    QAction* redoItem_ = nullptr;
+    QAction* deleteHistoryItem_ = nullptr;
+    QAction* saveItem_ = nullptr;
+    bool playing_ = false;
+    bool playmarkAcknowledged_ = true;
+    bool appendOnLoad_ = false;
+    std::optional<std::filesystem::path> fileEntry_;
+    std::unique_ptr<QFileDialog> savePanel_;
+    std::unique_ptr<Action> pendingAction_;
+    /// Actions replaced while still pending: their dialogs may still be
+    /// open, so they live on until the window ends.
+    std::vector<std::unique_ptr<Action>> supersededActions_;
+    TextControl* rangeStartField_ = nullptr;
+    TextControl* rangeEndField_ = nullptr;
+    QComboBox* playModePopup_ = nullptr;
+    QCheckBox* loopBox_ = nullptr;
+
+    Locker windowLock_;
+    bool quitting_ = false;
+};
+
+}  // namespace glimmet
