@@ -397,6 +397,19 @@ int64_t Channel::FrameCount()
     return count_;
 }
 
+int64_t Channel::EndFrame()
+{
+    std::lock_guard guard(lock_);
+    return End();
+}
+
+void Channel::GetMixSettings(bool* muted, int8_t* pan)
+{
+    std::lock_guard guard(lock_);
+    *muted = muted_;
+    *pan = pan_;
+}
+
 int16_t* Channel::Data()
 {
     std::lock_guard guard(lock_);

@@ -65,6 +65,11 @@ public:
     void SetStartFrameOffset(int64_t first);
     float FrameRate();
     int64_t FrameCount();
+    /// First frame + frame count, read under one lock.
+    int64_t EndFrame();
+    /// Mute flag and pan position, read under one lock (the mixer asks for
+    /// both once per buffer).
+    void GetMixSettings(bool* muted, int8_t* pan);
 
     /// The sample array itself, valid only while no edit runs (callers hold
     /// the document lock). Null for a channel that never held data.
