@@ -208,6 +208,13 @@ void SampleView::mousePressEvent(QMouseEvent* event)
     lastMouseDown_ = now;
 }
 
+// Every press, the second of a double click included, already reached
+// mousePressEvent, which tells double clicks apart by its own timing.
+void SampleView::mouseDoubleClickEvent(QMouseEvent* event)
+{
+    event->accept();
+}
+
 QPointF SampleView::ToContainer(QPointF point) const
 {
     return point + QPointF(pos());
