@@ -1,10 +1,12 @@
 #include "edit/Action.h"
 
 #include <cstdint>
+#include <cstring>
 #include <mutex>
 #include <new>
 
 #include "edit/ChannelContainer.h"
+#include "edit/RangeTransformer.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 
@@ -18,7 +20,7 @@ std::unique_ptr<int16_t[]> Action::AllocateSamples(int64_t count)
 {
     if (count < 1 || count > int64_t(UINT32_MAX))
         return nullptr;
-    return std::unique_ptr<int16_t[]>(new (std::nothrow) int16_t[size_t(count)]());
+    return std::unique_ptr<int16_t[]>(new (std::nothrow) int16_t[size_t(count)]);
 }
 
 status_t Action::InitCheck()
@@ -52,8 +54,9 @@ void Action::TakeSnapshot()
         SavedChannel record;
         record.index = i;
         record.data = AllocateSamples(frameCount_);
-        if (record.data != nullptr)
-            channel->FillBuffer(record.data.get(), rangeStart_, frameCount_);
+        // A copy that fails leaves the snapshot as silence.
+        if (record.data != nullptr && !channel->FillBuffer(record.data.get(), rangeStart_, frameCount_))
+            std::memset(record.data.get(), 0, size_t(frameCount_) * sizeof(int16_t));
         savedChannels_.push_back(std::move(record));
     }
     manager_->Unlock();
@@ -69,28 +72,12 @@ int64_t Action::SnapshotBytes() const
     return bytes;
 }
 
-status_t Action::TransformSelectedRanges(const RangeTransform& transform, bool writeBack)
+status_t Action::TransformSelectedRanges(const std::function<void(int16_t*, int64_t)>& transform)
 {
-    // A range that ends before it starts has no frames: every channel
-    // operation below then refuses it and nothing changes.
-    std::unique_ptr<int16_t[]> buffer;
-    if (frameCount_ >= 1) {
-        buffer = AllocateSamples(frameCount_);
-        if (buffer == nullptr)
-            return B_NO_MEMORY;
-    }
     std::lock_guard guard(manager_->DocumentLock());
-    if (buffer == nullptr)
-        return B_OK;
-    for (int32_t i = 0; Channel* channel = manager_->ChannelAt(i); i++) {
-        if (!channel->IsSelected())
-            continue;
-        channel->FillBuffer(buffer.get(), rangeStart_, frameCount_);
-        transform(buffer.get(), frameCount_);
-        if (writeBack)
-            channel->ReplaceFrames(buffer.get(), frameCount_, rangeStart_, rangeEnd_);
-    }
-    return B_OK;
+    RangeTransformer transformer(manager_, rangeStart_, rangeEnd_);
+    transformer.TransformSelected(transform);
+    return transformer.InitCheck();
 }
 
 status_t Action::Go()

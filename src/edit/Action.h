@@ -58,8 +58,9 @@ public:
     /// Bytes of sample data the snapshot keeps.
     int64_t SnapshotBytes() const;
 
-    /// A zeroed sample array of count samples, or null when count is not a
-    /// size a channel can hold (below 1 or above 2^32 - 1) or memory is short.
+    /// An uninitialised sample array of count samples, or null when count is
+    /// not a size a channel can hold (below 1 or above 2^32 - 1) or memory
+    /// is short.
     static std::unique_ptr<int16_t[]> AllocateSamples(int64_t count);
 
 protected:
@@ -77,18 +78,10 @@ protected:
 
     const std::vector<SavedChannel>& SavedChannels() const { return savedChannels_; }
 
-    /// Rewrites the samples of one channel's range in place.
-    using RangeTransform = std::function<void(int16_t* samples, int64_t count)>;
-
-    /// The common frame of the in-place transforms: for every selected
-    /// channel in order, copies the stored range into one working buffer
-    /// (allocated once, zeroed, and reused from channel to channel, so a
-    /// channel whose copy fails gets what the previous one left there),
-    /// runs transform on it and, with writeBack, writes it over the range.
-    /// Takes the document lock for the whole run; the caller may hold it
-    /// already to make several passes one step. B_NO_MEMORY, changing
-    /// nothing, when no buffer of the range's size can be had.
-    status_t TransformSelectedRanges(const RangeTransform& transform, bool writeBack = true);
+    /// Runs transform over the stored range of every selected channel, in
+    /// channel order, under the document lock (see RangeTransformer).
+    /// B_NO_MEMORY, changing nothing, when no working buffer can be had.
+    status_t TransformSelectedRanges(const std::function<void(int16_t*, int64_t)>& transform);
 
 private:
     void TakeSnapshot();

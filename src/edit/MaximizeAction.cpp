@@ -3,6 +3,7 @@
 #include <cstdlib>
 #include <mutex>
 
+#include "edit/RangeTransformer.h"
 #include "edit/SampleTransform.h"
 #include "sound/ChannelManager.h"
 
@@ -20,17 +21,19 @@ status_t MaximizeAction::Go()
 {
     if (InitCheck() != B_OK)
         return B_ERROR;
-    // Both passes form one step for the playback thread.
+    // Both passes are one step for the playback thread, and share one
+    // working buffer.
     std::lock_guard guard(Manager()->DocumentLock());
+    RangeTransformer transformer(Manager(), RangeStart(), RangeEnd());
     int16_t peak = 0;
-    status_t status = TransformSelectedRanges(
-        [&peak](int16_t* samples, int64_t count) { peak = SampleTransform::Peak(samples, count, peak); },
-        false);
-    if (status != B_OK || std::abs(int32_t(peak)) > kLargestScalablePeak)
-        return status;
-    const float factor = SampleTransform::MaximizeFactor(peak);
-    return TransformSelectedRanges(
-        [factor](int16_t* samples, int64_t count) { SampleTransform::Scale(samples, count, factor); });
+    transformer.InspectSelected(
+        [&peak](const int16_t* samples, int64_t count) { peak = SampleTransform::Peak(samples, count, peak); });
+    if (std::abs(int32_t(peak)) <= kLargestScalablePeak) {
+        const float factor = SampleTransform::MaximizeFactor(peak);
+        transformer.TransformSelected(
+            [factor](int16_t* samples, int64_t count) { SampleTransform::Scale(samples, count, factor); });
+    }
+    return transformer.InitCheck();
 }
 
 const char* MaximizeAction::Name()

@@ -1,5 +1,6 @@
 #include "edit/SampleTransform.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstdlib>
 #include <limits>
@@ -8,6 +9,25 @@
 namespace glimmet {
 
 namespace {
+
+// The loops below work in blocks of a fixed number of samples so that the
+// compiler turns each block into vector code; the last, partial block runs
+// the same per-sample function one sample at a time.
+constexpr int64_t kBlock = 16;
+
+template <typename SampleFunction>
+void ForEachSample(int16_t* samples, int64_t count, SampleFunction function)
+{
+    int64_t i = 0;
+    for (; i + kBlock <= count; i += kBlock) {
+        const double base = double(i);
+        int16_t* block = samples + i;
+        for (int32_t j = 0; j < int32_t(kBlock); j++)
+            block[j] = function(base + double(j), block[j]);
+    }
+    for (; i < count; i++)
+        samples[i] = function(double(i), samples[i]);
+}
 
 // A one-sample range divides 0 by 0: not-a-number, which stores 0. Said
 // outright rather than left to the division, which sanitizers may flag.
@@ -26,8 +46,9 @@ void SampleTransform::FadeIn(int16_t* samples, int64_t count)
     if (ClearSingleSample(samples, count))
         return;
     const double last = double(count - 1);
-    for (int64_t i = 0; i < count; i++)
-        samples[i] = StoreTruncated(double(i) * double(samples[i]) / last);
+    ForEachSample(samples, count, [last](double position, int16_t sample) {
+        return StoreTruncated(position * double(sample) / last);
+    });
 }
 
 void SampleTransform::FadeOut(int16_t* samples, int64_t count)
@@ -35,8 +56,9 @@ void SampleTransform::FadeOut(int16_t* samples, int64_t count)
     if (ClearSingleSample(samples, count))
         return;
     const double last = double(count - 1);
-    for (int64_t i = 0; i < count; i++)
-        samples[i] = StoreTruncated((1.0 - double(i) / last) * double(samples[i]));
+    ForEachSample(samples, count, [last](double position, int16_t sample) {
+        return StoreTruncated((1.0 - position / last) * double(sample));
+    });
 }
 
 void SampleTransform::Revert(int16_t* samples, int64_t count)
@@ -53,16 +75,18 @@ void SampleTransform::RevertPhases(int16_t* samples, int64_t count)
 
 int16_t SampleTransform::Peak(const int16_t* samples, int64_t count, int16_t peakSoFar)
 {
-    int16_t peak = peakSoFar;
-    int32_t magnitude = std::abs(int32_t(peak));
+    // The largest magnitude first (a loop the compiler vectorises), then the
+    // first sample that has it.
+    int32_t largest = 0;
+    for (int64_t i = 0; i < count; i++)
+        largest = std::max(largest, std::abs(int32_t(samples[i])));
+    if (largest <= std::abs(int32_t(peakSoFar)))
+        return peakSoFar;
     for (int64_t i = 0; i < count; i++) {
-        const int32_t sampleMagnitude = std::abs(int32_t(samples[i]));
-        if (sampleMagnitude > magnitude) {
-            peak = samples[i];
-            magnitude = sampleMagnitude;
-        }
+        if (std::abs(int32_t(samples[i])) == largest)
+            return samples[i];
     }
-    return peak;
+    return peakSoFar;
 }
 
 float SampleTransform::MaximizeFactor(int16_t peak)
@@ -77,8 +101,7 @@ float SampleTransform::MaximizeFactor(int16_t peak)
 void SampleTransform::Scale(int16_t* samples, int64_t count, float factor)
 {
     const double wide = double(factor);
-    for (int64_t i = 0; i < count; i++)
-        samples[i] = StoreTruncated(wide * double(samples[i]));
+    ForEachSample(samples, count, [wide](double, int16_t sample) { return StoreTruncated(wide * double(sample)); });
 }
 
 }  // namespace glimmet

@@ -17,8 +17,10 @@ public:
     /// whose low 16 bits are 0.
     static int16_t StoreTruncated(double value)
     {
-        if (!(value > -2147483649.0 && value < 2147483648.0))
-            return 0;
+        // Written as two selects rather than a branch so that loops over
+        // samples vectorise. A comparison with not-a-number is false.
+        value = value < 2147483648.0 ? value : -2147483648.0;
+        value = value > -2147483649.0 ? value : -2147483648.0;
         return int16_t(uint16_t(uint32_t(int32_t(value))));
     }
 

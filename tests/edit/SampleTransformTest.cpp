@@ -112,6 +112,34 @@ TEST(SampleTransformTest, MaximizedPeakReachesFullScaleOrOneBelow)
     }
 }
 
+TEST(SampleTransformTest, LongFadesMatchTheReference)
+{
+    // 2^20 + 1 samples make n - 1 a power of two: many quotients are exact
+    // integers, the case a reciprocal gets wrong without care.
+    std::mt19937 random(5);
+    for (size_t length : {size_t(44101), size_t(1048577), size_t(1000003)}) {
+        const std::vector<int16_t> data = test::RandomSamples(random, length);
+        std::vector<int16_t> in = data;
+        SampleTransform::FadeIn(in.data(), int64_t(length));
+        EXPECT_EQ(in, TransformReference::FadeIn(data)) << length;
+        std::vector<int16_t> out = data;
+        SampleTransform::FadeOut(out.data(), int64_t(length));
+        EXPECT_EQ(out, TransformReference::FadeOut(data)) << length;
+    }
+}
+
+TEST(SampleTransformTest, FadeInOfEveryValueAtEveryPositionOfAShortRange)
+{
+    for (int64_t n : {2, 3, 17}) {
+        for (int value = -32768; value <= 32767; value += 1) {
+            const std::vector<int16_t> data(static_cast<size_t>(n), static_cast<int16_t>(value));
+            std::vector<int16_t> in = data;
+            SampleTransform::FadeIn(in.data(), n);
+            ASSERT_EQ(in, TransformReference::FadeIn(data)) << n << " " << value;
+        }
+    }
+}
+
 class SampleTransformLengthTest : public ::testing::TestWithParam<int> {};
 
 TEST_P(SampleTransformLengthTest, MatchesTheReferenceOverRandomData)

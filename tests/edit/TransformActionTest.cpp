@@ -286,3 +286,42 @@ TEST(TransformEdgeTest, ChannelsStartingLaterAreTransformedOnTheTimeline)
 
 }  // namespace
 }  // namespace glimmet
+
+namespace glimmet {
+namespace {
+
+using test::TestDocument;
+
+TEST(TransformBufferTest, FirstChannelWhoseCopyFailsGetsSilence)
+{
+    TestDocument document;
+    document.AddChannel({7, 8, 9}, 0, true);
+    document.AddChannel({1, 2, 3, 4, 5, 6}, 0, true);
+    document.SetRange(3, 5);
+    RevertPhasesAction action(nullptr);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.Go(), B_OK);
+    EXPECT_EQ(document.State().channels[0].samples, (std::vector<int16_t>{7, 8, 9, 0, 0, 0}));
+    EXPECT_EQ(document.State().channels[1].samples, (std::vector<int16_t>{1, 2, 3, -4, -5, -6}));
+}
+
+TEST(TransformBufferTest, MaximizeCarriesTheBufferAcrossItsPasses)
+{
+    // The short first channel's copies fail in both passes: in the second it
+    // is given what the first pass left, the last channel's unscaled range.
+    TestDocument document;
+    document.AddChannel({7, 8, 9}, 0, true);
+    document.AddChannel({1, 2, 3, 40, -50, 60}, 0, true);
+    document.SetRange(3, 5);
+    MaximizeAction action(nullptr);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.Go(), B_OK);
+    const double factor = double(32767.0f / 60.0f);
+    auto scaled = [factor](int s) { return test::TransformReference::Low16(factor * s); };
+    const std::vector<int16_t> range{scaled(40), scaled(-50), scaled(60)};
+    EXPECT_EQ(document.State().channels[0].samples, (std::vector<int16_t>{7, 8, 9, range[0], range[1], range[2]}));
+    EXPECT_EQ(document.State().channels[1].samples, (std::vector<int16_t>{1, 2, 3, range[0], range[1], range[2]}));
+}
+
+}  // namespace
+}  // namespace glimmet
