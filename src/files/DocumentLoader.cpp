@@ -1,5 +1,7 @@
 #include "files/DocumentLoader.h"
 
+#include <sys/mman.h>
+
 #include <algorithm>
 #include <new>
 #include <system_error>
@@ -33,19 +35,37 @@ media_format ShortAudioRequest()
     return request;
 }
 
+// Arrays from this size on ask for huge pages: filling a long recording
+// then costs a fraction of the page faults.
+constexpr size_t kHugePageSize = size_t(2) << 20;
+
+void PreferHugePages(void* start, size_t bytes)
+{
+    if (bytes < 2 * kHugePageSize)
+        return;
+    const uintptr_t first = (reinterpret_cast<uintptr_t>(start) + kHugePageSize - 1) & ~(kHugePageSize - 1);
+    const uintptr_t end = (reinterpret_cast<uintptr_t>(start) + bytes) & ~(kHugePageSize - 1);
+    if (end > first)
+        madvise(reinterpret_cast<void*>(first), end - first, MADV_HUGEPAGE);
+}
+
 std::unique_ptr<int16_t[]> AllocateSamples(int64_t count)
 {
     if (count <= 0 || count > int64_t(UINT32_MAX))
         return nullptr;
-    return std::unique_ptr<int16_t[]>(new (std::nothrow) int16_t[size_t(count)]);
+    std::unique_ptr<int16_t[]> samples(new (std::nothrow) int16_t[size_t(count)]);
+    if (samples != nullptr)
+        PreferHugePages(samples.get(), size_t(count) * sizeof(int16_t));
+    return samples;
 }
 
 /// Reads the whole track once and spreads its interleaved frames over the
-/// arrays (null entries are skipped); frames past count are dropped and a
-/// short decode leaves zeros.
-void Deinterleave(MediaTrack* track, size_t bufferSize, int64_t count,
-                  std::vector<std::unique_ptr<int16_t[]>>& arrays)
+/// arrays (null entries are skipped), at most capacity frames; returns how
+/// many frames it stored.
+int64_t Deinterleave(MediaTrack* track, size_t bufferSize, int64_t capacity,
+                     std::vector<std::unique_ptr<int16_t[]>>& arrays)
 {
+    const int64_t count = capacity;
     const size_t channels = arrays.size();
     std::vector<int16_t> buffer(2 * bufferSize / sizeof(int16_t) + 1);
     int64_t seekTo = 0;
@@ -64,10 +84,7 @@ void Deinterleave(MediaTrack* track, size_t bufferSize, int64_t count,
         }
         stored += frames;
     }
-    for (auto& array : arrays) {
-        if (array != nullptr)
-            std::fill(array.get() + stored, array.get() + count, int16_t(0));
-    }
+    return stored;
 }
 
 }  // namespace
@@ -132,14 +149,28 @@ std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* t
     const size_t channelCount = decoded.raw_audio.channel_count;
     std::vector<std::unique_ptr<Channel>> channels(channelCount);
     media_format encoded;
-    const int64_t count = track->CountFrames();
-    if (count <= 0 || channelCount == 0 || track->EncodedFormat(&encoded) != B_OK || !IsAudio(encoded))
+    if (channelCount == 0 || track->EncodedFormat(&encoded) != B_OK || !IsAudio(encoded))
+        return channels;
+    // Where the file's size bounds the length, arrays of that bound are
+    // filled in one pass and the count is what came; otherwise the exact
+    // count comes first (which may cost a decoding pass of its own).
+    const int64_t bound = track->FrameCountBound();
+    const int64_t capacity = bound >= 0 ? bound : track->CountFrames();
+    if (capacity <= 0)
         return channels;
 
     std::vector<std::unique_ptr<int16_t[]>> arrays(channelCount);
     for (size_t k = 0; k < channelCount; ++k)
-        arrays[k] = AllocateSamples(count);
-    Deinterleave(track, decoded.raw_audio.buffer_size, count, arrays);
+        arrays[k] = AllocateSamples(capacity);
+    const int64_t stored = Deinterleave(track, decoded.raw_audio.buffer_size, capacity, arrays);
+    const int64_t count = bound >= 0 ? stored : capacity;
+    if (count <= 0)
+        return channels;
+    // A decode that came up short of the exact count leaves silence.
+    for (auto& array : arrays) {
+        if (array != nullptr)
+            std::fill(array.get() + stored, array.get() + count, int16_t(0));
+    }
 
     for (size_t k = 0; k < channelCount; ++k) {
         if (arrays[k] == nullptr)

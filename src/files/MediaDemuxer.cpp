@@ -1,5 +1,6 @@
 #include "files/MediaDemuxer.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <string>
 #include <system_error>
@@ -114,6 +115,16 @@ const AVStream* MediaDemuxer::StreamAt(int32_t index) const
     if (index < 0 || index >= CountStreams())
         return nullptr;
     return context_->streams[index];
+}
+
+const char* MediaDemuxer::FormatName() const
+{
+    return context_ == nullptr || context_->iformat == nullptr ? "" : context_->iformat->name;
+}
+
+int64_t MediaDemuxer::FileSize() const
+{
+    return io_ == nullptr ? 0 : std::max<int64_t>(0, avio_size(io_));
 }
 
 void MediaDemuxer::KeepOnlyStream(int32_t index)

@@ -33,6 +33,12 @@ public:
     /// Null when index is out of range or the file is not open.
     const AVStream* StreamAt(int32_t index) const;
 
+    /// The container format's short name ("wav", "matroska,webm"); empty
+    /// when the file is not open.
+    const char* FormatName() const;
+    /// The file's size in bytes; 0 when unknown.
+    int64_t FileSize() const;
+
     /// Makes the demuxer drop the packets of every stream but this one.
     void KeepOnlyStream(int32_t index);
 

@@ -130,6 +130,15 @@ int64_t MediaTrack::CountFrames()
     return frameCount_;
 }
 
+int64_t MediaTrack::FrameCountBound()
+{
+    if (status_ != B_OK || decodedChannels_ == 0)
+        return -1;
+    if (pass_ == nullptr && StartPass() != B_OK)
+        return -1;
+    return pass_->FrameCountBound();
+}
+
 status_t MediaTrack::SeekToFrame(int64_t* frame, int32_t /*flags*/)
 {
     if (frame == nullptr || *frame < 0)

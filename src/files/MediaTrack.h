@@ -47,6 +47,11 @@ public:
     /// decoded. Counting may decode the whole track once; the result is kept.
     int64_t CountFrames();
 
+    /// At least as many frames as the track decodes to, known without
+    /// decoding (plain PCM in a simple container: the file's size over the
+    /// frame size); -1 when there is no such bound. Needs a DecodedFormat.
+    int64_t FrameCountBound();
+
     /// Starts reading again at *frame (0 for the start). The next ReadFrames
     /// decodes from the start of the file and skips the frames before it.
     status_t SeekToFrame(int64_t* frame, int32_t flags = 0);

@@ -1,6 +1,8 @@
 #include "files/TrackDecoder.h"
 
 #include <algorithm>
+#include <bit>
+#include <string>
 #include <cstring>
 
 extern "C" {
@@ -44,6 +46,16 @@ bool IsPlainPCMCodec(AVCodecID id)
             return false;
     }
 }
+
+bool IsSimpleContainer(const std::string& name)
+{
+    // Containers whose audio packets are bare sample bytes: no trimming
+    // side data, no edit lists.
+    return name == "wav" || name == "w64" || name == "aiff" || name == "au" || name == "caf";
+}
+
+constexpr AVCodecID kNativeShortCodec =
+    std::endian::native == std::endian::little ? AV_CODEC_ID_PCM_S16LE : AV_CODEC_ID_PCM_S16BE;
 
 }  // namespace
 
@@ -92,12 +104,26 @@ status_t TrackDecoder::OpenDecoder(int32_t stream)
     error = avcodec_open2(codec_, codec, nullptr);
     if (error < 0)
         return StatusFromAVError(error);
+    passThrough_ = IsPlainPCM() && codec_->codec_id == kNativeShortCodec;
     return B_OK;
 }
 
 bool TrackDecoder::IsPlainPCM() const
 {
-    return codec_ != nullptr && IsPlainPCMCodec(codec_->codec_id) && codec_->ch_layout.nb_channels > 0;
+    return codec_ != nullptr && IsPlainPCMCodec(codec_->codec_id) && codec_->ch_layout.nb_channels > 0
+        && codec_->ch_layout.nb_channels <= kMaxChannels && IsSimpleContainer(demuxer_.FormatName());
+}
+
+int64_t TrackDecoder::BytesPerFrame() const
+{
+    return int64_t(av_get_bits_per_sample(codec_->codec_id) / 8) * codec_->ch_layout.nb_channels;
+}
+
+int64_t TrackDecoder::FrameCountBound() const
+{
+    if (status_ != B_OK || !IsPlainPCM() || BytesPerFrame() <= 0)
+        return -1;
+    return demuxer_.FileSize() / BytesPerFrame();
 }
 
 status_t TrackDecoder::Read(int16_t* buffer, int64_t maxFrames, int64_t* frames)
@@ -137,8 +163,8 @@ int64_t TrackDecoder::CountPacketFrames()
 {
     // The PCM decoders turn each packet into as many whole frames as it
     // holds and drop a trailing partial frame.
-    const int bytesPerSample = av_get_bits_per_sample(codec_->codec_id) / 8;
-    const int64_t frameBytes = int64_t(bytesPerSample) * codec_->ch_layout.nb_channels;
+    const int64_t frameBytes = BytesPerFrame();
+    av_packet_unref(packet_);
     int64_t total = pendingFrames_;
     pendingFrames_ = 0;
     while (frameBytes > 0 && demuxer_.ReadPacket(stream_, packet_)) {
@@ -152,6 +178,8 @@ int64_t TrackDecoder::CountPacketFrames()
 bool TrackDecoder::DecodeNextBlock()
 {
     pendingFrames_ = 0;
+    if (passThrough_)
+        return TakeNextPacket();
     while (!drained_) {
         const status_t received = ReceiveFrame();
         if (received == B_LAST_BUFFER_ERROR) {
@@ -227,11 +255,36 @@ bool TrackDecoder::ConvertFrame()
         if (interleaved == nullptr)
             return false;
     }
+    SetPending(interleaved, inChannels, frames);
+    return true;
+}
+
+bool TrackDecoder::TakeNextPacket()
+{
+    const int64_t frameBytes = BytesPerFrame();
+    av_packet_unref(packet_);
+    while (!drained_) {
+        if (!demuxer_.ReadPacket(stream_, packet_)) {
+            drained_ = true;
+            break;
+        }
+        const int64_t frames = packet_->size / frameBytes;
+        if (frames > 0) {
+            // The packet stays referenced while its block is pending.
+            SetPending(reinterpret_cast<const int16_t*>(packet_->data), codec_->ch_layout.nb_channels, int(frames));
+            return true;
+        }
+        av_packet_unref(packet_);
+    }
+    return false;
+}
+
+void TrackDecoder::SetPending(const int16_t* interleaved, int inChannels, int frames)
+{
     pending_ = interleaved;
     if (inChannels != channelCount_)
         pending_ = Remap(interleaved, inChannels, frames);
     pendingFrames_ = frames;
-    return true;
 }
 
 const int16_t* TrackDecoder::ConvertToShorts(int format, int channels, int frames)

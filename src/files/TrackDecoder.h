@@ -42,10 +42,15 @@ public:
     /// decoding cannot go on.
     status_t Read(int16_t* buffer, int64_t maxFrames, int64_t* frames);
 
-    /// The frames left in the stream, counted by decoding (or, for plain PCM,
-    /// from packet sizes, which give exactly what the decoder would). Uses up
-    /// the pass.
+    /// The frames left in the stream, counted by decoding (or, for plain PCM
+    /// in a simple container, from packet sizes, which give exactly what the
+    /// decoder would). Uses up the pass.
     int64_t CountRemainingFrames();
+
+    /// At least as many frames as the stream decodes to, known without
+    /// reading it: for plain PCM in a simple container, the file's size over
+    /// the frame size. -1 when no such bound is known.
+    int64_t FrameCountBound() const;
 
 private:
     status_t OpenDecoder(int32_t stream);
@@ -59,8 +64,16 @@ private:
     bool ConvertFrame();
     const int16_t* ConvertToShorts(int format, int channels, int frames);
     const int16_t* Remap(const int16_t* interleaved, int inChannels, int frames);
+    /// Plain PCM in a container whose packets hold nothing but samples, so
+    /// packet sizes say how many frames the decoder makes of them.
     bool IsPlainPCM() const;
+    int64_t BytesPerFrame() const;
     int64_t CountPacketFrames();
+    /// For native 16-bit PCM: the packet's bytes are the decoder's output,
+    /// so the block is taken from the packet itself.
+    bool TakeNextPacket();
+    /// Makes interleaved frames of inChannels channels the pending block.
+    void SetPending(const int16_t* interleaved, int inChannels, int frames);
 
     MediaDemuxer demuxer_;
     int32_t stream_;
@@ -72,6 +85,7 @@ private:
     SwrContext* converter_ = nullptr;
     int converterFormat_ = -1;
     int converterChannels_ = 0;
+    bool passThrough_ = false;
     bool inputEnded_ = false;
     bool drained_ = false;
 

@@ -212,3 +212,24 @@ TEST_F(DocumentLoaderTest, LinksAreFollowedForEntryAndTitle)
 
 }  // namespace
 }  // namespace glimmet
+
+namespace glimmet {
+namespace {
+
+TEST_F(DocumentLoaderTest, ChunksAfterTheDataDoNotLengthenTheChannels)
+{
+    // The loader sizes plain PCM by the file; what it keeps is what decodes.
+    const std::vector<int16_t> source = SoundFixtures::Pattern(1000, 2);
+    std::string bytes = test::WavBytes{}.Make(source);
+    bytes += std::string("LIST\x40\x00\x00\x00", 8) + std::string(64, 'x');
+    const auto path = fixtures.WriteBytes("trailing.wav", bytes);
+    ASSERT_EQ(DocumentLoader::Load(path, window), B_OK);
+    ASSERT_EQ(window.manager.CountChannels(), 2);
+    Channel* right = window.manager.ChannelAt(1);
+    ASSERT_EQ(right->FrameCount(), 1000);
+    for (int64_t i = 0; i < 1000; ++i)
+        ASSERT_EQ(right->Data()[i], source[size_t(2 * i + 1)]) << i;
+}
+
+}  // namespace
+}  // namespace glimmet

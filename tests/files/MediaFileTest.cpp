@@ -405,3 +405,26 @@ TEST_F(MediaTrackTest, ReadsNeverExceedOneBuffer)
 
 }  // namespace
 }  // namespace glimmet
+
+namespace glimmet {
+namespace {
+
+TEST_F(MediaTrackTest, FrameCountBoundCoversPlainPCMOnly)
+{
+    MediaFile file(path);
+    MediaTrack* track = file.TrackAt(0);
+    EXPECT_EQ(track->FrameCountBound(), -1);  // no decoded format yet
+    media_format format;
+    ASSERT_EQ(track->DecodedFormat(&format), B_OK);
+    const int64_t bound = track->FrameCountBound();
+    EXPECT_GE(bound, track->CountFrames());
+    EXPECT_LE(bound, track->CountFrames() + 64);  // the header's bytes over 4 bytes a frame
+
+    MediaFile flac(fixtures.Encode("bound.flac", source, 22050, 2));
+    MediaTrack* encoded = flac.TrackAt(0);
+    ASSERT_EQ(encoded->DecodedFormat(&format), B_OK);
+    EXPECT_EQ(encoded->FrameCountBound(), -1);
+}
+
+}  // namespace
+}  // namespace glimmet

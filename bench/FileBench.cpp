@@ -1,0 +1,190 @@
+// Opening and saving a one-hour 16-bit stereo WAV document, each beside the
+// command-line tool doing the same work in the same run:
+//   open: ffmpeg -v quiet -threads 1 -i FILE -f null -
+//   save: sox FILE copy.wav
+// Peak memory of opening is compared with the decoded channel data.
+// GLIMMET_BENCH_DIR chooses where the 635 MB files go (default: the system's
+// temporary directory); GLIMMET_BENCH_SECONDS shortens the document.
+
+#include <benchmark/benchmark.h>
+
+#include <chrono>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <memory>
+#include <string>
+
+#include "../tests/files/FakeDocumentWindow.h"
+#include "files/DocumentLoader.h"
+#include "files/DocumentSaver.h"
+#include "sound/Channel.h"
+
+namespace {
+
+using namespace glimmet;
+
+constexpr int kRounds = 3;
+
+int64_t DocumentSeconds()
+{
+    const char* seconds = std::getenv("GLIMMET_BENCH_SECONDS");
+    return seconds != nullptr ? std::max(1L, std::atol(seconds)) : 3600;
+}
+
+/// A private directory for the benchmark's files, removed at exit.
+class WorkDirectory {
+public:
+    WorkDirectory()
+    {
+        const char* chosen = std::getenv("GLIMMET_BENCH_DIR");
+        std::string pattern = ((chosen != nullptr) ? std::filesystem::path(chosen)
+                                                   : std::filesystem::temp_directory_path())
+            / "glimmet-filebench-XXXXXX";
+        if (mkdtemp(pattern.data()) == nullptr)
+            std::abort();
+        path_ = pattern;
+    }
+    ~WorkDirectory()
+    {
+        std::error_code ignored;
+        std::filesystem::remove_all(path_, ignored);
+    }
+
+    static std::filesystem::path Path()
+    {
+        static const WorkDirectory directory;
+        return directory.path_;
+    }
+
+private:
+    std::filesystem::path path_;
+};
+
+std::string Quote(const std::filesystem::path& path)
+{
+    return "'" + path.string() + "'";
+}
+
+/// The document as a WAV file, made once by sox: a sweep, so that no codec
+/// or cache could take a shortcut.
+const std::filesystem::path& SourceFile()
+{
+    static const std::filesystem::path file = [] {
+        const auto path = WorkDirectory::Path() / "hour.wav";
+        const std::string command = "sox -n -r 44100 -c 2 -b 16 -e signed " + Quote(path) + " synth "
+            + std::to_string(DocumentSeconds()) + " sine 100-8000 sine 300-3000 vol 0.8";
+        if (std::system(command.c_str()) != 0)
+            std::abort();
+        return path;
+    }();
+    return file;
+}
+
+double SecondsOf(const std::function<void()>& work)
+{
+    const auto start = std::chrono::steady_clock::now();
+    work();
+    return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+}
+
+double BestSeconds(const std::function<void()>& work)
+{
+    double best = 0;
+    for (int round = 0; round < kRounds; ++round) {
+        const double seconds = SecondsOf(work);
+        best = round == 0 ? seconds : std::min(best, seconds);
+    }
+    return best;
+}
+
+double BestCommandSeconds(const std::string& command)
+{
+    return BestSeconds([&command] {
+        if (std::system(command.c_str()) != 0)
+            std::abort();
+    });
+}
+
+/// A /proc/self/status figure in bytes ("VmHWM", "VmRSS").
+int64_t ProcessMemory(const std::string& field)
+{
+    std::ifstream status("/proc/self/status");
+    std::string line;
+    while (std::getline(status, line)) {
+        if (line.rfind(field + ":", 0) == 0)
+            return std::atoll(line.c_str() + field.size() + 1) * 1024;
+    }
+    return 0;
+}
+
+/// Makes VmHWM start again from the present resident size.
+void ResetPeakMemory()
+{
+    std::ofstream("/proc/self/clear_refs") << "5";
+}
+
+int64_t DecodedBytes(ChannelManager& manager)
+{
+    int64_t bytes = 0;
+    for (int32_t i = 0; i < manager.CountChannels(); ++i)
+        bytes += manager.ChannelAt(i)->FrameCount() * int64_t(sizeof(int16_t));
+    return bytes;
+}
+
+void BM_OpenOneHourWav(benchmark::State& state)
+{
+    const auto& file = SourceFile();
+    const double ffmpeg = BestCommandSeconds("ffmpeg -v quiet -threads 1 -i " + Quote(file) + " -f null -");
+    double ours = 0;
+    double peakRatio = 0;
+    for (auto _ : state) {
+        double best = 0;
+        for (int round = 0; round < kRounds; ++round) {
+            auto window = std::make_unique<test::FakeDocumentWindow>();
+            const int64_t before = ProcessMemory("VmRSS");
+            ResetPeakMemory();
+            const double seconds = SecondsOf([&] {
+                if (DocumentLoader::Load(file, *window) != B_OK)
+                    std::abort();
+            });
+            const int64_t peak = ProcessMemory("VmHWM") - before;
+            peakRatio = double(peak) / double(DecodedBytes(window->manager));
+            best = round == 0 ? seconds : std::min(best, seconds);
+        }
+        ours = best;
+        state.SetIterationTime(ours);
+    }
+    state.counters["ours_s"] = ours;
+    state.counters["ffmpeg_s"] = ffmpeg;
+    state.counters["time_vs_ffmpeg"] = ours / ffmpeg;
+    state.counters["peak_vs_decoded"] = peakRatio;
+}
+BENCHMARK(BM_OpenOneHourWav)->UseManualTime()->Iterations(1)->Unit(benchmark::kMillisecond);
+
+void BM_SaveOneHourWav(benchmark::State& state)
+{
+    const auto& file = SourceFile();
+    test::FakeDocumentWindow window;
+    if (DocumentLoader::Load(file, window) != B_OK)
+        std::abort();
+    const auto soxCopy = WorkDirectory::Path() / "sox-copy.wav";
+    const auto ourCopy = WorkDirectory::Path() / "our-copy.wav";
+    const double sox = BestCommandSeconds("sox " + Quote(file) + " " + Quote(soxCopy));
+    double ours = 0;
+    for (auto _ : state) {
+        ours = BestSeconds([&] { DocumentSaver::SaveFile(ourCopy, window); });
+        state.SetIterationTime(ours);
+    }
+    state.counters["ours_s"] = ours;
+    state.counters["sox_s"] = sox;
+    state.counters["time_vs_sox"] = ours / sox;
+    std::filesystem::remove(soxCopy);
+    std::filesystem::remove(ourCopy);
+}
+BENCHMARK(BM_SaveOneHourWav)->UseManualTime()->Iterations(1)->Unit(benchmark::kMillisecond);
+
+}  // namespace
+
+BENCHMARK_MAIN();
