@@ -30,15 +30,25 @@ status_t Action::InitCheck()
     return B_OK;
 }
 
+void Action::BindDocument(ChannelManager* manager, ChannelContainer* container)
+{
+    manager_ = manager;
+    container_ = container;
+}
+
+void Action::CopyRangeAndCursor()
+{
+    rangeStart_ = manager_->RangeStart();
+    rangeEnd_ = manager_->RangeEnd();
+    cursor_ = container_->CursorFrame();
+}
+
 status_t Action::SetTo(ChannelManager* manager, ChannelContainer* container)
 {
     if (manager == nullptr || container == nullptr)
         return B_BAD_VALUE;
-    manager_ = manager;
-    rangeStart_ = manager->RangeStart();
-    rangeEnd_ = manager->RangeEnd();
-    container_ = container;
-    cursor_ = container->CursorFrame();
+    BindDocument(manager, container);
+    CopyRangeAndCursor();
     frameCount_ = rangeEnd_ - rangeStart_ + 1;
     TakeSnapshot();
     return B_OK;
@@ -85,23 +95,30 @@ status_t Action::Go()
     return B_ERROR;
 }
 
-void Action::RestoreSelection(bool writeSamples)
+void Action::WalkRecordedChannels(const std::vector<int32_t>& indexes, const RecordVisitor& visit)
 {
     size_t next = 0;
-    for (int32_t i = 0; next < savedChannels_.size(); i++) {
+    for (int32_t i = 0; next < indexes.size(); i++) {
         Channel* channel = manager_->ChannelAt(i);
         if (channel == nullptr)
             break;
-        const SavedChannel& record = savedChannels_[next];
-        if (record.index != i) {
+        if (indexes[next] != i) {
             channel->SetSelected(false);
             continue;
         }
         channel->SetSelected(true);
-        if (writeSamples && record.data != nullptr)
-            channel->ReplaceFrames(record.data.get(), frameCount_, rangeStart_, rangeEnd_);
+        if (visit)
+            visit(channel, next);
         next++;
     }
+}
+
+void Action::RestoreSelection(const RecordVisitor& visit)
+{
+    std::vector<int32_t> indexes;
+    for (const SavedChannel& record : savedChannels_)
+        indexes.push_back(record.index);
+    WalkRecordedChannels(indexes, visit);
 }
 
 void Action::RestoreRange()
@@ -115,7 +132,11 @@ status_t Action::Undo()
     if (manager_ == nullptr)
         return B_ERROR;
     manager_->Lock();
-    RestoreSelection(true);
+    RestoreSelection([this](Channel* channel, size_t record) {
+        const SavedChannel& saved = savedChannels_[record];
+        if (saved.data != nullptr)
+            channel->ReplaceFrames(saved.data.get(), frameCount_, rangeStart_, rangeEnd_);
+    });
     RestoreRange();
     manager_->Unlock();
     return B_OK;
@@ -127,7 +148,7 @@ status_t Action::Redo()
         return B_ERROR;
     manager_->Lock();
     RestoreRange();
-    RestoreSelection(false);
+    RestoreSelection(nullptr);
     manager_->Unlock();
     return Go();
 }

@@ -9,6 +9,7 @@
 
 namespace glimmet {
 
+class Channel;
 class ChannelContainer;
 class ChannelManager;
 class MessageTarget;
@@ -70,11 +71,25 @@ protected:
         int32_t index = 0;                // position in the manager
     };
 
-    /// Selects the recorded channels and deselects the other channels met
-    /// before the last record; with writeSamples, also puts the recorded
-    /// samples back over the range. Caller holds the document lock.
-    void RestoreSelection(bool writeSamples);
+    /// Called for each recorded channel met by WalkRecordedChannels with the
+    /// channel and the position of its record.
+    using RecordVisitor = std::function<void(Channel* channel, size_t record)>;
+
+    /// Walks the channels in index order against recorded channel indexes
+    /// (ascending): a recorded channel is selected and handed to visit, any
+    /// other channel met before the last record is deselected; channels
+    /// after it keep their state. Caller holds the document lock.
+    void WalkRecordedChannels(const std::vector<int32_t>& indexes, const RecordVisitor& visit);
+    /// The walk over the snapshot's records, with visit (may be empty) for
+    /// each recorded channel.
+    void RestoreSelection(const RecordVisitor& visit);
     void RestoreRange();
+
+    /// Binds manager and container without a snapshot (actions that keep
+    /// their own undo data).
+    void BindDocument(ChannelManager* manager, ChannelContainer* container);
+    /// Copies the manager's range and the container's cursor, as SetTo does.
+    void CopyRangeAndCursor();
 
     const std::vector<SavedChannel>& SavedChannels() const { return savedChannels_; }
 

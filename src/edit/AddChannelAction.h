@@ -1,0 +1,37 @@
+#pragma once
+
+#include <memory>
+
+#include "edit/Action.h"
+
+namespace glimmet {
+
+class ChannelView;
+
+/// "Add Channel": appends a new, empty channel to the document and shows it.
+class AddChannelAction : public Action {
+public:
+    using Action::Action;
+    ~AddChannelAction() override;
+
+    /// Binds without a snapshot; B_BAD_VALUE for a null pointer.
+    status_t SetTo(ChannelManager* manager, ChannelContainer* container) override;
+    status_t Go() override;
+    /// Takes the channel out of the document; the action owns it until redo.
+    status_t Undo() override;
+    /// Puts the same channel back at the end, with a new view.
+    status_t Redo() override;
+    const char* Name() override;
+    const char* PreferredMenu() override;
+
+    Channel* AddedChannel() const { return channel_; }
+    ChannelView* View() const { return view_; }
+
+private:
+    Channel* channel_ = nullptr;
+    ChannelView* view_ = nullptr;
+    /// Holds the channel while it is outside the document.
+    std::unique_ptr<Channel> owned_;
+};
+
+}  // namespace glimmet

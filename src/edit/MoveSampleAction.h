@@ -1,0 +1,39 @@
+#pragma once
+
+#include "edit/Action.h"
+
+namespace glimmet {
+
+class ChannelView;
+
+/// "Move Sample": records a channel the user has dragged along the time
+/// axis. The drag itself moved the channel; Go does nothing, undo and redo
+/// shift the channel's first frame by the recorded offset. Listed in no menu.
+class MoveSampleAction : public Action {
+public:
+    using Action::Action;
+
+    /// B_OK when a channel and its view are bound, else B_ERROR.
+    status_t InitCheck() override;
+    /// Moves are bound with the other SetTo: this one always fails.
+    status_t SetTo(ChannelManager* manager, ChannelContainer* container) override;
+    /// offset is the channel's first frame before the move minus its first
+    /// frame after it. B_BAD_VALUE for a null channel or view.
+    status_t SetTo(Channel* channel, ChannelView* view, int64_t offset);
+    status_t Go() override;
+    status_t Undo() override;
+    status_t Redo() override;
+    const char* Name() override;
+    const char* PreferredMenu() override;
+
+    int64_t Offset() const { return offset_; }
+
+private:
+    status_t Shift(int64_t frames);
+
+    Channel* channel_ = nullptr;
+    ChannelView* view_ = nullptr;
+    int64_t offset_ = 0;
+};
+
+}  // namespace glimmet

@@ -1,0 +1,126 @@
+#include "edit/PasteAction.h"
+
+#include <cstdio>
+
+#include "edit/ChannelContainer.h"
+#include "edit/CopyBuffer.h"
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+
+namespace glimmet {
+
+int32_t PasteAction::FirstSelectedChannel()
+{
+    for (int32_t i = 0; Channel* channel = Manager()->ChannelAt(i); i++) {
+        if (channel->IsSelected())
+            return i;
+    }
+    return -1;
+}
+
+bool PasteAction::ReplaceMode() const
+{
+    return firstChannel_ >= 0 && RangeStart() >= 0 && RangeStart() <= RangeEnd();
+}
+
+status_t PasteAction::Go()
+{
+    if (InitCheck() != B_OK)
+        return B_ERROR;
+    firstChannel_ = FirstSelectedChannel();
+    CopyBuffer* copyBuffer = CopyBuffer::ApplicationBuffer();
+    std::vector<const int16_t*> buffers;
+    int32_t count = 0;
+    int64_t frames = 0;
+    if (copyBuffer != nullptr && copyBuffer->GetCopyBuffer(buffers, count, frames)) {
+        pastedChannelCount_ = 0;
+        if (ReplaceMode())
+            PasteOverRange(buffers, frames);
+        else
+            InsertAtCursor(buffers, frames);
+    }
+    // Balances a lock this action never takes: a no-op for the document
+    // lock, which only a holder can release.
+    Manager()->Unlock();
+    return B_OK;
+}
+
+void PasteAction::PasteOverRange(const std::vector<const int16_t*>& buffers, int64_t frames)
+{
+    for (size_t i = 0; i < buffers.size(); i++) {
+        Channel* channel = Manager()->ChannelAt(firstChannel_ + int32_t(i));
+        if (channel == nullptr)
+            break;
+        const status_t status = channel->ReplaceFrames(buffers[i], frames, RangeStart(), RangeEnd());
+        if (status != B_OK)
+            std::printf("error replacing frames: %s\n", StatusText(status));
+        pastedChannelCount_++;
+    }
+    std::fflush(stdout);
+    pasteStart_ = RangeStart();
+    // From the cursor, not the range start: the range end then marks the
+    // cursor's length of pasted frames.
+    pasteEnd_ = Cursor() + frames - 1;
+    Manager()->SetRangeEnd(pasteEnd_);
+}
+
+void PasteAction::InsertAtCursor(const std::vector<const int16_t*>& buffers, int64_t frames)
+{
+    firstChannel_ = Container()->FocusedChannel();
+    for (size_t i = 0; i < buffers.size(); i++) {
+        Channel* channel = Manager()->ChannelAt(firstChannel_ + int32_t(i));
+        if (channel == nullptr)
+            break;
+        const status_t status = channel->InsertFrames(buffers[i], frames, Cursor());
+        if (status != B_OK)
+            std::printf("error inserting frames: %s\n", StatusText(status));
+        channel->SetSelected(true);
+        pastedChannelCount_++;
+    }
+    std::fflush(stdout);
+    pasteStart_ = Cursor();
+    pasteEnd_ = Cursor() + frames - 1;
+    Manager()->SetRangeStart(pasteStart_);
+    Manager()->SetRangeEnd(pasteEnd_);
+}
+
+void PasteAction::RemoveInsertedFrames()
+{
+    for (int32_t i = 0; i < pastedChannelCount_; i++) {
+        Channel* channel = Manager()->ChannelAt(firstChannel_ + i);
+        if (channel == nullptr)
+            break;
+        const status_t status = channel->RemoveFrames(pasteStart_, pasteEnd_);
+        if (status != B_OK)
+            std::printf("error removing frames while unding paste: %s\n", StatusText(status));
+        channel->SetSelected(true);
+    }
+    std::fflush(stdout);
+}
+
+status_t PasteAction::Undo()
+{
+    if (Manager() == nullptr)
+        return B_ERROR;
+    Manager()->Lock();
+    if (SavedChannelCount() == 0) {
+        RemoveInsertedFrames();
+    } else {
+        RestoreSelection([this](Channel* channel, size_t record) {
+            const SavedChannel& saved = SavedChannels()[record];
+            if (saved.data != nullptr)
+                channel->ReplaceFrames(saved.data.get(), FrameCount(), pasteStart_, pasteEnd_);
+        });
+    }
+    Manager()->SetCurrentFrame(RangeStart());
+    RestoreRange();
+    Manager()->Unlock();
+    return B_OK;
+}
+
+const char* PasteAction::Name()
+{
+    return "Paste";
+}
+
+}  // namespace glimmet

@@ -1,0 +1,45 @@
+#pragma once
+
+#include "edit/Action.h"
+
+namespace glimmet {
+
+/// "Paste": puts the application's copy buffer into the document, over the
+/// range of the selected channels when there is a valid range, otherwise in
+/// front of the cursor into the focused channel and those after it.
+///
+/// Go works without taking the document lock (each channel operation locks
+/// its channel) and ends with one ChannelManager::Unlock that it never
+/// took; the document lock ignores an unlock by a thread that does not hold
+/// it. The redo is the base one: the buffer is pasted again as it is then.
+class PasteAction : public Action {
+public:
+    using Action::Action;
+
+    /// B_ERROR when not bound; B_OK otherwise, also when there is nothing to
+    /// paste (the empty paste is still recorded).
+    status_t Go() override;
+    /// Removes inserted frames, or puts the replaced range back.
+    status_t Undo() override;
+    const char* Name() override;
+
+    int64_t PasteStart() const { return pasteStart_; }
+    int64_t PasteEnd() const { return pasteEnd_; }
+    int32_t FirstChannel() const { return firstChannel_; }
+    int32_t PastedChannelCount() const { return pastedChannelCount_; }
+
+private:
+    int32_t FirstSelectedChannel();
+    bool ReplaceMode() const;
+    void PasteOverRange(const std::vector<const int16_t*>& buffers, int64_t frames);
+    void InsertAtCursor(const std::vector<const int16_t*>& buffers, int64_t frames);
+    void RemoveInsertedFrames();
+
+    // Written by Go, read by Undo; all start at 0 except the first channel.
+    int64_t pasteStart_ = 0;
+    int64_t pasteEnd_ = 0;
+    int32_t firstChannel_ = -1;
+    int32_t pastedChannelCount_ = 0;
+};
+
+}  // namespace glimmet

@@ -1,0 +1,121 @@
+#include "edit/TruncateAction.h"
+
+#include <cstring>
+#include <mutex>
+#include <new>
+
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+
+namespace glimmet {
+
+namespace {
+
+// An array of count samples (count may be 0), zeroed where a copy into it
+// fails; null only when memory is short or count is out of reach.
+std::unique_ptr<int16_t[]> CopyOf(Channel* channel, int64_t start, int64_t count)
+{
+    if (count < 0 || count > int64_t(UINT32_MAX))
+        return nullptr;
+    std::unique_ptr<int16_t[]> samples(new (std::nothrow) int16_t[size_t(count)]);
+    if (samples != nullptr && !channel->FillBuffer(samples.get(), start, count))
+        std::memset(samples.get(), 0, size_t(count) * sizeof(int16_t));
+    return samples;
+}
+
+}  // namespace
+
+status_t TruncateAction::SetTo(ChannelManager* manager, ChannelContainer* container)
+{
+    if (manager == nullptr || container == nullptr)
+        return B_BAD_VALUE;
+    BindDocument(manager, container);
+    CopyRangeAndCursor();
+    std::lock_guard guard(manager->DocumentLock());
+    records_.clear();
+    for (int32_t i = 0; Channel* channel = manager->ChannelAt(i); i++) {
+        if (channel->IsSelected())
+            records_.push_back(Record(channel, i));
+    }
+    return B_OK;
+}
+
+TruncateAction::KeptChannel TruncateAction::Record(Channel* channel, int32_t index)
+{
+    KeptChannel record;
+    record.firstFrame = channel->FirstFrame();
+    record.index = index;
+    if (record.firstFrame <= RangeStart()) {
+        record.headCount = RangeStart() - record.firstFrame;
+        record.head = CopyOf(channel, record.firstFrame, record.headCount);
+    }
+    const int64_t tailCount = record.firstFrame + channel->FrameCount() - RangeEnd() - 1;
+    if (tailCount > 0) {
+        record.tailCount = tailCount;
+        record.tail = CopyOf(channel, RangeEnd() + 1, tailCount);
+    }
+    return record;
+}
+
+status_t TruncateAction::Go()
+{
+    if (InitCheck() != B_OK)
+        return B_ERROR;
+    std::lock_guard guard(Manager()->DocumentLock());
+    for (int32_t i = 0; Channel* channel = Manager()->ChannelAt(i); i++) {
+        if (!channel->IsSelected())
+            continue;
+        channel->RemoveFrames(RangeEnd() + 1, channel->FirstFrame() + channel->FrameCount() - 1);
+        // From frame 0, not from the channel's first frame.
+        channel->RemoveFrames(0, RangeStart() - 1);
+        channel->SetSelected(false);
+    }
+    return B_OK;
+}
+
+std::vector<int32_t> TruncateAction::RecordedIndexes() const
+{
+    std::vector<int32_t> indexes;
+    for (const KeptChannel& record : records_)
+        indexes.push_back(record.index);
+    return indexes;
+}
+
+void TruncateAction::PutBack(Channel* channel, const KeptChannel& record)
+{
+    channel->SetStartFrameOffset(record.firstFrame);
+    if (record.head != nullptr)
+        channel->InsertFrames(record.head.get(), record.headCount, record.firstFrame);
+    if (record.tail != nullptr)
+        channel->InsertFrames(record.tail.get(), record.tailCount, RangeEnd() + 1);
+}
+
+status_t TruncateAction::Undo()
+{
+    if (Manager() == nullptr)
+        return B_ERROR;
+    std::lock_guard guard(Manager()->DocumentLock());
+    WalkRecordedChannels(RecordedIndexes(),
+        [this](Channel* channel, size_t record) { PutBack(channel, records_[record]); });
+    RestoreRange();
+    return B_OK;
+}
+
+status_t TruncateAction::Redo()
+{
+    if (Manager() == nullptr)
+        return B_ERROR;
+    {
+        std::lock_guard guard(Manager()->DocumentLock());
+        RestoreRange();
+        WalkRecordedChannels(RecordedIndexes(), nullptr);
+    }
+    return Go();
+}
+
+const char* TruncateAction::Name()
+{
+    return "Truncate";
+}
+
+}  // namespace glimmet
