@@ -148,7 +148,7 @@ int64_t ZoomSlider::LastFrame() const
 
 bool ZoomSlider::IsAutoRepeating() const
 {
-    return repeatTimer_->isActive();
+    return repeating_;
 }
 
 float ZoomSlider::Track() const
@@ -228,7 +228,7 @@ void ZoomSlider::MessageReceived(const Message& message)
 {
     switch (message.what) {
     case kMsgFirstTick:
-        if (repeatTimer_->isActive()) {
+        if (repeating_) {
             repeatTimer_->setSingleShot(false);
             repeatTimer_->start(kTickIntervalMs);
         }
@@ -364,12 +364,14 @@ void ZoomSlider::MouseUp()
 
 void ZoomSlider::StartAutoRepeat()
 {
+    repeating_ = true;
     repeatTimer_->setSingleShot(true);
     repeatTimer_->start(kFirstTickDelayMs);
 }
 
 void ZoomSlider::StopAutoRepeat()
 {
+    repeating_ = false;
     repeatTimer_->stop();
 }
 
@@ -377,7 +379,7 @@ void ZoomSlider::StopAutoRepeat()
 void ZoomSlider::Tick()
 {
     // A tick still queued when the button came up pages no more.
-    if (!repeatTimer_->isActive())
+    if (!repeating_)
         return;
     const float x = pointer_.x();
     bool paged = false;

@@ -119,6 +119,7 @@ private:
     QImage bitmap_;
     MessageTarget* target_;
     QTimer* repeatTimer_;  // child of this widget
+    bool repeating_ = false;  // from a paging click until the button comes up
     QPointF pointer_;      // last pointer position seen while a button is held
     bool inLayout_ = false;
 };
