@@ -12,15 +12,8 @@ namespace glimmet {
 namespace {
 
 using test::DocumentState;
+using test::Ramp;
 using test::TestDocument;
-
-std::vector<int16_t> Ramp(int16_t from, size_t count)
-{
-    std::vector<int16_t> samples(count);
-    for (size_t i = 0; i < count; i++)
-        samples[i] = int16_t(from + int16_t(i));
-    return samples;
-}
 
 /// Registers an application copy buffer for one test.
 class PasteActionTest : public ::testing::Test {

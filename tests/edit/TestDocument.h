@@ -104,6 +104,15 @@ public:
     }
 };
 
+/// count samples counting up from from.
+inline std::vector<int16_t> Ramp(int16_t from, size_t count)
+{
+    std::vector<int16_t> samples(count);
+    for (size_t i = 0; i < count; i++)
+        samples[i] = int16_t(from + int16_t(i));
+    return samples;
+}
+
 /// Random samples that always hold the extremes and the values around 0.
 inline std::vector<int16_t> RandomSamples(std::mt19937& random, size_t count)
 {
