@@ -361,8 +361,12 @@ TEST_P(EditSequenceTest, RandomEditsUndosAndRedosFollowTheModel)
         return std::uniform_int_distribution<int64_t>(low, high)(random);
     };
     TestDocument document;
-    for (int c = 0; c < 3; c++)
-        document.AddChannel(test::RandomSamples(random, 120), 0, true);
+    const int8_t pans[3] = {Channel::kPanLeft, Channel::kPanMiddle, Channel::kPanRight};
+    for (int c = 0; c < 3; c++) {
+        Channel* channel = document.AddChannel(test::RandomSamples(random, 120), 0, true);
+        channel->SetPanPosition(pans[c]);
+        channel->SetMuted(c == 1);
+    }
     document.SetRange(0, 10);
     EditModel model;
     model.s = document.State();

@@ -17,6 +17,8 @@ struct ChannelState {
     std::vector<int16_t> samples;
     int64_t first = 0;
     bool selected = false;
+    bool muted = false;
+    int8_t pan = 0;
 
     bool operator==(const ChannelState&) const = default;
 };
@@ -32,7 +34,8 @@ struct DocumentState {
 
 inline std::ostream& operator<<(std::ostream& out, const ChannelState& state)
 {
-    out << "{first " << state.first << (state.selected ? ", selected" : "") << ", " << state.samples.size()
+    out << "{first " << state.first << (state.selected ? ", selected" : "") << (state.muted ? ", muted" : "")
+        << ", pan " << int(state.pan) << ", " << state.samples.size()
         << " samples:";
     const size_t shown = std::min<size_t>(state.samples.size(), 12);
     for (size_t i = 0; i < shown; i++)
@@ -90,6 +93,8 @@ public:
             state.samples.assign(data, data + channel->FrameCount());
         state.first = channel->FirstFrame();
         state.selected = channel->IsSelected();
+        state.muted = channel->IsMuted();
+        state.pan = channel->PanPosition();
         return state;
     }
 
