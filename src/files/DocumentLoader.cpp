@@ -59,29 +59,48 @@ std::unique_ptr<int16_t[]> AllocateSamples(int64_t count)
     return samples;
 }
 
-/// Reads the whole track once and spreads its interleaved frames over the
-/// arrays (null entries are skipped), at most capacity frames; returns how
-/// many frames it stored.
-int64_t Deinterleave(MediaTrack* track, size_t bufferSize, int64_t capacity,
-                     std::vector<std::unique_ptr<int16_t[]>>& arrays)
+/// Copies frames interleaved frames of channels samples into the arrays
+/// (null entries are skipped) from index at on.
+void SpreadFrames(const int16_t* interleaved, int64_t frames, std::vector<std::unique_ptr<int16_t[]>>& arrays,
+                  int64_t at)
 {
-    const int64_t count = capacity;
     const size_t channels = arrays.size();
-    std::vector<int16_t> buffer(2 * bufferSize / sizeof(int16_t) + 1);
+    if (channels == 1) {
+        if (arrays[0] != nullptr)
+            std::copy(interleaved, interleaved + frames, arrays[0].get() + at);
+        return;
+    }
+    if (channels == 2 && arrays[0] != nullptr && arrays[1] != nullptr) {
+        // The common case gets a loop the compiler can vectorise.
+        int16_t* left = arrays[0].get() + at;
+        int16_t* right = arrays[1].get() + at;
+        for (int64_t frame = 0; frame < frames; ++frame) {
+            left[frame] = interleaved[2 * frame];
+            right[frame] = interleaved[2 * frame + 1];
+        }
+        return;
+    }
+    for (size_t k = 0; k < channels; ++k) {
+        int16_t* to = arrays[k].get();
+        if (to == nullptr)
+            continue;
+        for (int64_t frame = 0; frame < frames; ++frame)
+            to[at + frame] = interleaved[size_t(frame) * channels + k];
+    }
+}
+
+/// Reads the whole track once and spreads its interleaved frames over the
+/// arrays, at most capacity frames; returns how many frames it stored.
+int64_t Deinterleave(MediaTrack* track, int64_t capacity, std::vector<std::unique_ptr<int16_t[]>>& arrays)
+{
     int64_t seekTo = 0;
     track->SeekToFrame(&seekTo, 0);
     int64_t stored = 0;
     int64_t framesRead = 0;
-    while (stored < count && track->ReadFrames(buffer.data(), &framesRead) == B_OK) {
-        const int64_t frames = std::min({framesRead, count - stored, int64_t(buffer.size() / channels)});
-        for (size_t k = 0; k < channels; ++k) {
-            int16_t* to = arrays[k].get();
-            if (to == nullptr)
-                continue;
-            const int16_t* from = buffer.data() + k;
-            for (int64_t frame = 0; frame < frames; ++frame)
-                to[stored + frame] = from[size_t(frame) * channels];
-        }
+    const int16_t* block = nullptr;
+    while (stored < capacity && track->ReadFramesInPlace(&block, &framesRead) == B_OK) {
+        const int64_t frames = std::min(framesRead, capacity - stored);
+        SpreadFrames(block, frames, arrays, stored);
         stored += frames;
     }
     return stored;
@@ -162,7 +181,7 @@ std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* t
     std::vector<std::unique_ptr<int16_t[]>> arrays(channelCount);
     for (size_t k = 0; k < channelCount; ++k)
         arrays[k] = AllocateSamples(capacity);
-    const int64_t stored = Deinterleave(track, decoded.raw_audio.buffer_size, capacity, arrays);
+    const int64_t stored = Deinterleave(track, capacity, arrays);
     const int64_t count = bound >= 0 ? stored : capacity;
     if (count <= 0)
         return channels;

@@ -28,6 +28,21 @@ status_t DocumentSaver::SaveFile(const std::filesystem::path& file, SaveTarget& 
         std::printf("Error releasing tracks: %s\n", StatusText(released));
         std::fflush(stdout);
     }
+    return SetTypeOfSavedFile(destination);
+}
+
+status_t DocumentSaver::SetTypeOfSavedFile(const std::filesystem::path& destination)
+{
+    // A directory or device in the way was never written to, and must not
+    // be labelled as a sound file either.
+    std::error_code error;
+    const auto status = std::filesystem::status(destination, error);
+    if (!std::filesystem::exists(status))
+        return B_ENTRY_NOT_FOUND;
+    if (std::filesystem::is_directory(status))
+        return B_IS_A_DIRECTORY;
+    if (!std::filesystem::is_regular_file(status))
+        return B_BAD_VALUE;
     return SetFileType(destination, kWavType);
 }
 

@@ -34,6 +34,9 @@ public:
     static status_t WriteDocument(ChannelManager* manager, FrameWriter& writer);
 
 private:
+    /// The type attribute's result; B_ENTRY_NOT_FOUND, B_IS_A_DIRECTORY or
+    /// B_BAD_VALUE when no regular file is there to take it.
+    static status_t SetTypeOfSavedFile(const std::filesystem::path& destination);
     static std::filesystem::path FollowLinks(const std::filesystem::path& file);
 };
 

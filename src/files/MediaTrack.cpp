@@ -132,11 +132,7 @@ int64_t MediaTrack::CountFrames()
 
 int64_t MediaTrack::FrameCountBound()
 {
-    if (status_ != B_OK || decodedChannels_ == 0)
-        return -1;
-    if (pass_ == nullptr && StartPass() != B_OK)
-        return -1;
-    return pass_->FrameCountBound();
+    return EnsurePass() == B_OK ? pass_->FrameCountBound() : -1;
 }
 
 status_t MediaTrack::SeekToFrame(int64_t* frame, int32_t /*flags*/)
@@ -176,21 +172,35 @@ status_t MediaTrack::SkipFrames(int64_t count)
     return B_OK;
 }
 
+status_t MediaTrack::EnsurePass()
+{
+    if (status_ != B_OK)
+        return status_;
+    if (decodedChannels_ == 0)
+        return B_NO_INIT;
+    return pass_ == nullptr ? StartPass() : B_OK;
+}
+
 status_t MediaTrack::ReadFrames(void* buffer, int64_t* frameCount)
 {
     if (buffer == nullptr || frameCount == nullptr)
         return B_BAD_VALUE;
     *frameCount = 0;
-    if (status_ != B_OK)
-        return status_;
-    if (decodedChannels_ == 0)
-        return B_NO_INIT;
-    if (pass_ == nullptr) {
-        const status_t status = StartPass();
-        if (status != B_OK)
-            return status;
-    }
+    const status_t status = EnsurePass();
+    if (status != B_OK)
+        return status;
     return pass_->Read(static_cast<int16_t*>(buffer), kFramesPerBuffer, frameCount);
+}
+
+status_t MediaTrack::ReadFramesInPlace(const int16_t** frames, int64_t* frameCount)
+{
+    if (frames == nullptr || frameCount == nullptr)
+        return B_BAD_VALUE;
+    *frameCount = 0;
+    const status_t status = EnsurePass();
+    if (status != B_OK)
+        return status;
+    return pass_->ReadInPlace(frames, kFramesPerBuffer, frameCount);
 }
 
 }  // namespace glimmet

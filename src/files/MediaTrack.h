@@ -62,8 +62,13 @@ public:
     /// DecodedFormat was agreed on, another code when decoding fails.
     status_t ReadFrames(void* buffer, int64_t* frameCount);
 
+    /// ReadFrames without the copy: *frames points into the track's own
+    /// buffer, valid until the next read, seek or release.
+    status_t ReadFramesInPlace(const int16_t** frames, int64_t* frameCount);
+
 private:
     bool IsAudio() const;
+    status_t EnsurePass();
     status_t StartPass();
     status_t SkipFrames(int64_t count);
 

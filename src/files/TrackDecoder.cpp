@@ -128,6 +128,15 @@ int64_t TrackDecoder::FrameCountBound() const
 
 status_t TrackDecoder::Read(int16_t* buffer, int64_t maxFrames, int64_t* frames)
 {
+    const int16_t* block = nullptr;
+    const status_t status = ReadInPlace(&block, maxFrames, frames);
+    if (status == B_OK)
+        std::memcpy(buffer, block, size_t(*frames) * size_t(channelCount_) * sizeof(int16_t));
+    return status;
+}
+
+status_t TrackDecoder::ReadInPlace(const int16_t** block, int64_t maxFrames, int64_t* frames)
+{
     *frames = 0;
     if (status_ != B_OK)
         return status_;
@@ -136,9 +145,8 @@ status_t TrackDecoder::Read(int16_t* buffer, int64_t maxFrames, int64_t* frames)
     if (pendingFrames_ == 0 && !DecodeNextBlock())
         return status_ == B_OK ? B_LAST_BUFFER_ERROR : status_;
     const int64_t count = std::min(maxFrames, pendingFrames_);
-    const size_t samples = size_t(count) * size_t(channelCount_);
-    std::memcpy(buffer, pending_, samples * sizeof(int16_t));
-    pending_ += samples;
+    *block = pending_;
+    pending_ += size_t(count) * size_t(channelCount_);
     pendingFrames_ -= count;
     *frames = count;
     return B_OK;

@@ -41,6 +41,9 @@ public:
     /// B_LAST_BUFFER_ERROR at the end of the stream, another code when
     /// decoding cannot go on.
     status_t Read(int16_t* buffer, int64_t maxFrames, int64_t* frames);
+    /// Like Read, without the copy: *frames point into the pass's own block
+    /// and stay valid until the next call.
+    status_t ReadInPlace(const int16_t** block, int64_t maxFrames, int64_t* frames);
 
     /// The frames left in the stream, counted by decoding (or, for plain PCM
     /// in a simple container, from packet sizes, which give exactly what the

@@ -315,3 +315,22 @@ TEST_F(DocumentSaverTest, TypeAttributeWithoutUserAttributesIsNoError)
 
 }  // namespace
 }  // namespace glimmet
+
+namespace glimmet {
+namespace {
+
+TEST_F(DocumentSaverTest, DirectoryInTheWayIsNeitherWrittenNorLabelled)
+{
+    AddChannel(SoundFixtures::Pattern(100, 1), Channel::kPanMiddle);
+    const auto directory = fixtures.PathOf("folder.wav");
+    std::filesystem::create_directory(directory);
+    testing::internal::CaptureStdout();
+    EXPECT_EQ(DocumentSaver::SaveFile(directory, window), B_IS_A_DIRECTORY);
+    EXPECT_EQ(testing::internal::GetCapturedStdout(), "Error releasing tracks: Is a directory\n");
+    EXPECT_TRUE(std::filesystem::is_directory(directory));
+    EXPECT_EQ(FileType(directory), "");
+    EXPECT_EQ(DirectoryListing(fixtures.Directory()), std::vector<std::string>{"folder.wav"});
+}
+
+}  // namespace
+}  // namespace glimmet

@@ -428,3 +428,26 @@ TEST_F(MediaTrackTest, FrameCountBoundCoversPlainPCMOnly)
 
 }  // namespace
 }  // namespace glimmet
+
+namespace glimmet {
+namespace {
+
+TEST_F(MediaTrackTest, ReadingInPlaceGivesTheSameFrames)
+{
+    MediaFile file(path);
+    MediaTrack* track = file.TrackAt(0);
+    const int16_t* block = nullptr;
+    int64_t frames = 0;
+    EXPECT_EQ(track->ReadFramesInPlace(&block, &frames), B_NO_INIT);
+    media_format format;
+    ASSERT_EQ(track->DecodedFormat(&format), B_OK);
+    std::vector<int16_t> samples;
+    while (track->ReadFramesInPlace(&block, &frames) == B_OK) {
+        EXPECT_LE(frames, MediaTrack::kFramesPerBuffer);
+        samples.insert(samples.end(), block, block + 2 * frames);
+    }
+    EXPECT_EQ(samples, source);
+}
+
+}  // namespace
+}  // namespace glimmet
