@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <cmath>
 
-#include <QCoreApplication>
 #include <QFontMetricsF>
 #include <QPainter>
 
@@ -11,7 +10,6 @@
 #include "sound/ChannelManager.h"
 #include "sound/DocumentWindow.h"
 #include "support/MessageCodes.h"
-#include "support/MessageEvent.h"
 #include "views/PixelCanvas.h"
 #include "views/SampleView.h"
 #include "views/ZoomSlider.h"
@@ -55,7 +53,7 @@ void DrawFrameLines(QPainter& painter, const ViewRect& r, const QColor& topLeft,
 
 ChannelContainerView::ChannelContainerView(ChannelManager* manager, ZoomSlider* zoomSlider, DocumentWindow* window,
                                            QWidget* parent)
-    : QWidget(parent), zoomSlider_(zoomSlider), manager_(manager), window_(window)
+    : MessageView(parent), zoomSlider_(zoomSlider), manager_(manager), window_(window)
 {
     setObjectName("sample view");
     setAttribute(Qt::WA_OpaquePaintEvent);
@@ -73,11 +71,6 @@ ChannelContainerView::~ChannelContainerView() = default;
 float ChannelContainerView::Width() const
 {
     return Bounds().Width();
-}
-
-ViewRect ChannelContainerView::Bounds() const
-{
-    return {0, 0, float(width() - 1), float(height() - 1)};
 }
 
 FrameMapping ChannelContainerView::Mapping() const
@@ -407,20 +400,6 @@ void ChannelContainerView::UpdateAll()
     CheckZoomSlider(true);
 }
 
-status_t ChannelContainerView::PostMessage(const Message& message)
-{
-    QCoreApplication::postEvent(this, new MessageEvent(message));
-    return B_OK;
-}
-
-void ChannelContainerView::customEvent(QEvent* event)
-{
-    if (event->type() == MessageEvent::EventType())
-        MessageReceived(static_cast<MessageEvent*>(event)->message());
-    else
-        QWidget::customEvent(event);
-}
-
 Channel* ChannelContainerView::ContextChannelPointer() const
 {
     return manager_ != nullptr ? manager_->ChannelAt(contextChannel_) : nullptr;
@@ -480,7 +459,7 @@ void ChannelContainerView::UpdateSizeLimits()
 
 void ChannelContainerView::resizeEvent(QResizeEvent* event)
 {
-    QWidget::resizeEvent(event);
+    MessageView::resizeEvent(event);
     LayoutChildren();
     update();
 }

@@ -9,7 +9,7 @@
 #include <QWidget>
 
 #include "edit/ChannelContainer.h"
-#include "support/MessageTarget.h"
+#include "views/MessageView.h"
 #include "views/FrameMapping.h"
 #include "views/SampleView.h"
 #include "views/ViewRect.h"
@@ -37,7 +37,7 @@ class ZoomSlider;
 ///
 /// GUI thread only. The manager, the window and the channels are not owned;
 /// the zoom slider and the sample views are child widgets.
-class ChannelContainerView : public QWidget, public ChannelContainer, public MessageTarget {
+class ChannelContainerView : public MessageView, public ChannelContainer {
     Q_OBJECT
 
 public:
@@ -125,19 +125,16 @@ public:
     /// The menu opened by the last secondary click, while it exists.
     QMenu* OpenContextMenu() const;
 
-    using MessageTarget::PostMessage;
-    /// Queues the message for MessageReceived in the GUI thread.
-    status_t PostMessage(const Message& message) override;
-    void MessageReceived(const Message& message);
+    /// 'much', 'stcl', 'stcm', 'stcr' for the context channel; a bare
+    /// 'smmd' (a sample view has drawn) re-allows a move redraw.
+    void MessageReceived(const Message& message) override;
 
-    ViewRect Bounds() const;
     QSize minimumSizeHint() const override;
     QSize sizeHint() const override;
 
 protected:
     void paintEvent(QPaintEvent* event) override;
     void resizeEvent(QResizeEvent* event) override;
-    void customEvent(QEvent* event) override;
 
 private:
     float Width() const;

@@ -4,7 +4,6 @@
 #include <cmath>
 
 #include <QApplication>
-#include <QCoreApplication>
 #include <QKeyEvent>
 #include <QMouseEvent>
 #include <QPainter>
@@ -12,7 +11,6 @@
 #include "sound/Channel.h"
 #include "sound/DocumentWindow.h"
 #include "support/MessageCodes.h"
-#include "support/MessageEvent.h"
 #include "support/SystemTime.h"
 #include "views/ChannelContainerView.h"
 #include "views/PixelCanvas.h"
@@ -35,7 +33,7 @@ constexpr int kKeyDelete = 0x7f;
 }  // namespace
 
 SampleView::SampleView(Channel* channel, ChannelContainerView* container, QWidget* parent)
-    : QWidget(parent), channel_(channel), container_(container), clock_(&system_time)
+    : MessageView(parent), channel_(channel), container_(container), clock_(&system_time)
 {
     setObjectName("sample view");
     setAttribute(Qt::WA_OpaquePaintEvent);
@@ -53,22 +51,10 @@ SampleView::SampleView(Channel* channel, ChannelContainerView* container, QWidge
 
 SampleView::~SampleView() = default;
 
-ViewRect SampleView::Bounds() const
-{
-    return {0, 0, float(width() - 1), float(height() - 1)};
-}
-
-ViewRect SampleView::Frame() const
-{
-    return ViewRect::FromQRect(geometry());
-}
-
 ViewRect SampleView::Layout(const ViewRect& frame)
 {
     inLayout_ = true;
-    setGeometry(PixelCanvas::RoundToPixel(frame.left), PixelCanvas::RoundToPixel(frame.top),
-                std::max(0, PixelCanvas::RoundToPixel(frame.Width()) + 1),
-                std::max(0, PixelCanvas::RoundToPixel(frame.Height()) + 1));
+    PlaceAt(frame);
     inLayout_ = false;
     FrameResized(Frame().Width(), Frame().Height());
     return Frame();
@@ -76,7 +62,7 @@ ViewRect SampleView::Layout(const ViewRect& frame)
 
 void SampleView::resizeEvent(QResizeEvent* event)
 {
-    QWidget::resizeEvent(event);
+    MessageView::resizeEvent(event);
     if (!inLayout_ && bitmap_.size() != size())
         FrameResized(Bounds().Width(), Bounds().Height());
 }
@@ -158,20 +144,6 @@ void SampleView::Update(ViewRect rect)
 bool SampleView::IsFocus() const
 {
     return hasFocus();
-}
-
-status_t SampleView::PostMessage(const Message& message)
-{
-    QCoreApplication::postEvent(this, new MessageEvent(message));
-    return B_OK;
-}
-
-void SampleView::customEvent(QEvent* event)
-{
-    if (event->type() == MessageEvent::EventType())
-        MessageReceived(static_cast<MessageEvent*>(event)->message());
-    else
-        QWidget::customEvent(event);
 }
 
 void SampleView::MessageReceived(const Message& message)

@@ -4,11 +4,9 @@
 #include <cstdint>
 
 #include <QImage>
-#include <QWidget>
 
 #include "edit/ChannelView.h"
-#include "support/MessageTarget.h"
-#include "views/ViewRect.h"
+#include "views/MessageView.h"
 
 namespace glimmet {
 
@@ -27,7 +25,7 @@ class ChannelContainerView;
 /// re-renders the whole view.
 ///
 /// GUI thread only. The channel and container are not owned.
-class SampleView : public QWidget, public ChannelView, public MessageTarget {
+class SampleView : public MessageView, public ChannelView {
     Q_OBJECT
 
 public:
@@ -45,10 +43,6 @@ public:
     ViewRect Layout(const ViewRect& frame);
     /// Rebuilds the bitmap and the row table for the size, then re-renders.
     void FrameResized(float width, float height);
-    /// The view's own rectangle (0, 0, width - 1, height - 1).
-    ViewRect Bounds() const;
-    /// The view's rectangle in its parent's coordinates.
-    ViewRect Frame() const;
 
     /// Re-renders the whole view.
     void Update() override;
@@ -63,10 +57,8 @@ public:
     /// The pixel row of a sample value.
     int32_t RowOf(int16_t sample) const;
 
-    using MessageTarget::PostMessage;
-    /// Queues the message for MessageReceived in the GUI thread.
-    status_t PostMessage(const Message& message) override;
-    void MessageReceived(const Message& message);
+    /// 'mvsm' re-renders the whole view.
+    void MessageReceived(const Message& message) override;
 
     /// Tests replace the clock behind the double-click and key timing.
     void SetClock(Clock clock) { clock_ = clock; }
@@ -84,7 +76,6 @@ protected:
     void focusInEvent(QFocusEvent* event) override;
     void focusOutEvent(QFocusEvent* event) override;
     void resizeEvent(QResizeEvent* event) override;
-    void customEvent(QEvent* event) override;
 
 private:
     static constexpr int kRowTableSize = 8192;

@@ -4,13 +4,11 @@
 #include <cinttypes>
 #include <cstdio>
 
-#include <QCoreApplication>
 #include <QMouseEvent>
 #include <QPainter>
 #include <QTimer>
 
 #include "support/MessageCodes.h"
-#include "support/MessageEvent.h"
 #include "support/SystemTime.h"
 #include "views/FrameMapping.h"
 #include "views/PixelCanvas.h"
@@ -34,7 +32,7 @@ constexpr int kTickIntervalMs = 10;
 }  // namespace
 
 ZoomSlider::ZoomSlider(MessageTarget* target, int64_t low, int64_t high, int64_t minRange, QWidget* parent)
-    : QWidget(parent), low_(low), high_(high), minRange_(minRange), target_(target), repeatTimer_(new QTimer(this))
+    : MessageView(parent), low_(low), high_(high), minRange_(minRange), target_(target), repeatTimer_(new QTimer(this))
 {
     setObjectName("zoom slider");
     setAttribute(Qt::WA_OpaquePaintEvent);
@@ -166,17 +164,10 @@ float ZoomSlider::RightEdge() const
     return Track() * right_ + 17 + 8;
 }
 
-ViewRect ZoomSlider::Bounds() const
-{
-    return {0, 0, float(width() - 1), float(height() - 1)};
-}
-
 ViewRect ZoomSlider::Layout(const ViewRect& frame)
 {
     inLayout_ = true;
-    setGeometry(PixelCanvas::RoundToPixel(frame.left), PixelCanvas::RoundToPixel(frame.top),
-                std::max(0, PixelCanvas::RoundToPixel(frame.Width()) + 1),
-                std::max(0, PixelCanvas::RoundToPixel(frame.Height()) + 1));
+    PlaceAt(frame);
     inLayout_ = false;
     FrameResized(Bounds().Width(), Bounds().Height());
     return frame;
@@ -195,7 +186,7 @@ void ZoomSlider::FrameResized(float width, float height)
 
 void ZoomSlider::resizeEvent(QResizeEvent* event)
 {
-    QWidget::resizeEvent(event);
+    MessageView::resizeEvent(event);
     if (!inLayout_ && bitmap_.size() != size())
         FrameResized(Bounds().Width(), Bounds().Height());
 }
@@ -208,20 +199,6 @@ QSize ZoomSlider::minimumSizeHint() const
 QSize ZoomSlider::sizeHint() const
 {
     return {kMaximumWidth / 10, kFixedHeight};
-}
-
-status_t ZoomSlider::PostMessage(const Message& message)
-{
-    QCoreApplication::postEvent(this, new MessageEvent(message));
-    return B_OK;
-}
-
-void ZoomSlider::customEvent(QEvent* event)
-{
-    if (event->type() == MessageEvent::EventType())
-        MessageReceived(static_cast<MessageEvent*>(event)->message());
-    else
-        QWidget::customEvent(event);
 }
 
 void ZoomSlider::MessageReceived(const Message& message)

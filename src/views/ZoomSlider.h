@@ -4,10 +4,8 @@
 
 #include <QImage>
 #include <QPointF>
-#include <QWidget>
 
-#include "support/MessageTarget.h"
-#include "views/ViewRect.h"
+#include "views/MessageView.h"
 
 class QTimer;
 
@@ -24,7 +22,7 @@ namespace glimmet {
 /// re-armed (a mouse-down, a 'dprs', or SetPostMessage(true)).
 ///
 /// GUI thread only.
-class ZoomSlider : public QWidget, public MessageTarget {
+class ZoomSlider : public MessageView {
     Q_OBJECT
 
 public:
@@ -74,14 +72,11 @@ public:
     ViewRect Layout(const ViewRect& frame);
     /// Replaces the off-screen bitmap by one of (0, 0, width, height).
     void FrameResized(float width, float height);
-    ViewRect Bounds() const;
     /// Draws the slider into its off-screen bitmap and returns it.
     const QImage& Render();
 
-    using MessageTarget::PostMessage;
-    /// Queues the message for MessageReceived in the GUI thread.
-    status_t PostMessage(const Message& message) override;
-    void MessageReceived(const Message& message);
+    /// 'ftck' and 'tick' drive the auto-repeat; 'dprs' re-arms.
+    void MessageReceived(const Message& message) override;
 
     QSize minimumSizeHint() const override;
     QSize sizeHint() const override;
@@ -92,7 +87,6 @@ protected:
     void mouseMoveEvent(QMouseEvent* event) override;
     void mouseReleaseEvent(QMouseEvent* event) override;
     void resizeEvent(QResizeEvent* event) override;
-    void customEvent(QEvent* event) override;
 
 private:
     void MouseDown(QPointF point);

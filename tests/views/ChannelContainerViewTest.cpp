@@ -293,8 +293,9 @@ TEST(ChannelContainerView, DrawsSunkenFramesAndTheFocusFrame)
             const QRgb light = i == focused ? 0x0000e5u : 0xffffffu;
             for (int y = r.top(); y <= r.bottom(); ++y) {
                 ASSERT_EQ(Pixel(image, r.left(), y), dark) << i << " left " << y;
-                if (y > r.top())
+                if (y > r.top()) {
                     ASSERT_EQ(Pixel(image, r.right(), y), light) << i << " right " << y;
+                }
             }
             for (int x = r.left() + 1; x <= r.right(); ++x)
                 ASSERT_EQ(Pixel(image, x, r.top()), dark) << i << " top " << x;

@@ -3,6 +3,8 @@
 #include <memory>
 #include <vector>
 
+#include <gtest/gtest.h>
+
 #include <QTest>
 
 #include "ViewTestSupport.h"
@@ -46,7 +48,7 @@ public:
     void Show()
     {
         container->show();
-        QTest::qWaitForWindowExposed(container.get());
+        EXPECT_TRUE(QTest::qWaitForWindowExposed(container.get()));
         DeliverPosted();
     }
 

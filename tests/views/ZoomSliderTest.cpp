@@ -16,7 +16,7 @@ protected:
     {
         slider.resize(400, 15);
         slider.show();
-        QTest::qWaitForWindowExposed(&slider);
+        ASSERT_TRUE(QTest::qWaitForWindowExposed(&slider));
     }
 
     // Geometry from the bounds' width 399, computed here.
