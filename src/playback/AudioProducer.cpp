@@ -479,6 +479,9 @@ void AudioProducer::ServeDevice(float* out, int32_t frames, int64_t deviceFrame)
 
     // A period served more slowly than it plays leaves the device behind.
     const int64_t took = system_time() - began;
+    periodsServed_.fetch_add(1, std::memory_order_relaxed);
+    if (took > longestPeriod_.load(std::memory_order_relaxed))
+        longestPeriod_.store(took, std::memory_order_relaxed);
     const int64_t duration = BufferDuration();
     if (duration > 0 && took > duration) {
         latePeriods_.fetch_add(1, std::memory_order_relaxed);

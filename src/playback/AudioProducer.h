@@ -131,6 +131,9 @@ public:
     int64_t LastBufferStartTime() const { return lastBufferStart_.load(std::memory_order_relaxed); }
     /// Device periods whose service took longer than a buffer lasts.
     int64_t LatePeriods() const { return latePeriods_.load(std::memory_order_relaxed); }
+    /// Device periods served, and the longest time one took (microseconds).
+    int64_t PeriodsServed() const { return periodsServed_.load(std::memory_order_relaxed); }
+    int64_t LongestPeriodMicros() const { return longestPeriod_.load(std::memory_order_relaxed); }
     PlaymarkRelay& Relay() { return relay_; }
 
 private:
@@ -184,6 +187,8 @@ private:
     std::atomic<int64_t> startTime_{0};
     std::atomic<int64_t> lastBufferStart_{0};
     std::atomic<int64_t> latePeriods_{0};
+    std::atomic<int64_t> periodsServed_{0};
+    std::atomic<int64_t> longestPeriod_{0};
     bool bufferPending_ = false;      // a B_HANDLE_BUFFER event is queued
     int64_t pendingBufferTime_ = 0;   // its performance time
     int64_t pendingBufferFrame_ = 0;  // frames sent when it was queued
