@@ -16,7 +16,8 @@ struct media_format;
 
 /// Loads a sound file into a document: every channel of every audio track
 /// becomes a Channel of the document's manager and gets a strip in its
-/// container view.
+/// container view. A window that implements LoadTarget loads a file with
+/// `return DocumentLoader::Load(path, *this);`, in its own thread.
 class DocumentLoader {
 public:
     /// Opens file and loads it into target. Returns the file's open status

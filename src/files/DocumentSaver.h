@@ -12,7 +12,9 @@ class FrameWriter;
 class SaveTarget;
 
 /// Saves a document as a stereo, 16-bit, 44100 Hz WAV file: the whole mix of
-/// its channels with their pan and mute settings.
+/// its channels with their pan and mute settings. A window that implements
+/// SaveTarget saves with `return DocumentSaver::SaveFile(path, *this);` and
+/// prints "error writing file. (%s)\n" when that fails.
 class DocumentSaver {
 public:
     /// Stereo frames per write buffer (4096 bytes).
