@@ -268,3 +268,79 @@ TEST(SampleViewRender, ColumnsWithMoreThan65535FramesStayInBounds)
 
 }  // namespace
 }  // namespace glimmet::test
+
+namespace glimmet::test {
+namespace {
+
+// The strips the container redraws after each change must leave every view
+// exactly as a full render would.
+class PartialRedraws : public ::testing::Test {
+protected:
+    void SetUp() override
+    {
+        samples0 = Noise(6000, 21);
+        samples1 = Sine(4000, 123, 25000);
+        fixture.Add(MakeChannel(samples0));
+        fixture.Add(MakeChannel(samples1, 1500));
+        fixture.Show();
+        fixture.container->SetDisplayRange(0, 5999);
+    }
+
+    void ExpectBothRendered()
+    {
+        ExpectRendered(fixture, 0, samples0);
+        ExpectRendered(fixture, 1, samples1);
+    }
+
+    ViewFixture fixture{360, 180};
+    std::vector<int16_t> samples0;
+    std::vector<int16_t> samples1;
+};
+
+TEST_F(PartialRedraws, DraggingBackAndForthAcrossChannels)
+{
+    ChannelContainerView& container = *fixture.container;
+    container.StartDragging(fixture.View(0), container.FirstFrameAt(100));
+    for (float x : {150.0f, 220.0f, 180.0f, 60.0f, 20.0f, 300.0f}) {
+        container.Dragging(fixture.View(1), x);
+        SCOPED_TRACE(x);
+        ExpectBothRendered();
+    }
+    container.Dragging(fixture.View(0), 90);
+    ExpectBothRendered();
+    container.StopDragging();
+}
+
+TEST_F(PartialRedraws, ShiftExtendAndDeselect)
+{
+    ChannelContainerView& container = *fixture.container;
+    container.Clicked(fixture.View(1), QPointF(120, 10), Qt::LeftButton, Qt::NoModifier);
+    container.MouseMoved(QPointF(200, 100));
+    container.MouseUp(QPointF(200, 100));
+    ExpectBothRendered();
+    container.Clicked(fixture.View(1), QPointF(300, 10), Qt::LeftButton, Qt::ShiftModifier);
+    container.MouseUp(QPointF(300, 10));
+    ExpectBothRendered();
+    container.Clicked(fixture.View(1), QPointF(40, 10), Qt::LeftButton, Qt::ShiftModifier);
+    container.MouseUp(QPointF(40, 10));
+    ExpectBothRendered();
+    container.DeselectAll();
+    ExpectBothRendered();
+}
+
+TEST_F(PartialRedraws, DoubleClickAndPlaymarkSteps)
+{
+    ChannelContainerView& container = *fixture.container;
+    container.SelectAll();
+    ExpectBothRendered();
+    container.DoubleClicked(fixture.View(1), QPointF(200, 10), Qt::LeftButton, Qt::NoModifier);
+    ExpectBothRendered();
+    for (int64_t frame = 0; frame < 6000; frame += 777) {
+        container.SetPlaymarkFrame(frame);
+        container.SetCursorFrame(5999 - frame);
+    }
+    ExpectBothRendered();
+}
+
+}  // namespace
+}  // namespace glimmet::test
