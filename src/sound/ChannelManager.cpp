@@ -22,7 +22,9 @@ constexpr float kOutputScale = 32767.0f;
 // processors that have it. Plain SSE2 and AVX2 give identical results here:
 // there is no contraction into fused multiply-adds in standard C++ mode, and
 // every operation is exactly rounded either way.
-#if defined(__GNUC__) && !defined(__clang__) && defined(__x86_64__)
+// Not under ThreadSanitizer: the loader runs the clones' resolvers before
+// the sanitizer's runtime is up, and the program dies at start-up.
+#if defined(__GNUC__) && !defined(__clang__) && defined(__x86_64__) && !defined(__SANITIZE_THREAD__)
 #define GLIMMET_VECTOR_CLONES __attribute__((target_clones("avx2", "default")))
 #else
 #define GLIMMET_VECTOR_CLONES
