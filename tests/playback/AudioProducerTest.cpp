@@ -3,6 +3,7 @@
 #include <cstring>
 #include <random>
 
+#include "AllocationCounter.h"
 #include "PlaybackTestSupport.h"
 #include "playback/AudioProducer.h"
 #include "playback/MediaKit.h"
@@ -492,6 +493,36 @@ TEST_F(ProducerTest, ASlowPeriodRaisesALateNotice)
     EXPECT_EQ(producer->LatePeriods(), 1);
     EXPECT_GT(producer->InternalLatency(), internal + 15000);
     EXPECT_EQ(printed, "\tincreasing latency to " + std::to_string(producer->EventLatency()) + "\n");
+}
+
+TEST_F(ProducerTest, ServingPeriodsAllocatesNothing)
+{
+    test::AddChannels(manager.get(), SmallDocument(20000));
+    Connect();
+    manager->SetLoop(true);
+    ASSERT_EQ(producer->Start(0), B_OK);
+    std::vector<float> out(test::kBufferFrames * 2);
+    {
+        // The counter does see allocations.
+        test::AllocationCounter counter;
+        auto probe = std::make_unique<int>(1);
+        EXPECT_EQ(counter.Count(), 1);
+    }
+    int64_t allocations = 0;
+    {
+        test::AllocationCounter counter;
+        for (int64_t period = 0; period < 200; period++)
+            producer->ServeDevice(out.data(), int32_t(test::kBufferFrames), period * test::kBufferFrames);
+        allocations = counter.Count();
+    }
+    EXPECT_EQ(allocations, 0);
+    EXPECT_EQ(producer->PeriodsServed(), 200);
+    EXPECT_EQ(producer->FramesSent(), 200 * test::kBufferFrames);
+    EXPECT_GE(producer->LongestPeriodMicros(), 0);
+    EXPECT_LE(producer->LatePeriods(), producer->PeriodsServed());
+    producer->Relay().Drain();
+    window.ProcessPending();
+    EXPECT_EQ(window.playmarkUpdates.size(), 200u);
 }
 
 }  // namespace
