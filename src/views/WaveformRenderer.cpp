@@ -109,15 +109,31 @@ void WaveformRenderer::RenderDataColumn(int32_t column, int64_t f0, int64_t f1, 
     std::fill(histogram_.begin(), histogram_.end(), uint16_t(0));
 }
 
+// Four interleaved partial counts keep consecutive samples of the same row
+// from waiting on each other; their 16-bit sum is exactly what one wrapping
+// 16-bit counter per row would hold.
 void WaveformRenderer::CountSamples(int64_t f0, int64_t f1)
 {
     const int16_t* sample = scene_.samples + (f0 - scene_.channelFirstFrame);
-    const int16_t* end = sample + (f1 - f0 + 1);
-    const size_t lastSlot = histogram_.size() - 1;
-    for (; sample != end; ++sample) {
-        const size_t row = size_t(rowTable_[(int32_t(*sample) + 32768) >> 3]);
-        ++histogram_[std::min(row, lastSlot)];
+    const int64_t count = f1 - f0 + 1;
+    const size_t rowSlots = histogram_.size();
+    const size_t lastSlot = rowSlots - 1;
+    partials_.assign(4 * rowSlots, 0);
+    uint32_t* partial = partials_.data();
+    const auto slotOf = [&](int16_t value) {
+        return std::min(size_t(rowTable_[(int32_t(value) + 32768) >> 3]), lastSlot);
+    };
+    int64_t i = 0;
+    for (; i + 4 <= count; i += 4) {
+        ++partial[slotOf(sample[i])];
+        ++partial[rowSlots + slotOf(sample[i + 1])];
+        ++partial[2 * rowSlots + slotOf(sample[i + 2])];
+        ++partial[3 * rowSlots + slotOf(sample[i + 3])];
     }
+    for (; i < count; ++i)
+        ++partial[slotOf(sample[i])];
+    for (size_t row = 0; row < rowSlots; ++row)
+        histogram_[row] = uint16_t(partial[row] + partial[rowSlots + row] + partial[2 * rowSlots + row] + partial[3 * rowSlots + row]);
 }
 
 void WaveformRenderer::ShadeRow(int32_t column, int32_t row, int64_t count, int64_t total, ColumnState state,

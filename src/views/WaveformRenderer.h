@@ -58,6 +58,7 @@ private:
     WaveformScene scene_;
     // 16-bit counters: a column of more than 65535 frames wraps them.
     std::vector<uint16_t> histogram_;
+    std::vector<uint32_t> partials_;  // scratch of CountSamples
 };
 
 }  // namespace glimmet

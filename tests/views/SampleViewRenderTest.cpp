@@ -257,13 +257,19 @@ TEST(SampleViewRender, PartialUpdateRendersOnlyItsColumns)
 
 TEST(SampleViewRender, ColumnsWithMoreThan65535FramesStayInBounds)
 {
-    // 16-bit counters wrap for such columns; the picture stays defined.
+    // The 16-bit counters wrap for such columns, and the picture shows it.
     ViewFixture fixture(40, 40);
-    fixture.Add(MakeChannel(Noise(38 * 70000, 9)));
+    auto samples = Sine(38 * 70000, 1000, 30000);
+    // A steady first half puts all 70000 samples of a column in one row.
+    std::fill(samples.begin(), samples.begin() + 19 * 70000, int16_t(20000));
+    fixture.Add(MakeChannel(samples));
     fixture.Show();
+    fixture.container->SetDisplayRange(0, 38 * 70000 - 1);
+    ASSERT_EQ(fixture.View(0)->width(), 38);
+    ExpectRendered(fixture, 0, samples);
+    // 70000 wraps to 4464: the bottom of a steady column stays light.
     const QImage& image = fixture.View(0)->Bitmap();
-    ASSERT_FALSE(image.isNull());
-    EXPECT_EQ(image.width(), 38);
+    EXPECT_EQ(image.pixel(3, image.height() / 2) & 0xff, uint32_t(245 - (245 * 4464) / 70000));
 }
 
 }  // namespace

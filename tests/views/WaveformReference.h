@@ -61,16 +61,19 @@ inline QImage ReferenceWaveform(const WaveformCase& c)
             continue;
         }
         const int64_t n = b - a + 1;
+        // Samples per row, kept in 16 bits as the view keeps them.
+        std::vector<int64_t> perRow(size_t(rows), 0);
+        for (int64_t i = a; i <= b; ++i)
+            ++perRow[size_t(rowOf(c.samples[size_t(i)]))];
+        for (auto& inRow : perRow)
+            inRow %= 65536;
         for (int y = 0; y < rows; ++y) {
             const bool lower = y >= rows / 2;
             int64_t beyond = 0;
-            for (int64_t i = a; i <= b; ++i) {
-                const int r = rowOf(c.samples[size_t(i)]);
+            for (int r = 0; r < rows; ++r) {
                 if (lower ? (r >= y) : (r <= y))
-                    ++beyond;
+                    beyond += perRow[size_t(r)];
             }
-            // 16-bit counters in the view: only columns under 65536 frames
-            // are compared here.
             const auto fade = [&](int k) { return (k - int((int64_t(k) * beyond) / n)) & 0xff; };
             int red;
             int green;
