@@ -370,3 +370,36 @@ TEST_F(Interaction, MovedChannelIsRedrawnWhereItNowLies)
 
 }  // namespace
 }  // namespace glimmet::test
+
+namespace glimmet::test {
+namespace {
+
+TEST_F(Interaction, SecondaryDoubleClickOpensTheMenuAndTertiaryDoesNothing)
+{
+    Container().DoubleClicked(fixture.View(1), QPointF(30, 10), Qt::RightButton, Qt::NoModifier);
+    EXPECT_EQ(Container().ContextChannel(), 1);
+    ASSERT_NE(Container().OpenContextMenu(), nullptr);
+    Container().OpenContextMenu()->close();
+    DeliverPosted();
+    Container().DoubleClicked(fixture.View(0), QPointF(30, 10), Qt::MiddleButton, Qt::NoModifier);
+    EXPECT_FALSE(Container().IsMoving());
+    EXPECT_EQ(fixture.manager.RangeStart(), -1);
+    EXPECT_EQ(Container().ContextChannel(), 1);
+}
+
+TEST(ShortDocument, ViewAsWideAsTheDocumentStaysDefined)
+{
+    // 397 frames in a container 400 wide: the slider's divisor
+    // (frame count - (width - 2)) is 0.
+    ViewFixture fixture(400, 200);
+    fixture.Add(MakeChannel(std::vector<int16_t>(397, 100)));
+    fixture.Show();
+    fixture.container->UpdateZoomSlider();
+    EXPECT_FALSE(fixture.slider->Render().isNull());
+    fixture.container->ZoomRange();
+    fixture.container->SelectAll();
+    EXPECT_EQ(fixture.manager.RangeEnd(), 396);
+}
+
+}  // namespace
+}  // namespace glimmet::test
