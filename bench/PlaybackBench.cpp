@@ -53,7 +53,9 @@ std::vector<std::vector<int16_t>> MakeSamples(int64_t channels)
 {
     std::mt19937 random(7);
     std::uniform_int_distribution<int> value(-3000, 3000);
-    std::vector<std::vector<int16_t>> samples(size_t(channels), std::vector<int16_t>(size_t(kDocumentFrames)));
+    std::vector<std::vector<int16_t>> samples(static_cast<size_t>(channels));
+    for (auto& channel : samples)
+        channel.resize(static_cast<size_t>(kDocumentFrames));
     for (auto& channel : samples) {
         for (int16_t& sample : channel)
             sample = int16_t(value(random));
