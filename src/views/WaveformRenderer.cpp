@@ -29,13 +29,20 @@ inline uint8_t Rise(int64_t k, int64_t count, int64_t total)
 
 WaveformRenderer::WaveformRenderer(QImage& image, const int16_t* rowTable, int32_t rows, const WaveformScene& scene)
     : image_(image), rowTable_(rowTable), rows_(std::min(rows, image.height())), scene_(scene),
-      histogram_(size_t(std::max(rows, image.height()) + 1), 0)
+      histogram_(size_t(std::max(rows, image.height()) + 1), 0),
+      pixels_(image.isNull() ? nullptr : image.bits()), stride_(image.bytesPerLine())
 {
+}
+
+// One detach for the whole render instead of one per pixel.
+QRgb& WaveformRenderer::PixelAt(int32_t column, int32_t row)
+{
+    return reinterpret_cast<QRgb*>(pixels_ + ptrdiff_t(row) * stride_)[column];
 }
 
 void WaveformRenderer::RenderColumns(float left, int32_t count)
 {
-    if (rows_ <= 0)
+    if (rows_ <= 0 || pixels_ == nullptr)
         return;
     const float fpc = scene_.framesPerColumn;
     for (int32_t k = 0; k < count; ++k) {
@@ -85,7 +92,7 @@ void WaveformRenderer::FillColumn(int32_t column, ColumnState state)
     else if (state.inRange)
         colour = kEmptyInRange;
     for (int32_t row = 0; row < rows_; ++row)
-        reinterpret_cast<QRgb*>(image_.scanLine(row))[column] = colour;
+        PixelAt(column, row) = colour;
 }
 
 // The lower half is accumulated from the bottom row up, the upper half from
@@ -159,7 +166,7 @@ void WaveformRenderer::ShadeRow(int32_t column, int32_t row, int64_t count, int6
     } else {
         red = green = blue = Fade(245, count, total);
     }
-    reinterpret_cast<QRgb*>(image_.scanLine(row))[column] = qRgb(red, green, blue);
+    PixelAt(column, row) = qRgb(red, green, blue);
 }
 
 }  // namespace glimmet

@@ -50,6 +50,7 @@ private:
     void FillColumn(int32_t column, ColumnState state);
     void RenderDataColumn(int32_t column, int64_t f0, int64_t f1, ColumnState state);
     void CountSamples(int64_t f0, int64_t f1);
+    QRgb& PixelAt(int32_t column, int32_t row);
     void ShadeRow(int32_t column, int32_t row, int64_t count, int64_t total, ColumnState state, bool lowerPass);
 
     QImage& image_;
@@ -59,6 +60,8 @@ private:
     // 16-bit counters: a column of more than 65535 frames wraps them.
     std::vector<uint16_t> histogram_;
     std::vector<uint32_t> partials_;  // scratch of CountSamples
+    uchar* pixels_;
+    qsizetype stride_;
 };
 
 }  // namespace glimmet
