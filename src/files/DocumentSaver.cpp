@@ -5,6 +5,7 @@
 #include <system_error>
 
 #include "edit/HistoryManager.h"
+#include "files/AsyncFrameWriter.h"
 #include "files/FileTypeAttribute.h"
 #include "files/SaveTarget.h"
 #include "files/WavFileWriter.h"
@@ -17,8 +18,12 @@ status_t DocumentSaver::SaveFile(const std::filesystem::path& file, SaveTarget& 
     const std::filesystem::path destination = FollowLinks(file);
     WavFileWriter writer(destination);
     if (writer.InitCheck() == B_OK) {
-        if (writer.CommitHeader() == B_OK)
-            WriteDocument(target.DocumentManager(), writer);
+        if (writer.CommitHeader() == B_OK) {
+            // The file is written on a second thread while the mix goes on.
+            AsyncFrameWriter background(writer);
+            WriteDocument(target.DocumentManager(), background);
+            background.Close();
+        }
         if (HistoryManager* history = target.DocumentHistory())
             history->Save();
         target.SetSaveItemEnabled(false);
