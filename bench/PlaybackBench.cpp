@@ -8,6 +8,7 @@
 
 #include <QCoreApplication>
 #include <QEventLoop>
+#include <QTimer>
 
 #include <cstdio>
 #include <cstdlib>
@@ -20,7 +21,6 @@
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "sound/DocumentWindow.h"
-#include "support/SystemTime.h"
 
 namespace glimmet {
 namespace {
@@ -164,9 +164,10 @@ void BM_RealTimeDummyDriver(benchmark::State& state)
         }
         manager.ResetCurrentFrame();
         graph.StartNodes();
-        const int64_t until = system_time() + 10000000;
-        while (system_time() < until)
-            QCoreApplication::processEvents(QEventLoop::AllEvents, 50);
+        // The window thread sleeps in its event loop between updates.
+        QEventLoop loop;
+        QTimer::singleShot(10000, &loop, &QEventLoop::quit);
+        loop.exec();
         graph.StopNodes();
         AudioProducer* producer = graph.Producer();
         state.counters["periods"] = double(producer->PeriodsServed());

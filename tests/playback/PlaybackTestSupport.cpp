@@ -5,7 +5,9 @@
 #include <QCoreApplication>
 #include <QEventLoop>
 
+#include <chrono>
 #include <cmath>
+#include <thread>
 #include <cstdlib>
 #include <fstream>
 
@@ -284,8 +286,11 @@ bool FakePlaybackWindow::ProcessUntil(const std::function<bool()>& done, int64_t
     while (!done()) {
         if (system_time() > deadline)
             return false;
-        QCoreApplication::processEvents(QEventLoop::AllEvents, 5);
+        QCoreApplication::processEvents(QEventLoop::AllEvents);
         QCoreApplication::sendPostedEvents();
+        // Leave the processor to the device thread between looks.
+        if (!done())
+            std::this_thread::sleep_for(std::chrono::microseconds(500));
     }
     return true;
 }
