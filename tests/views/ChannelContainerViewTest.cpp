@@ -497,3 +497,62 @@ TEST(ChannelContainerView, UpdateAllRedrawsAndChecksTheSlider)
 
 }  // namespace
 }  // namespace glimmet::test
+
+namespace glimmet::test {
+namespace {
+
+/// Applies each 'stdr' to the container later, as the document window does.
+class ForwardingWindow : public RecordingWindow {
+public:
+    status_t PostMessage(const Message& message) override
+    {
+        RecordingWindow::PostMessage(message);
+        int64_t first = 0;
+        int64_t last = 0;
+        if (message.what == kMsgSetDisplayRange && container != nullptr &&
+            message.FindInt64("first frame", &first) == B_OK && message.FindInt64("last frame", &last) == B_OK) {
+            ChannelContainerView* target = container;
+            QMetaObject::invokeMethod(
+                target, [target, first, last] { target->SetDisplayRange(first, last); }, Qt::QueuedConnection);
+        }
+        return B_OK;
+    }
+    ChannelContainerView* container = nullptr;
+};
+
+TEST(ZoomSliderAndWindow, HandleDragsSetTheDisplayAndSettle)
+{
+    ForwardingWindow window;
+    ChannelManager manager(&window);
+    auto* slider = new ZoomSlider(&window, 0, 0, 0);
+    ChannelContainerView container(&manager, slider, &window);
+    window.container = &container;
+    container.resize(500, 150);
+    manager.AddChannel(MakeChannel(std::vector<int16_t>(100000, 0)));
+    container.AddChannel(manager.ChannelAt(0));
+    container.show();
+    ASSERT_TRUE(QTest::qWaitForWindowExposed(&container));
+    DeliverPosted();
+
+    const float track = 499.0f - 42;
+    const int leftEdge = int(track * slider->Left() + 17);
+    const QPoint grab(leftEdge - 5, 7);
+    QTest::mousePress(slider, Qt::LeftButton, Qt::NoModifier, grab);
+    for (int dx = 20; dx <= 200; dx += 20) {
+        QTest::mouseMove(slider, grab + QPoint(dx, 0));
+        DeliverPosted();
+        // Every move is followed by the display.
+        EXPECT_EQ(container.FirstDisplayedFrame(), slider->FirstFrame()) << dx;
+        EXPECT_EQ(container.LastDisplayedFrame(), slider->LastFrame()) << dx;
+    }
+    QTest::mouseRelease(slider, Qt::LeftButton, Qt::NoModifier, grab + QPoint(200, 0));
+    DeliverPosted();
+    const size_t posted = window.messages.size();
+    DeliverPosted();
+    DeliverPosted();
+    EXPECT_EQ(window.messages.size(), posted);
+    EXPECT_GT(container.FirstDisplayedFrame(), 0);
+}
+
+}  // namespace
+}  // namespace glimmet::test
