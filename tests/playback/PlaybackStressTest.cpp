@@ -118,7 +118,8 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
         return std::uniform_int_distribution<int64_t>(low, high)(random);
     };
     int recorded = 0;
-    for (int step = 0; step < 200; step++) {
+    const size_t updatesBefore = window.playmarkUpdates.size();
+    for (int step = 0; step < 600; step++) {
         const int64_t choice = pick(0, 9);
         if (choice <= 2) {
             const int64_t start = pick(0, kLength - 2);
@@ -162,6 +163,8 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
         }
         window.ProcessPending();
     }
+    // Playback ran while the edits did.
+    EXPECT_GT(window.playmarkUpdates.size(), updatesBefore + 10);
     while (history.Undo() == B_OK) {
     }
 
