@@ -39,6 +39,9 @@ PlaybackGraph::~PlaybackGraph()
 
 status_t PlaybackGraph::SetupNodes()
 {
+    // The device serves the producer that exists; a second one is not made.
+    if (producer_ != nullptr)
+        return B_MEDIA_ALREADY_CONNECTED;
     bool fellBack = false;
     share_ = AudioSystem::Acquire();
     if (!share_) {

@@ -39,6 +39,7 @@ public:
     PlaybackGraph(const PlaybackGraph&) = delete;
     PlaybackGraph& operator=(const PlaybackGraph&) = delete;
 
+    /// B_MEDIA_ALREADY_CONNECTED, changing nothing, once there is a producer.
     status_t SetupNodes();
     /// B_ERROR when there is no roster or no producer.
     status_t StartNodes();

@@ -82,6 +82,11 @@ TEST_F(GraphTest, SetupConnectsTheProducerToTheDeviceInTheNegotiatedFormat)
     EXPECT_EQ(producer->TimeSource(), &graph->TimeSource());
     // The trial mix moved the play position on by one buffer.
     EXPECT_EQ(manager->CurrentFrame(), test::kBufferFrames);
+    // Set up once only.
+    testing::internal::CaptureStdout();
+    EXPECT_EQ(graph->SetupNodes(), B_MEDIA_ALREADY_CONNECTED);
+    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(graph->Producer(), producer);
     graph->TearDownNodes();
     EXPECT_EQ(graph->Producer(), nullptr);
 }
