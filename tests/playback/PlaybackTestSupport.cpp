@@ -214,7 +214,10 @@ private:
     FakePlaybackWindow* window_;
 };
 
-FakePlaybackWindow::FakePlaybackWindow() : inbox_(std::make_unique<Inbox>(this)) {}
+FakePlaybackWindow::FakePlaybackWindow()
+    : inbox_(std::make_unique<Inbox>(this)), ownThread_(std::this_thread::get_id())
+{
+}
 
 FakePlaybackWindow::~FakePlaybackWindow() = default;
 
@@ -226,7 +229,23 @@ void FakePlaybackWindow::Attach(ChannelManager* manager, PlaybackController* con
 
 status_t FakePlaybackWindow::PostMessage(const Message& message)
 {
+    if (std::this_thread::get_id() != ownThread_) {
+        std::lock_guard guard(foreignMutex_);
+        foreignMessages_.push_back(message);
+        return B_OK;
+    }
     return inbox_->PostMessage(message);
+}
+
+void FakePlaybackWindow::ForwardForeignMessages()
+{
+    std::vector<Message> messages;
+    {
+        std::lock_guard guard(foreignMutex_);
+        messages.swap(foreignMessages_);
+    }
+    for (const Message& message : messages)
+        inbox_->PostMessage(message);
 }
 
 bool FakePlaybackWindow::LockWithTimeout(int64_t timeoutMicros)
@@ -286,6 +305,7 @@ bool FakePlaybackWindow::ProcessUntil(const std::function<bool()>& done, int64_t
     while (!done()) {
         if (system_time() > deadline)
             return false;
+        ForwardForeignMessages();
         QCoreApplication::processEvents(QEventLoop::AllEvents);
         QCoreApplication::sendPostedEvents();
         // Leave the processor to the device thread between looks.
@@ -298,6 +318,7 @@ bool FakePlaybackWindow::ProcessUntil(const std::function<bool()>& done, int64_t
 void FakePlaybackWindow::ProcessPending()
 {
     for (int i = 0; i < 5; i++) {
+        ForwardForeignMessages();
         QCoreApplication::sendPostedEvents();
         QCoreApplication::processEvents(QEventLoop::AllEvents);
     }

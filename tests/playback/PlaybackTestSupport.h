@@ -4,6 +4,8 @@
 #include <filesystem>
 #include <functional>
 #include <memory>
+#include <mutex>
+#include <thread>
 #include <random>
 #include <string>
 #include <vector>
@@ -143,11 +145,19 @@ public:
 private:
     class Inbox;
     void Receive(const Message& message);
+    /// Hands the messages that other threads posted to the event loop.
+    void ForwardForeignMessages();
 
     std::unique_ptr<Inbox> inbox_;
     ChannelManager* manager_ = nullptr;
     PlaybackController* controller_ = nullptr;
     Locker windowLock_;
+    // Messages posted by other threads (the mixer's 'stop') wait here, under
+    // a lock that ThreadSanitizer can see, until the test's thread moves
+    // them into its event loop; Qt's own queue lock is invisible to it.
+    std::thread::id ownThread_;
+    std::mutex foreignMutex_;
+    std::vector<Message> foreignMessages_;
 };
 
 /// Where the played part begins in a device's output: the index of the
