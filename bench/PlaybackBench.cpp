@@ -12,6 +12,7 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <ctime>
 #include <memory>
 #include <random>
 #include <vector>
@@ -76,11 +77,20 @@ void FillDocument(ChannelManager* manager, const std::vector<std::vector<int16_t
     }
 }
 
-// Reports the time per iteration as a percentage of the buffer's duration.
-void ReportBufferShare(benchmark::State& state)
+// The calling thread's processor time in seconds.
+double ThreadCpuSeconds()
 {
-    state.counters["buffer_%"] = benchmark::Counter(kBufferSeconds / 100.0,
-        benchmark::Counter::kIsIterationInvariantRate | benchmark::Counter::kInvert);
+    timespec now{};
+    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &now);
+    return double(now.tv_sec) + double(now.tv_nsec) * 1e-9;
+}
+
+// Reports the processor time per iteration as a percentage of the time the
+// buffer lasts.
+void ReportBufferShare(benchmark::State& state, double cpuSeconds)
+{
+    if (state.iterations() > 0)
+        state.counters["cpu_%_of_buffer"] = 100.0 * cpuSeconds / double(state.iterations()) / kBufferSeconds;
 }
 
 // One device period as SDL's callback serves it: events, the mix of all
@@ -105,8 +115,11 @@ void BM_AudioCallback(benchmark::State& state)
 
     std::vector<float> out(size_t(kFrames) * 2);
     int64_t deviceFrame = 0;
+    double cpu = 0;
     for (auto _ : state) {
+        const double before = ThreadCpuSeconds();
         producer.ServeDevice(out.data(), int32_t(kFrames), deviceFrame);
+        cpu += ThreadCpuSeconds() - before;
         deviceFrame += kFrames;
         benchmark::DoNotOptimize(out.data());
         // Keep the position updates from piling up, outside the timing.
@@ -117,7 +130,7 @@ void BM_AudioCallback(benchmark::State& state)
         }
     }
     producer.Relay().Drain();
-    ReportBufferShare(state);
+    ReportBufferShare(state, cpu);
 }
 BENCHMARK(BM_AudioCallback)->Arg(2)->Arg(16)->Arg(64);
 
@@ -129,7 +142,9 @@ void BM_Baseline_SumChannels(benchmark::State& state)
     const auto samples = MakeSamples(channels);
     std::vector<float> out(size_t(kFrames) * 2);
     int64_t position = 0;
+    double cpu = 0;
     for (auto _ : state) {
+        const double before = ThreadCpuSeconds();
         std::fill(out.begin(), out.end(), 0.0f);
         for (const auto& channel : samples) {
             const int16_t* data = channel.data() + position;
@@ -140,9 +155,10 @@ void BM_Baseline_SumChannels(benchmark::State& state)
             }
         }
         benchmark::DoNotOptimize(out.data());
+        cpu += ThreadCpuSeconds() - before;
         position = (position + kFrames) % (kDocumentFrames - kFrames);
     }
-    ReportBufferShare(state);
+    ReportBufferShare(state, cpu);
 }
 BENCHMARK(BM_Baseline_SumChannels)->Arg(2)->Arg(16)->Arg(64);
 
