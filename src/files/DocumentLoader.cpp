@@ -1,7 +1,5 @@
 #include "files/DocumentLoader.h"
 
-#include <sys/mman.h>
-
 #include <algorithm>
 #include <new>
 #include <system_error>
@@ -35,28 +33,11 @@ media_format ShortAudioRequest()
     return request;
 }
 
-// Arrays from this size on ask for huge pages: filling a long recording
-// then costs a fraction of the page faults.
-constexpr size_t kHugePageSize = size_t(2) << 20;
-
-void PreferHugePages(void* start, size_t bytes)
-{
-    if (bytes < 2 * kHugePageSize)
-        return;
-    const uintptr_t first = (reinterpret_cast<uintptr_t>(start) + kHugePageSize - 1) & ~(kHugePageSize - 1);
-    const uintptr_t end = (reinterpret_cast<uintptr_t>(start) + bytes) & ~(kHugePageSize - 1);
-    if (end > first)
-        madvise(reinterpret_cast<void*>(first), end - first, MADV_HUGEPAGE);
-}
-
 std::unique_ptr<int16_t[]> AllocateSamples(int64_t count)
 {
     if (count <= 0 || count > int64_t(UINT32_MAX))
         return nullptr;
-    std::unique_ptr<int16_t[]> samples(new (std::nothrow) int16_t[size_t(count)]);
-    if (samples != nullptr)
-        PreferHugePages(samples.get(), size_t(count) * sizeof(int16_t));
-    return samples;
+    return std::unique_ptr<int16_t[]>(new (std::nothrow) int16_t[size_t(count)]);
 }
 
 /// Copies frames interleaved frames of channels samples into the arrays
