@@ -13,7 +13,7 @@
 namespace glimmet {
 namespace {
 
-using test::ChannelSpec;
+using test::ChannelRecipe;
 using test::FakePlaybackWindow;
 using test::ReferencePlayback;
 
@@ -33,10 +33,10 @@ MediaFormat RawFloat(uint32_t bufferSize = kWildcardBufferSize)
     return format;
 }
 
-std::vector<ChannelSpec> SmallDocument(int64_t length)
+std::vector<ChannelRecipe> SmallDocument(int64_t length)
 {
     std::mt19937 random(5);
-    std::vector<ChannelSpec> channels;
+    std::vector<ChannelRecipe> channels;
     channels.push_back({test::RandomSamples(random, length, 100, 3000), 0, 0, false});
     channels.push_back({test::RandomSamples(random, length - 40, -3000, 3000), 40, -128, false});
     channels.push_back({test::RandomSamples(random, length, -3000, 3000), 0, 127, false});

@@ -11,7 +11,7 @@
 namespace glimmet {
 namespace {
 
-using test::ChannelSpec;
+using test::ChannelRecipe;
 using test::DiskAudio;
 using test::FakePlaybackWindow;
 using test::ReferencePlayback;
@@ -21,10 +21,10 @@ constexpr int64_t kLength = 12000;
 // Positive samples everywhere, so that every played frame is heard on both
 // sides and the first sound in the device's output marks the start; small
 // enough that no sum reaches the soft-clipping curve.
-std::vector<ChannelSpec> Document()
+std::vector<ChannelRecipe> Document()
 {
     std::mt19937 random(23);
-    std::vector<ChannelSpec> channels;
+    std::vector<ChannelRecipe> channels;
     channels.push_back({test::RandomSamples(random, kLength, 100, 2400), 0, 0, false});
     channels.push_back({test::RandomSamples(random, kLength - 700, 100, 2400), 700, 0, false});
     channels.push_back({test::RandomSamples(random, kLength - 2000, 100, 2400), 0, -128, false});
@@ -171,7 +171,7 @@ protected:
     int64_t updatesDropped = 0;
     DiskAudio disk;
     FakePlaybackWindow window;
-    std::vector<ChannelSpec> channels;
+    std::vector<ChannelRecipe> channels;
     std::unique_ptr<ChannelManager> manager;
     std::unique_ptr<PlaybackController> controller;
     std::vector<float> output;

@@ -13,11 +13,11 @@
 namespace glimmet {
 namespace {
 
-using test::ChannelSpec;
+using test::ChannelRecipe;
 using test::DiskAudio;
 using test::FakePlaybackWindow;
 
-std::vector<ChannelSpec> Document(int64_t length)
+std::vector<ChannelRecipe> Document(int64_t length)
 {
     std::mt19937 random(11);
     return {{test::RandomSamples(random, length, 100, 3000), 0, 0, false}};

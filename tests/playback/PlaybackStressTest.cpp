@@ -23,7 +23,7 @@
 namespace glimmet {
 namespace {
 
-using test::ChannelSpec;
+using test::ChannelRecipe;
 
 // What the actions need of the views, without widgets.
 class StressView : public ChannelView {
@@ -94,7 +94,7 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
     window.visibleFirst = 1000;
     window.visibleLast = 9000;
     std::mt19937 random(2024);
-    std::vector<ChannelSpec> channels;
+    std::vector<ChannelRecipe> channels;
     channels.push_back({test::RandomSamples(random, kLength, -20000, 20000), 0, 0, false});
     channels.push_back({test::RandomSamples(random, kLength, -20000, 20000), 0, -128, false});
     channels.push_back({test::RandomSamples(random, kLength, -20000, 20000), 0, 127, false});

@@ -63,7 +63,7 @@ std::vector<int16_t> RandomSamples(std::mt19937& random, int64_t count, int16_t 
     return samples;
 }
 
-ReferencePlayback::ReferencePlayback(std::vector<ChannelSpec> channels, int32_t mode, bool loop,
+ReferencePlayback::ReferencePlayback(std::vector<ChannelRecipe> channels, int32_t mode, bool loop,
     int64_t rangeStart, int64_t rangeEnd, int64_t visibleFirst, int64_t visibleLast)
     : channels_(std::move(channels)), mode_(mode), loop_(loop), rangeStart_(rangeStart), rangeEnd_(rangeEnd),
       visibleFirst_(visibleFirst), visibleLast_(visibleLast)
@@ -73,7 +73,7 @@ ReferencePlayback::ReferencePlayback(std::vector<ChannelSpec> channels, int32_t 
 int64_t ReferencePlayback::FrameCount() const
 {
     int64_t total = 0;
-    for (const ChannelSpec& channel : channels_)
+    for (const ChannelRecipe& channel : channels_)
         total = std::max(total, channel.firstFrame + int64_t(channel.samples.size()));
     return total;
 }
@@ -101,7 +101,7 @@ void ReferencePlayback::MixFrame(int64_t frame, float* left, float* right) const
 {
     float sums[2] = {0.0f, 0.0f};
     int counts[2] = {0, 0};
-    for (const ChannelSpec& channel : channels_) {
+    for (const ChannelRecipe& channel : channels_) {
         if (channel.muted)
             continue;
         const int64_t index = frame - channel.firstFrame;
@@ -191,16 +191,16 @@ std::vector<int64_t> ReferencePlayback::Positions(int64_t current, int64_t buffe
     return positions;
 }
 
-void AddChannels(ChannelManager* manager, const std::vector<ChannelSpec>& channels)
+void AddChannels(ChannelManager* manager, const std::vector<ChannelRecipe>& channels)
 {
-    for (const ChannelSpec& spec : channels) {
-        auto* samples = new int16_t[spec.samples.size()];
-        std::copy(spec.samples.begin(), spec.samples.end(), samples);
+    for (const ChannelRecipe& recipe : channels) {
+        auto* samples = new int16_t[recipe.samples.size()];
+        std::copy(recipe.samples.begin(), recipe.samples.end(), samples);
         auto* channel = new Channel();
-        channel->SetTo(samples, int64_t(spec.samples.size()));
-        channel->SetStartFrameOffset(spec.firstFrame);
-        channel->SetPanPosition(spec.pan);
-        channel->SetMuted(spec.muted);
+        channel->SetTo(samples, int64_t(recipe.samples.size()));
+        channel->SetStartFrameOffset(recipe.firstFrame);
+        channel->SetPanPosition(recipe.pan);
+        channel->SetMuted(recipe.muted);
         manager->AddChannel(channel);
     }
 }

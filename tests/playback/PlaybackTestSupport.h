@@ -50,7 +50,7 @@ private:
 };
 
 /// How one channel of a test document is made.
-struct ChannelSpec {
+struct ChannelRecipe {
     std::vector<int16_t> samples;
     int64_t firstFrame = 0;
     int8_t pan = 0;
@@ -67,7 +67,7 @@ std::vector<int16_t> RandomSamples(std::mt19937& random, int64_t count, int16_t 
 /// (|x| <= 0.3), which Mix checks.
 class ReferencePlayback {
 public:
-    ReferencePlayback(std::vector<ChannelSpec> channels, int32_t mode, bool loop, int64_t rangeStart,
+    ReferencePlayback(std::vector<ChannelRecipe> channels, int32_t mode, bool loop, int64_t rangeStart,
         int64_t rangeEnd, int64_t visibleFirst, int64_t visibleLast);
 
     /// The frames of count buffers played from the play position current.
@@ -84,7 +84,7 @@ private:
     bool Buffer(int64_t* current, int64_t frames, std::vector<float>* out) const;
     void MixFrame(int64_t frame, float* left, float* right) const;
 
-    std::vector<ChannelSpec> channels_;
+    std::vector<ChannelRecipe> channels_;
     int32_t mode_;
     bool loop_;
     int64_t rangeStart_;
@@ -93,8 +93,8 @@ private:
     int64_t visibleLast_;
 };
 
-/// Builds a channel for the manager from a spec.
-void AddChannels(ChannelManager* manager, const std::vector<ChannelSpec>& channels);
+/// Builds a channel for the manager from a recipe.
+void AddChannels(ChannelManager* manager, const std::vector<ChannelRecipe>& channels);
 
 /// A document window without widgets: it queues messages through Qt like
 /// the real one, answers the mixer's visible-frames query, records every
