@@ -9,6 +9,7 @@
 #include <memory>
 #include <vector>
 
+#include "app/QuillexWindow.h"
 #include "edit/CopyBuffer.h"
 #include "support/Handler.h"
 #include "support/Locker.h"
@@ -16,8 +17,6 @@
 class QFileDialog;
 
 namespace glimmet {
-
-class QuillexWindow;
 
 /// The application object: the list of open document windows, the open
 /// panel, and the commands that concern the whole program. There is one per

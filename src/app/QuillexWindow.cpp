@@ -26,11 +26,21 @@
 #include "app/TextControl.h"
 #include "edit/Action.h"
 #include "edit/CopyBuffer.h"
+#include "edit/FadeInAction.h"
+#include "edit/FadeOutAction.h"
 #include "edit/HistoryManager.h"
+#include "edit/MaximizeAction.h"
+#include "edit/RevertAction.h"
+#include "edit/RevertPhasesAction.h"
+#include "files/DocumentLoader.h"
+#include "files/DocumentSaver.h"
+#include "playback/PlaybackController.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "support/MessageCodes.h"
 #include "support/MessageEvent.h"
+#include "views/ChannelContainerView.h"
+#include "views/ZoomSlider.h"
 
 namespace glimmet {
 
@@ -69,6 +79,9 @@ QuillexWindow::QuillexWindow()
     move(100, 100);
     resize(701, 301);
 
+    zoomSlider_ = new ZoomSlider(this, 0, 0, 0);
+    containerView_ = new ChannelContainerView(manager_, zoomSlider_, this);
+
     setMenuBar(CreateMenu());
 
     auto* background = new QFrame(this);
@@ -79,8 +92,11 @@ QuillexWindow::QuillexWindow()
     column->setSpacing(0);
     column->addWidget(CreateControlRow());
     column->addSpacing(5);
-    column->addStretch(1);
+    column->addWidget(containerView_, 1);
     setCentralWidget(background);
+
+    playback_ = std::make_unique<PlaybackController>(manager_, this, this);
+    playback_->SetUp();
 
     auto* playShortcut = new QShortcut(QKeySequence(Qt::CTRL | Qt::Key_Space), this);
     connect(playShortcut, &QShortcut::activated, this, [this] { PostMessage(kMsgTogglePlay); });
@@ -91,6 +107,8 @@ QuillexWindow::QuillexWindow()
 
 QuillexWindow::~QuillexWindow()
 {
+    playback_->TearDown();
+    playback_.reset();
     // The views point into the document; they go before it does.
     delete takeCentralWidget();
     pendingAction_.reset();
@@ -248,8 +266,8 @@ void QuillexWindow::LockWindow()
 
 void QuillexWindow::GetVisibleFrames(int64_t* first, int64_t* last)
 {
-    *first = 0;
-    *last = manager_->FrameCount() - 1;
+    *first = containerView_->FirstDisplayedFrame();
+    *last = containerView_->LastDisplayedFrame();
 }
 
 void QuillexWindow::customEvent(QEvent* event)
@@ -271,13 +289,9 @@ void QuillexWindow::PostToApplication(const Message& message)
 
 void QuillexWindow::MessageReceived(const Message& message)
 {
+    if (playback_->MessageReceived(message) || HandleViewCommand(message) || HandleEditCommand(message.what))
+        return;
     switch (message.what) {
-    case kMsgPlayMode:
-        HandlePlayMode();
-        break;
-    case kMsgLoop:
-        HandleLoop();
-        break;
     case kMsgRangeStartChanged:
         HandleRangeStartChanged(message);
         break;
@@ -340,16 +354,61 @@ void QuillexWindow::MessageReceived(const Message& message)
 // ---------------------------------------------------------------------------
 // Play controls and range fields
 
-void QuillexWindow::HandlePlayMode()
+bool QuillexWindow::IsPlaying() const
 {
-    const int index = playModePopup_->currentIndex();
-    if (index >= 0)
-        manager_->SetPlayMode(int32_t(index));
+    return playback_->IsPlaying();
 }
 
-void QuillexWindow::HandleLoop()
+void QuillexWindow::SetPlaymarkFrame(int64_t frame)
 {
-    manager_->SetLoop(loopBox_->isChecked());
+    containerView_->SetPlaymarkFrame(frame);
+}
+
+void QuillexWindow::SetPlaymarkToCursor()
+{
+    containerView_->SetPlaymarkToCursor();
+}
+
+void QuillexWindow::SetPlayModeButtonMode(int32_t mode)
+{
+    playModeButtonMode_ = mode;
+}
+
+int32_t QuillexWindow::MarkedPlayModeIndex()
+{
+    return int32_t(playModePopup_->currentIndex());
+}
+
+bool QuillexWindow::IsLoopChecked()
+{
+    return loopBox_->isChecked();
+}
+
+bool QuillexWindow::HandleViewCommand(const Message& message)
+{
+    switch (message.what) {
+    case kMsgSelectAll:
+        containerView_->SelectAll();
+        return true;
+    case kMsgSelectNone:
+        containerView_->DeselectAll();
+        return true;
+    case kMsgZoomRange:
+        containerView_->ZoomRange();
+        return true;
+    case kMsgShowAll:
+        containerView_->ShowAll();
+        return true;
+    case kMsgSetDisplayRange: {
+        int64_t first = 0;
+        int64_t last = 0;
+        if (message.FindInt64("first frame", &first) == B_OK && message.FindInt64("last frame", &last) == B_OK)
+            containerView_->SetDisplayRange(first, last);
+        return true;
+    }
+    default:
+        return false;
+    }
 }
 
 void QuillexWindow::HandleRangeStartChanged(const Message& message)
@@ -373,12 +432,14 @@ void QuillexWindow::HandleRangeEndChanged(const Message& message)
 void QuillexWindow::HandleSetRangeStart()
 {
     manager_->SetRangeStart(RangeFieldValue(rangeStartField_));
+    containerView_->RangeChanged();
     UpdateZoomRangeItem();
 }
 
 void QuillexWindow::HandleSetRangeEnd()
 {
     manager_->SetRangeEnd(RangeFieldValue(rangeEndField_));
+    containerView_->RangeChanged();
     UpdateZoomRangeItem();
 }
 
@@ -400,7 +461,7 @@ void QuillexWindow::SetupAction(Action* action)
     pendingAction_.reset(action);
     if (action == nullptr)
         return;
-    action->SetTo(manager_, Container());
+    action->SetTo(manager_, containerView_);
     if (action->InitCheck() != B_OK) {
         pendingAction_.reset();
         return;
@@ -419,7 +480,7 @@ void QuillexWindow::HandleActionGo()
         supersededActions_.emplace_back(action);
     }
     action->Go();
-    UpdateChannelViews();
+    containerView_->UpdateAll();
     UpdateUndoMenu();
 }
 
@@ -436,7 +497,7 @@ void QuillexWindow::HandleUndo()
         std::fflush(stdout);
         return;
     }
-    UpdateChannelViews();
+    containerView_->UpdateAll();
     UpdateUndoMenu();
 }
 
@@ -448,7 +509,7 @@ void QuillexWindow::HandleRedo()
         std::fflush(stdout);
         return;
     }
-    UpdateChannelViews();
+    containerView_->UpdateAll();
     UpdateUndoMenu();
 }
 
@@ -509,6 +570,29 @@ void QuillexWindow::Copy()
         application->SetCopyBuffer(std::move(channels), frames);
     }
     manager_->Unlock();
+}
+
+bool QuillexWindow::HandleEditCommand(uint32_t what)
+{
+    switch (what) {
+    case kMsgFadeIn:
+        SetupAction(new FadeInAction(this));
+        return true;
+    case kMsgFadeOut:
+        SetupAction(new FadeOutAction(this));
+        return true;
+    case kMsgMaximize:
+        SetupAction(new MaximizeAction(this));
+        return true;
+    case kMsgRevert:
+        SetupAction(new RevertAction(this));
+        return true;
+    case kMsgRevertPhases:
+        SetupAction(new RevertPhasesAction(this));
+        return true;
+    default:
+        return false;
+    }
 }
 
 // ---------------------------------------------------------------------------
@@ -630,29 +714,27 @@ void QuillexWindow::HandleSavePanelChoice(const Message& message)
 
 status_t QuillexWindow::SetTo(const std::filesystem::path& file)
 {
-    fileEntry_ = file;
-    if (!appendOnLoad_)
-        SetDocumentTitle(file);
-    return B_OK;
+    return DocumentLoader::Load(file, *this);
 }
 
-status_t QuillexWindow::SaveFile(const std::filesystem::path&)
+status_t QuillexWindow::SaveFile(const std::filesystem::path& file)
 {
-    history_->Save();
-    saveItem_->setEnabled(false);
-    return B_OK;
+    return DocumentSaver::SaveFile(file, *this);
 }
 
-ChannelContainer* QuillexWindow::Container() const
+ChannelContainer* QuillexWindow::DocumentContainer()
 {
-    return nullptr;
+    return containerView_;
 }
 
-void QuillexWindow::UpdateChannelViews() {}
-
-void QuillexWindow::SetDocumentTitle(const std::filesystem::path& file)
+void QuillexWindow::SetWindowTitle(const std::string& title)
 {
-    setWindowTitle(TitleFor(file.filename().string()));
+    setWindowTitle(QString::fromStdString(title));
+}
+
+void QuillexWindow::SetSaveItemEnabled(bool enabled)
+{
+    saveItem_->setEnabled(enabled);
 }
 
 // ---------------------------------------------------------------------------

@@ -9,6 +9,9 @@
 #include <optional>
 #include <vector>
 
+#include "files/LoadTarget.h"
+#include "files/SaveTarget.h"
+#include "playback/PlaybackWindow.h"
 #include "sound/DocumentWindow.h"
 #include "support/Locker.h"
 #include "support/Message.h"
@@ -23,8 +26,11 @@ namespace glimmet {
 
 class Action;
 class ChannelContainer;
+class ChannelContainerView;
 class ChannelManager;
 class HistoryManager;
+class PlaybackController;
+class ZoomSlider;
 class TextControl;
 enum class KeptMenuItem;
 
@@ -35,7 +41,11 @@ enum class KeptMenuItem;
 /// Widgets live in the GUI thread, so all dispatch runs there; the window
 /// lock is held around each dispatch so that the audio thread's timed try
 /// (visible play mode) knows when the view may be read.
-class QuillexWindow : public QMainWindow, public DocumentWindow {
+class QuillexWindow : public QMainWindow,
+                      public DocumentWindow,
+                      public LoadTarget,
+                      public SaveTarget,
+                      public PlaybackWindow {
     Q_OBJECT
 
 public:
@@ -55,6 +65,23 @@ public:
     void GetVisibleFrames(int64_t* first, int64_t* last) override;
 
     void LockWindow();
+
+    // LoadTarget and SaveTarget: the window's thread, while it loads or saves.
+    ChannelManager* DocumentManager() override { return manager_; }
+    ChannelContainer* DocumentContainer() override;
+    bool IsAppendOnLoad() override { return appendOnLoad_; }
+    void ReplaceFileEntry(const std::filesystem::path& entry) override { fileEntry_ = entry; }
+    void SetWindowTitle(const std::string& title) override;
+    status_t PostToSelf(uint32_t what) override { return PostMessage(what); }
+    HistoryManager* DocumentHistory() override { return history_; }
+    void SetSaveItemEnabled(bool enabled) override;
+
+    // PlaybackWindow: the window's thread, from the playback commands.
+    void SetPlaymarkFrame(int64_t frame) override;
+    void SetPlaymarkToCursor() override;
+    void SetPlayModeButtonMode(int32_t mode) override;
+    int32_t MarkedPlayModeIndex() override;
+    bool IsLoopChecked() override;
 
     /// Handles one command; see the window's message table.
     void MessageReceived(const Message& message);
@@ -92,7 +119,12 @@ public:
     ChannelManager* Manager() const { return manager_; }
     HistoryManager* History() const { return history_; }
     Action* PendingAction() const { return pendingAction_.get(); }
-    bool IsPlaying() const { return playing_; }
+    bool IsPlaying() const;
+    /// 0 while playback runs, 1 while it is stopped.
+    int32_t PlayModeButtonMode() const { return playModeButtonMode_; }
+    ChannelContainerView* ContainerView() const { return containerView_; }
+    ZoomSlider* GetZoomSlider() const { return zoomSlider_; }
+    PlaybackController* Playback() const { return playback_.get(); }
     bool AppendOnLoad() const { return appendOnLoad_; }
     void SetAppendOnLoad(bool append) { appendOnLoad_ = append; }
     const std::optional<std::filesystem::path>& FileEntry() const { return fileEntry_; }
@@ -119,8 +151,7 @@ private:
     void PostToApplication(const Message& message);
 
     // Handlers of the message table.
-    void HandlePlayMode();
-    void HandleLoop();
+    bool HandleViewCommand(const Message& message);
     void HandleRangeStartChanged(const Message& message);
     void HandleRangeEndChanged(const Message& message);
     void HandleSetRangeStart();
@@ -138,13 +169,10 @@ private:
     void HandleDrop(const Message& message);
     bool HandleEditCommand(uint32_t what);
 
-    ChannelContainer* Container() const;
-    void UpdateChannelViews();
     void UpdateZoomRangeItem();
     void ShowSavePanel();
     void SavePanelChose(const QString& file);
     bool IsDocumentSaved();
-    void SetDocumentTitle(const std::filesystem::path& file);
 
     // Declared first so that they outlive everything that points into them.
     std::unique_ptr<ChannelManager> ownedManager_;
@@ -152,14 +180,17 @@ private:
 
     ChannelManager* manager_;
     HistoryManager* history_;
+    ZoomSlider* zoomSlider_ = nullptr;
+    ChannelContainerView* containerView_ = nullptr;
     QAction* bubbleHelpItem_ = nullptr;
     QAction* zoomRangeItem_ = nullptr;
     QAction* undoItem_ = nullptr;
     QAction* redoItem_ = nullptr;
     QAction* deleteHistoryItem_ = nullptr;
     QAction* saveItem_ = nullptr;
-    bool playing_ = false;
-    bool playmarkAcknowledged_ = true;
+    /// Playing state, the play mark throttle and the playback graph.
+    std::unique_ptr<PlaybackController> playback_;
+    int32_t playModeButtonMode_ = 1;
     bool appendOnLoad_ = false;
     std::optional<std::filesystem::path> fileEntry_;
     std::unique_ptr<QFileDialog> savePanel_;

@@ -23,6 +23,7 @@ TextControl::TextControl(const QString& label, const QString& text, Message mess
     layout->addWidget(label_);
     layout->addWidget(field_, 1);
     label_->setBuddy(field_);
+    connect(field_, &QLineEdit::returnPressed, this, &TextControl::EntryFinished);
     connect(field_, &QLineEdit::editingFinished, this, &TextControl::EntryFinished);
 }
 

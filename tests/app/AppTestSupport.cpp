@@ -103,8 +103,12 @@ void MakeUnsaved(QuillexWindow* window)
     ASSERT_FALSE(window->History()->IsSaved());
 }
 
-AppFixture::AppFixture() : application_(std::make_unique<Quillex>())
+AppFixture::AppFixture()
 {
+    // Windows set up playback; tests never need a real sound device.
+    if (qEnvironmentVariableIsEmpty("SDL_AUDIODRIVER"))
+        qputenv("SDL_AUDIODRIVER", "dummy");
+    application_ = std::make_unique<Quillex>();
     application_->SetQuitHook([this] { ++quits_; });
     QuillexWindow::SetSaveQuestion([](QuillexWindow*) {
         ADD_FAILURE() << "unexpected \"Save changes?\" question";

@@ -1,0 +1,654 @@
+#include <gtest/gtest.h>
+
+#include <QAction>
+#include <QCheckBox>
+#include <QComboBox>
+#include <QDropEvent>
+#include <QFileDialog>
+#include <QLineEdit>
+#include <QMessageBox>
+#include <QLabel>
+#include <QMimeData>
+#include <QPushButton>
+#include <QTest>
+#include <QTimer>
+#include <QUrl>
+
+#include <algorithm>
+
+#include "AppTestSupport.h"
+#include "app/MenuTable.h"
+#include "app/TextControl.h"
+#include "edit/Action.h"
+#include "edit/HistoryManager.h"
+#include "playback/PlaybackController.h"
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+#include "support/MessageCodes.h"
+#include "views/ChannelContainerView.h"
+
+namespace glimmet::test {
+namespace {
+
+/// A window of the fixture's application, loaded with a file when one is
+/// given.
+QuillexWindow* OpenWindow(AppFixture& fixture, const std::filesystem::path& file = {})
+{
+    QuillexWindow* window = fixture.App().NewWindow();
+    if (!file.empty()) {
+        window->LockWindow();
+        window->SetTo(file);
+        window->UnlockWindow();
+    }
+    Drain();
+    return window;
+}
+
+bool IsListed(AppFixture& fixture, QuillexWindow* window)
+{
+    for (int32_t i = 0; i < fixture.App().CountWindows(); ++i) {
+        if (fixture.App().WindowAt(i) == window)
+            return true;
+    }
+    return false;
+}
+
+void DropFiles(QuillexWindow* window, const std::vector<std::filesystem::path>& files, Qt::KeyboardModifiers modifiers)
+{
+    QMimeData data;
+    QList<QUrl> urls;
+    for (const std::filesystem::path& file : files)
+        urls << QUrl::fromLocalFile(QString::fromStdString(file.string()));
+    data.setUrls(urls);
+    const QPointF where(window->width() / 2.0, window->height() / 2.0);
+    QDragEnterEvent enter(where.toPoint(), Qt::CopyAction, &data, Qt::LeftButton, modifiers);
+    QCoreApplication::sendEvent(window, &enter);
+    ASSERT_TRUE(enter.isAccepted());
+    QDropEvent drop(where, Qt::CopyAction, &data, Qt::LeftButton, modifiers);
+    QCoreApplication::sendEvent(window, &drop);
+    Drain();
+}
+
+TEST(QuillexWindow, IsBuiltWithTitleSizeAndControls)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    EXPECT_EQ(window->windowTitle(), "Glimmet");
+    EXPECT_EQ(window->geometry().size(), QSize(701, 301));
+    EXPECT_TRUE(window->isVisible());
+    ASSERT_NE(window->ContainerView(), nullptr);
+    EXPECT_NE(window->GetZoomSlider(), nullptr);
+    EXPECT_NE(window->findChild<QWidget*>("Background"), nullptr);
+
+    QComboBox* popup = window->PlayModePopup();
+    ASSERT_EQ(popup->count(), 3);
+    EXPECT_EQ(popup->itemText(0), "All");
+    EXPECT_EQ(popup->itemText(1), "Range");
+    EXPECT_EQ(popup->itemText(2), "Visible");
+    EXPECT_EQ(popup->currentIndex(), 0);
+    EXPECT_EQ(window->LoopBox()->text(), "Loop");
+    EXPECT_TRUE(window->LoopBox()->isChecked());
+    EXPECT_EQ(window->RangeStartField()->Label()->text(), "Range Start:");
+    EXPECT_EQ(window->RangeEndField()->Label()->text(), "Range End:");
+    EXPECT_EQ(window->RangeStartField()->Text(), "-1");
+    EXPECT_EQ(window->RangeEndField()->Text(), "-1");
+    EXPECT_FALSE(window->IsPlaying());
+    EXPECT_EQ(window->PlayModeButtonMode(), 1);
+}
+
+TEST(QuillexWindow, ControlRowRunsLeftToRightWithTheFreeWidthBeforeTheRangeFields)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    window->resize(900, 400);
+    Drain();
+    const auto left = [window](QWidget* widget) { return widget->mapTo(window, QPoint(0, 0)).x(); };
+    const auto right = [&](QWidget* widget) { return left(widget) + widget->width(); };
+    EXPECT_LT(right(window->PlayModePopup()), left(window->LoopBox()) + 1);
+    EXPECT_GT(left(window->RangeStartField()) - right(window->LoopBox()), 100);
+    EXPECT_EQ(left(window->RangeEndField()) - right(window->RangeStartField()), 15);
+    // The channel strips sit 5 pixels under the control row.
+    EXPECT_EQ(window->ContainerView()->mapTo(window, QPoint(0, 0)).y()
+            - (window->LoopBox()->parentWidget()->mapTo(window, QPoint(0, 0)).y()
+                + window->LoopBox()->parentWidget()->height()),
+        5);
+}
+
+TEST(QuillexWindow, RangeFieldsAcceptOnlyDigitsAndMinus)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    QLineEdit* field = window->RangeStartField()->Field();
+    field->clear();
+    QTest::keyClicks(field, "12a");
+    EXPECT_EQ(field->text(), "12");
+    field->clear();
+    QTest::keyClicks(field, "-3 x.4+5");
+    EXPECT_EQ(field->text(), "-345");
+    QLineEdit* end = window->RangeEndField()->Field();
+    end->clear();
+    QTest::keyClicks(end, "7e9");
+    EXPECT_EQ(end->text(), "79");
+}
+
+TEST(QuillexWindow, ZoomRangeItemIsDisabledOnlyWhenBothFieldsReadMinusOne)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("zoom.wav", 1, 100));
+    QAction* zoomRange = window->MenuItem(KeptMenuItem::ZoomRange);
+    EXPECT_TRUE(zoomRange->isEnabled());  // nothing is disabled when built
+
+    Message start(kMsgRangeStartChanged);
+    start.AddInt64("range start", -1);
+    Message end(kMsgRangeEndChanged);
+    end.AddInt64("range end", -1);
+    window->PostMessage(start);
+    window->PostMessage(end);
+    Drain();
+    EXPECT_FALSE(zoomRange->isEnabled());
+
+    QLineEdit* field = window->RangeStartField()->Field();
+    field->selectAll();
+    QTest::keyClicks(field, "0");
+    ASSERT_EQ(field->text(), "0");
+    ASSERT_TRUE(field->isModified());
+    QTest::keyClick(field, Qt::Key_Return);
+    Drain();
+    EXPECT_TRUE(zoomRange->isEnabled());
+    EXPECT_EQ(window->Manager()->RangeStart(), 0);
+
+    // The document moved the end along with the start.
+    EXPECT_EQ(window->RangeEndField()->Text(), "0");
+
+    const auto type = [](TextControl* control, const char* text) {
+        control->Field()->selectAll();
+        QTest::keyClicks(control->Field(), text);
+        QTest::keyClick(control->Field(), Qt::Key_Return);
+        Drain();
+    };
+    type(window->RangeStartField(), "-1");
+    EXPECT_TRUE(zoomRange->isEnabled());
+    type(window->RangeEndField(), "-1");
+    EXPECT_FALSE(zoomRange->isEnabled());
+    type(window->RangeEndField(), "0");
+    EXPECT_TRUE(zoomRange->isEnabled());
+    EXPECT_EQ(window->Manager()->RangeEnd(), 0);
+}
+
+TEST(QuillexWindow, RangeFieldValuesAreReadAsThirtyTwoBitNumbers)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    window->RangeStartField()->SetText("4294967295");
+    window->RangeEndField()->SetText("-1");
+    window->PostMessage(kMsgSetRangeStart);
+    Drain();
+    EXPECT_EQ(window->Manager()->RangeStart(), -1);
+    EXPECT_FALSE(window->MenuItem(KeptMenuItem::ZoomRange)->isEnabled());
+}
+
+TEST(QuillexWindow, RangeMessagesWriteTheFieldsAndMissingFieldsAreIgnored)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    Message start(kMsgRangeStartChanged);
+    start.AddInt64("range start", 1234567890123);
+    window->PostMessage(start);
+    Message wrongType(kMsgRangeEndChanged);
+    wrongType.AddInt32("range end", 5);
+    window->PostMessage(wrongType);
+    Drain();
+    EXPECT_EQ(window->RangeStartField()->Text(), "1234567890123");
+    EXPECT_EQ(window->RangeEndField()->Text(), "-1");
+}
+
+TEST(QuillexWindow, PlayModePopupAndLoopBoxSetTheDocument)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    window->PlayModePopup()->setCurrentIndex(2);
+    emit window->PlayModePopup()->activated(2);
+    Drain();
+    EXPECT_EQ(window->Manager()->PlayMode(), ChannelManager::kPlayVisible);
+    QTest::mouseClick(window->LoopBox(), Qt::LeftButton);
+    Drain();
+    EXPECT_FALSE(window->LoopBox()->isChecked());
+    EXPECT_FALSE(window->Manager()->Loop());
+    QTest::mouseClick(window->LoopBox(), Qt::LeftButton);
+    Drain();
+    EXPECT_TRUE(window->Manager()->Loop());
+}
+
+TEST(QuillexWindow, SpaceTwiceStartsAndStopsPlaybackAndTheModeFollows)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("play.wav", 1, 44100));
+    window->PostMessage(kMsgTogglePlay);
+    Drain();
+    EXPECT_TRUE(window->IsPlaying());
+    EXPECT_EQ(window->PlayModeButtonMode(), 0);
+    window->PostMessage(kMsgTogglePlay);
+    Drain();
+    EXPECT_FALSE(window->IsPlaying());
+    EXPECT_EQ(window->PlayModeButtonMode(), 1);
+}
+
+TEST(QuillexWindow, ControlSpaceIsTheWindowsPlaybackShortcut)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("shortcut.wav", 1, 44100));
+    QApplication::setActiveWindow(window);
+    ASSERT_TRUE(QTest::qWaitForWindowActive(window));
+    QTest::keyClick(window, Qt::Key_Space, Qt::ControlModifier);
+    Drain();
+    EXPECT_TRUE(window->IsPlaying());
+    QTest::keyClick(window, Qt::Key_Space, Qt::ControlModifier);
+    Drain();
+    EXPECT_FALSE(window->IsPlaying());
+}
+
+TEST(QuillexWindow, StopWhileStoppedResetsThePositionAndMovesThePlaymark)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("stop.wav", 1, 1000));
+    window->Manager()->SetCurrentFrame(500);
+    window->ContainerView()->SetPlaymarkFrame(500);
+    Drain();
+    window->PostMessage(kMsgStop);
+    Drain();
+    EXPECT_FALSE(window->IsPlaying());
+    EXPECT_NE(window->Manager()->CurrentFrame(), 500);
+    EXPECT_EQ(window->ContainerView()->PlaymarkFrame(), window->Manager()->CurrentFrame());
+}
+
+TEST(QuillexWindow, ABurstOfPlaymarkUpdatesMovesThePlaymarkOnce)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("burst.wav", 1, 1000));
+    for (int64_t frame : {100, 200, 300}) {
+        Message update(kMsgUpdatePlaymark);
+        update.AddInt64("current frame", frame);
+        window->PostMessage(update);
+    }
+    Drain();
+    EXPECT_EQ(window->ContainerView()->PlaymarkFrame(), 100);
+    // Acknowledged by now, so the next one moves it again.
+    Message next(kMsgUpdatePlaymark);
+    next.AddInt64("current frame", 400);
+    window->PostMessage(next);
+    window->PostMessage(kMsgUpdatePlaymark);  // no field: ignored
+    Drain();
+    EXPECT_EQ(window->ContainerView()->PlaymarkFrame(), 400);
+}
+
+TEST(QuillexWindow, DroppingThreeFilesLoadsOnlyTheFirst)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("base.wav", 2));
+    ASSERT_EQ(window->Manager()->CountChannels(), 2);
+    const auto a = fixture.MakeSound("a.wav", 1);
+    const auto b = fixture.MakeSound("b.wav", 2);
+    const auto c = fixture.MakeSound("c.wav", 2);
+    DropFiles(window, {a, b, c}, Qt::NoModifier);
+    EXPECT_EQ(window->Manager()->CountChannels(), 1);
+    EXPECT_EQ(window->windowTitle(), "Glimmet - a.wav");
+    EXPECT_EQ(window->FileEntry(), a);
+    EXPECT_EQ(fixture.App().CountWindows(), 1);
+}
+
+TEST(QuillexWindow, DroppingWithShiftAddsTheChannels)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("base.wav", 1));
+    const auto stereo = fixture.MakeSound("stereo.wav", 2);
+    DropFiles(window, {stereo, fixture.MakeSound("ignored.wav", 1)}, Qt::ShiftModifier);
+    EXPECT_TRUE(window->AppendOnLoad());
+    EXPECT_EQ(window->Manager()->CountChannels(), 3);
+    EXPECT_EQ(window->ContainerView()->CountChannelViews(), 3);
+    EXPECT_EQ(window->windowTitle(), "Glimmet - base.wav");
+}
+
+TEST(QuillexWindow, DropMessageWithoutRefsIsIgnored)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("kept.wav", 1));
+    window->PostMessage(kMsgSimpleData);
+    Drain();
+    EXPECT_EQ(window->windowTitle(), "Glimmet - kept.wav");
+    EXPECT_EQ(window->Manager()->CountChannels(), 1);
+}
+
+TEST(QuillexWindow, SaveOnAnUntitledDocumentAsksWhereWithSoundWav)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    EXPECT_EQ(window->SavePanel(), nullptr);
+    window->PostMessage(kMsgSave);
+    Drain();
+    QFileDialog* panel = window->SavePanel();
+    ASSERT_NE(panel, nullptr);
+    EXPECT_TRUE(panel->isVisible());
+    EXPECT_EQ(panel->acceptMode(), QFileDialog::AcceptSave);
+    auto* nameField = panel->findChild<QLineEdit*>("fileNameEdit");
+    ASSERT_NE(nameField, nullptr);
+    EXPECT_EQ(nameField->text(), "sound.wav");
+
+    // Loaded content, then the user picks a name in the panel.
+    const auto source = fixture.MakeSound("source.wav", 1, 2500);
+    window->SetAppendOnLoad(true);
+    window->SetTo(source);
+    window->SetFileEntry(std::nullopt);
+    const std::filesystem::path target = fixture.Dir() / "chosen.wav";
+    emit panel->fileSelected(QString::fromStdString(target.string()));
+    Drain();
+    EXPECT_EQ(window->windowTitle(), "Glimmet - chosen.wav");
+    EXPECT_EQ(window->FileEntry(), target);
+    const auto saved = ReadWav(target);
+    ASSERT_EQ(saved.size(), 2u);
+    EXPECT_EQ(saved[0].size(), 2500u);
+    EXPECT_FALSE(window->MenuItem(KeptMenuItem::Save)->isEnabled());
+}
+
+TEST(QuillexWindow, SaveAsShowsThePanelAgainAndSaveWithAFileWritesIt)
+{
+    AppFixture fixture;
+    const auto file = fixture.MakeSound("doc.wav", 1, 300);
+    QuillexWindow* window = OpenWindow(fixture, file);
+    window->PostMessage(kMsgSaveAs);
+    Drain();
+    ASSERT_NE(window->SavePanel(), nullptr);
+    QFileDialog* first = window->SavePanel();
+    first->hide();
+    window->PostMessage(kMsgSaveAs);
+    Drain();
+    EXPECT_EQ(window->SavePanel(), first);
+    EXPECT_TRUE(first->isVisible());
+    first->hide();
+
+    std::filesystem::remove(file);
+    window->PostMessage(kMsgSave);
+    Drain();
+    const auto saved = ReadWav(file);
+    ASSERT_EQ(saved.size(), 2u);
+    EXPECT_EQ(saved[0].size(), 300u);
+}
+
+TEST(QuillexWindow, SavePanelChoiceNeedsBothFieldsAndAnExistingFolder)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    Message noName(kMsgSavePanelChoice);
+    noName.AddPath("directory", fixture.Dir());
+    window->PostMessage(noName);
+    Message badFolder(kMsgSavePanelChoice);
+    badFolder.AddPath("directory", fixture.Dir() / "missing");
+    badFolder.AddString("name", "x.wav");
+    window->PostMessage(badFolder);
+    Drain();
+    EXPECT_FALSE(window->FileEntry().has_value());
+    EXPECT_EQ(window->windowTitle(), "Glimmet");
+    EXPECT_FALSE(std::filesystem::exists(fixture.Dir() / "missing"));
+}
+
+TEST(QuillexWindow, SaveFailurePrintsTheError)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    window->SetFileEntry(fixture.Dir() / "no-such-folder" / "x.wav");
+    testing::internal::CaptureStdout();
+    window->MessageReceived(Message(kMsgSave));
+    const std::string output = testing::internal::GetCapturedStdout();
+    EXPECT_NE(output.find("error writing file. ("), std::string::npos) << output;
+    EXPECT_EQ(output.back(), '\n');
+}
+
+TEST(QuillexWindow, ClosingAnEditedUntitledDocumentClosesWithoutAQuestion)
+{
+    AppFixture fixture;
+    fixture.App().ReadyToRun();
+    QuillexWindow* window = OpenWindow(fixture);
+    MakeUnsaved(window);
+    window->PostMessage(kMsgQuitRequested);
+    Drain();
+    EXPECT_FALSE(IsListed(fixture, window));
+    EXPECT_EQ(fixture.App().CountWindows(), 1);
+}
+
+TEST(QuillexWindow, TheCloseBoxAsksLikeClose)
+{
+    AppFixture fixture;
+    fixture.App().ReadyToRun();
+    QuillexWindow* window = OpenWindow(fixture);
+    EXPECT_FALSE(window->close());  // refused at once, handled by the application
+    Drain();
+    EXPECT_FALSE(IsListed(fixture, window));
+}
+
+class CloseLoadedDocument : public testing::TestWithParam<int> {};
+
+TEST_P(CloseLoadedDocument, AnswersDecideWhatHappens)
+{
+    AppFixture fixture;
+    fixture.App().ReadyToRun();
+    const auto file = fixture.MakeSound("loaded.wav", 1, 200);
+    QuillexWindow* window = OpenWindow(fixture, file);
+    window->ContainerView()->SelectAll();
+    window->PostMessage(kMsgMaximize);
+    Drain();
+    ASSERT_FALSE(window->History()->IsSaved());
+    const auto before = ReadWav(file);
+
+    int asked = 0;
+    QuillexWindow::SetSaveQuestion([&](QuillexWindow*) {
+        ++asked;
+        return GetParam();
+    });
+    window->PostMessage(kMsgQuitRequested);
+    Drain();
+    EXPECT_EQ(asked, 1);
+    const auto after = ReadWav(file);
+    switch (GetParam()) {
+    case QuillexWindow::kDontSave:
+        EXPECT_FALSE(IsListed(fixture, window));
+        EXPECT_EQ(after, before);
+        break;
+    case QuillexWindow::kSave:
+        EXPECT_FALSE(IsListed(fixture, window));
+        ASSERT_EQ(after.size(), 2u);  // written again, as the stereo mix
+        EXPECT_EQ(after[0].size(), 200u);
+        break;
+    case QuillexWindow::kDontQuit:
+        EXPECT_TRUE(IsListed(fixture, window));
+        EXPECT_TRUE(window->isVisible());
+        EXPECT_EQ(after, before);
+        break;
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Answers, CloseLoadedDocument,
+    testing::Values(int(QuillexWindow::kDontSave), int(QuillexWindow::kSave), int(QuillexWindow::kDontQuit)));
+
+TEST(QuillexWindow, TheAlertShowsItsThreeButtonsLeftToRight)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    QStringList labels;
+    QString text;
+    QString name;
+    QMessageBox::Icon icon = QMessageBox::NoIcon;
+    QTimer::singleShot(0, [&] {
+        auto* alert = qobject_cast<QMessageBox*>(QApplication::activeModalWidget());
+        ASSERT_NE(alert, nullptr);
+        text = alert->text();
+        name = alert->objectName();
+        icon = alert->icon();
+        QList<QAbstractButton*> buttons = alert->buttons();
+        std::sort(buttons.begin(), buttons.end(), [alert](QAbstractButton* a, QAbstractButton* b) {
+            return a->mapTo(alert, QPoint(0, 0)).x() < b->mapTo(alert, QPoint(0, 0)).x();
+        });
+        for (QAbstractButton* button : buttons)
+            labels << button->text();
+        buttons.at(1)->click();
+    });
+    EXPECT_EQ(QuillexWindow::AskSaveChanges(window), QuillexWindow::kSave);
+    EXPECT_EQ(text, "Save changes?");
+    EXPECT_EQ(name, "alert");
+    EXPECT_EQ(icon, QMessageBox::Warning);
+    EXPECT_EQ(labels, (QStringList{"Nope!", "Yes, please.", "Don't quit!"}));
+}
+
+TEST(QuillexWindow, TheAlertsEscapeKeepsTheWindow)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    QTimer::singleShot(0, [] {
+        QWidget* alert = QApplication::activeModalWidget();
+        ASSERT_NE(alert, nullptr);
+        QTest::keyClick(alert, Qt::Key_Escape);
+    });
+    EXPECT_EQ(QuillexWindow::AskSaveChanges(window), QuillexWindow::kDontQuit);
+}
+
+TEST(QuillexWindow, VisibleFramesAreTheContainersDisplayRange)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("visible.wav", 1, 5000));
+    window->ContainerView()->SetDisplayRange(1000, 3999);
+    int64_t first = -5;
+    int64_t last = -5;
+    window->GetVisibleFrames(&first, &last);
+    EXPECT_EQ(first, window->ContainerView()->FirstDisplayedFrame());
+    EXPECT_EQ(last, window->ContainerView()->LastDisplayedFrame());
+    EXPECT_EQ(first, 1000);
+}
+
+TEST(QuillexWindow, DisplayRangeMessageNeedsBothFrames)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("range.wav", 1, 5000));
+    const int64_t before = window->ContainerView()->FirstDisplayedFrame();
+    Message half(kMsgSetDisplayRange);
+    half.AddInt64("first frame", 2000);
+    window->PostMessage(half);
+    Drain();
+    EXPECT_EQ(window->ContainerView()->FirstDisplayedFrame(), before);
+    Message both(kMsgSetDisplayRange);
+    both.AddInt64("first frame", 2000);
+    both.AddInt64("last frame", 4999);
+    window->MessageReceived(both);
+    EXPECT_EQ(window->ContainerView()->FirstDisplayedFrame(), 2000);
+}
+
+TEST(QuillexWindow, SelectAllAndSelectNoneReachTheChannels)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("select.wav", 2, 100));
+    window->PostMessage(kMsgSelectAll);
+    Drain();
+    EXPECT_TRUE(window->Manager()->ChannelAt(0)->IsSelected());
+    EXPECT_TRUE(window->Manager()->ChannelAt(1)->IsSelected());
+    EXPECT_EQ(window->Manager()->RangeEnd(), 99);
+    window->PostMessage(kMsgSelectNone);
+    Drain();
+    EXPECT_FALSE(window->Manager()->ChannelAt(0)->IsSelected());
+}
+
+/// An edit that asks for parameters before it runs, counting its runs.
+class ConfiguredAction : public Action {
+public:
+    explicit ConfiguredAction(int* runs) : Action(nullptr), runs_(runs) {}
+    status_t Go() override
+    {
+        ++*runs_;
+        return B_OK;
+    }
+    const char* Name() override { return "Configured"; }
+    bool SupportsConfiguration() override { return true; }
+
+private:
+    int* runs_;
+};
+
+/// An edit that never becomes ready.
+class UnreadyAction : public Action {
+public:
+    UnreadyAction() : Action(nullptr) {}
+    status_t InitCheck() override { return B_NO_INIT; }
+};
+
+TEST(QuillexWindow, AConfiguredActionWaitsForItsDialog)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("pending.wav", 1, 100));
+    int runs = 0;
+    auto* action = new ConfiguredAction(&runs);
+    window->SetupAction(action);
+    Drain();
+    EXPECT_EQ(window->PendingAction(), action);
+    EXPECT_EQ(runs, 0);
+    window->PostMessage(kMsgActionGo);
+    Drain();
+    EXPECT_EQ(runs, 1);
+    EXPECT_EQ(window->PendingAction(), nullptr);
+    EXPECT_EQ(window->MenuItem(KeptMenuItem::Undo)->text(), "Undo Configured");
+}
+
+TEST(QuillexWindow, ActionCancelDropsThePendingAction)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("cancel.wav", 1, 100));
+    int runs = 0;
+    window->SetupAction(new ConfiguredAction(&runs));
+    window->PostMessage(kMsgActionCancel);
+    window->PostMessage(kMsgActionGo);
+    Drain();
+    EXPECT_EQ(window->PendingAction(), nullptr);
+    EXPECT_EQ(runs, 0);
+    EXPECT_EQ(window->History()->UndoName(), nullptr);
+}
+
+TEST(QuillexWindow, AnActionThatFailsItsCheckIsDroppedAtOnce)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    window->SetupAction(new UnreadyAction);
+    EXPECT_EQ(window->PendingAction(), nullptr);
+    window->PostMessage(kMsgActionGo);
+    Drain();
+    EXPECT_EQ(window->History()->UndoName(), nullptr);
+    window->SetupAction(nullptr);
+    EXPECT_EQ(window->PendingAction(), nullptr);
+}
+
+TEST(QuillexWindow, ANewActionReplacesOneStillWaitingForItsDialog)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("replace.wav", 1, 100));
+    int firstRuns = 0;
+    int secondRuns = 0;
+    window->SetupAction(new ConfiguredAction(&firstRuns));
+    auto* second = new ConfiguredAction(&secondRuns);
+    window->SetupAction(second);
+    EXPECT_EQ(window->PendingAction(), second);
+    window->PostMessage(kMsgActionGo);
+    Drain();
+    EXPECT_EQ(firstRuns, 0);
+    EXPECT_EQ(secondRuns, 1);
+}
+
+TEST(QuillexWindow, UndoAndRedoFailuresArePrinted)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    testing::internal::CaptureStdout();
+    window->MessageReceived(Message(kMsgUndo));
+    window->MessageReceived(Message(kMsgRedo));
+    const std::string output = testing::internal::GetCapturedStdout();
+    EXPECT_EQ(output, std::string("Error doing undo: ") + StatusText(B_ERROR) + "\nError doing redo: "
+            + StatusText(B_ERROR) + "\n");
+    // A failure leaves the menu as it was built.
+    EXPECT_TRUE(window->MenuItem(KeptMenuItem::Undo)->isEnabled());
+}
+
+}  // namespace
+}  // namespace glimmet::test
