@@ -34,7 +34,7 @@ Channel::SampleArray Channel::Allocate(int64_t count)
 {
     if (count < 0 || count > int64_t(UINT32_MAX))
         return nullptr;
-    return SampleArray(new (std::nothrow) int16_t[size_t(count)]);
+    return SampleAllocator::Shared().Allocate(size_t(count));
 }
 
 void Channel::CopyOut(int16_t* destination, int64_t index, int64_t count) const
@@ -127,7 +127,9 @@ bool Channel::SetTo(int16_t* samples, int64_t count)
     if (samples == nullptr || count <= 0)
         return false;
     std::lock_guard guard(lock_);
-    samples_.reset(samples);
+    // A fresh pointer with a fresh deleter: reset() would keep the deleter of
+    // the array it replaces.
+    samples_ = SampleArray(samples, SampleAllocator::Deleter());
     count_ = count;
     return true;
 }

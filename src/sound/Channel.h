@@ -4,6 +4,7 @@
 #include <memory>
 #include <mutex>
 
+#include "sound/SampleAllocator.h"
 #include "support/Locker.h"
 #include "support/Status.h"
 
@@ -79,10 +80,12 @@ public:
     void SetFrameRate(float rate);
 
 private:
-    using SampleArray = std::unique_ptr<int16_t[]>;
+    /// Frees through the deleter that knows where the memory came from: the
+    /// shared SampleAllocator, or delete[] for adopted arrays.
+    using SampleArray = SampleAllocator::Array;
 
-    /// An uninitialised array of count samples, or null when it cannot be had
-    /// (arrays are limited to 2^32 - 1 samples).
+    /// An uninitialised array of count samples from the shared allocator, or
+    /// null when it cannot be had (arrays are limited to 2^32 - 1 samples).
     static SampleArray Allocate(int64_t count);
     /// Copies count samples of the current array from index on; positions
     /// outside the array read as 0.
