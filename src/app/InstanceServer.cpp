@@ -1,6 +1,5 @@
 #include "app/InstanceServer.h"
 
-#include <QDataStream>
 #include <QLocalServer>
 #include <QLocalSocket>
 #include <QVariant>
@@ -15,8 +14,26 @@ namespace glimmet {
 
 namespace {
 
-// Bumped whenever what travels over the socket changes.
-constexpr qint32 kProtocolVersion = 1;
+// What travels over the socket: this header, then each path in UTF-8
+// followed by a zero byte. Changed whenever the format changes.
+const QByteArray kHeader = QByteArrayLiteral("glimmet-open-1\n");
+// More than any command line can carry; a longer message is not ours.
+constexpr qint64 kMaxMessageBytes = 16 * 1024 * 1024;
+
+/// The paths of a message, or false when it is not a well-formed one.
+bool ParsePaths(const QByteArray& data, QStringList* paths)
+{
+    if (!data.startsWith(kHeader))
+        return false;
+    const QByteArray body = data.mid(kHeader.size());
+    if (!body.isEmpty() && !body.endsWith('\0'))
+        return false;
+    for (const QByteArray& path : body.split('\0')) {
+        if (!path.isEmpty())
+            *paths << QString::fromUtf8(path);
+    }
+    return true;
+}
 
 }  // namespace
 
@@ -56,9 +73,9 @@ bool InstanceServer::ForwardToRunningInstance(const QString& name, const QString
     socket.connectToServer(name);
     if (!socket.waitForConnected(timeoutMs))
         return false;
-    QByteArray payload;
-    QDataStream stream(&payload, QIODevice::WriteOnly);
-    stream << kProtocolVersion << paths;
+    QByteArray payload = kHeader;
+    for (const QString& path : paths)
+        payload += path.toUtf8() + '\0';
     socket.write(payload);
     if (!socket.waitForBytesWritten(timeoutMs))
         return false;
@@ -71,6 +88,7 @@ bool InstanceServer::ForwardToRunningInstance(const QString& name, const QString
 void InstanceServer::Accept()
 {
     while (QLocalSocket* socket = server_->nextPendingConnection()) {
+        socket->setReadBufferSize(kMaxMessageBytes);
         // The sender disconnects once everything is written.
         connect(socket, &QLocalSocket::disconnected, this, [this, socket] { Deliver(socket); });
         if (socket->state() == QLocalSocket::UnconnectedState)
@@ -83,12 +101,10 @@ void InstanceServer::Deliver(QLocalSocket* socket)
     if (socket->property("delivered").toBool())
         return;
     socket->setProperty("delivered", true);
-    QDataStream stream(socket->readAll());
-    qint32 version = 0;
-    QStringList paths;
-    stream >> version >> paths;
+    const QByteArray data = socket->read(kMaxMessageBytes);
     socket->deleteLater();
-    if (stream.status() != QDataStream::Ok || version != kProtocolVersion || target_ == nullptr)
+    QStringList paths;
+    if (!ParsePaths(data, &paths) || target_ == nullptr)
         return;
     if (paths.isEmpty()) {
         target_->PostMessage(kMsgNewWindow);

@@ -25,13 +25,19 @@
 #include "app/Quillex.h"
 #include "app/TextControl.h"
 #include "edit/Action.h"
+#include "edit/AddChannelAction.h"
 #include "edit/CopyBuffer.h"
 #include "edit/FadeInAction.h"
 #include "edit/FadeOutAction.h"
 #include "edit/HistoryManager.h"
 #include "edit/MaximizeAction.h"
+#include "edit/MoveSampleAction.h"
+#include "edit/PasteAction.h"
+#include "edit/RemoveAction.h"
+#include "edit/RemoveChannelAction.h"
 #include "edit/RevertAction.h"
 #include "edit/RevertPhasesAction.h"
+#include "edit/TruncateAction.h"
 #include "files/DocumentLoader.h"
 #include "files/DocumentSaver.h"
 #include "playback/PlaybackController.h"
@@ -322,6 +328,9 @@ void QuillexWindow::MessageReceived(const Message& message)
     case kMsgCopy:
         Copy();
         break;
+    case kMsgSampleMoved:
+        HandleSampleMoved(message);
+        break;
     case kMsgToggleBubbleHelp:
         HandleBubbleHelpMark(message);
         break;
@@ -484,6 +493,26 @@ void QuillexWindow::HandleActionGo()
     UpdateUndoMenu();
 }
 
+void QuillexWindow::HandleSampleMoved(const Message& message)
+{
+    Channel* channel = nullptr;
+    ChannelView* view = nullptr;
+    int64_t offset = 0;
+    if (message.FindPointer("channel", &channel) != B_OK || message.FindPointer("sample view", &view) != B_OK
+        || message.FindInt64("offset", &offset) != B_OK)
+        return;
+    auto action = std::make_unique<MoveSampleAction>(this);
+    action->SetTo(channel, view, offset);
+    // A move is bound to its channel rather than to the range, so it skips
+    // the common setup and runs at once.
+    if (action->InitCheck() != B_OK || action->SupportsConfiguration())
+        return;
+    if (pendingAction_)
+        supersededActions_.push_back(std::move(pendingAction_));
+    pendingAction_ = std::move(action);
+    PostMessage(kMsgActionGo);
+}
+
 void QuillexWindow::HandleActionCancel()
 {
     pendingAction_.reset();
@@ -575,6 +604,25 @@ void QuillexWindow::Copy()
 bool QuillexWindow::HandleEditCommand(uint32_t what)
 {
     switch (what) {
+    case kMsgCut:
+        Copy();
+        SetupAction(new RemoveAction(this));
+        return true;
+    case kMsgRemove:
+        SetupAction(new RemoveAction(this));
+        return true;
+    case kMsgPaste:
+        SetupAction(new PasteAction(this));
+        return true;
+    case kMsgTruncate:
+        SetupAction(new TruncateAction(this));
+        return true;
+    case kMsgAddChannel:
+        SetupAction(new AddChannelAction(this));
+        return true;
+    case kMsgRemoveChannel:
+        SetupAction(new RemoveChannelAction(this));
+        return true;
     case kMsgFadeIn:
         SetupAction(new FadeInAction(this));
         return true;

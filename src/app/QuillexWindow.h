@@ -158,6 +158,7 @@ private:
     void HandleSetRangeEnd();
     void HandleActionGo();
     void HandleActionCancel();
+    void HandleSampleMoved(const Message& message);
     void HandleUndo();
     void HandleRedo();
     void HandleClearHistory();
