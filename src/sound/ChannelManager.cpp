@@ -45,7 +45,7 @@ constexpr int32_t kExactIntegerSumLimit = 511;
 inline int16_t ToSample(float value)
 {
     const float scaled = value * kOutputScale;
-    const bool inRange = scaled >= -32768.5f && scaled < 32767.5f;
+    const bool inRange = (scaled >= -32768.5f) & (scaled < 32767.5f);
     constexpr float kRoundingMagic = 12582912.0f;
     const float rounded = (scaled + kRoundingMagic) - kRoundingMagic;
     return int16_t(int32_t(inRange ? rounded : -32768.0f));
