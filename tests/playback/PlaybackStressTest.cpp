@@ -19,6 +19,7 @@
 #include "playback/AudioProducer.h"
 #include "sound/Channel.h"
 #include "support/MessageCodes.h"
+#include "support/SystemTime.h"
 
 namespace glimmet {
 namespace {
@@ -163,7 +164,17 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
         }
         window.ProcessPending();
     }
-    // Playback ran while the edits did.
+    // On a busy machine the steps above can all fit into a few buffers: keep
+    // undoing and redoing while playing until playback has clearly moved on,
+    // so that the two really ran side by side.
+    if (!controller.IsPlaying())
+        window.PostMessage(kMsgPlay);
+    for (int extra = 0; extra < 20000 && window.playmarkUpdates.size() <= updatesBefore + 10; extra++) {
+        if (history.Undo() == B_OK)
+            history.Redo();
+        window.ProcessPending();
+        snooze(500);
+    }
     EXPECT_GT(window.playmarkUpdates.size(), updatesBefore + 10);
     while (history.Undo() == B_OK) {
     }
