@@ -2,6 +2,8 @@
 #include <QDir>
 #include <QStringList>
 
+#include <SDL.h>
+
 #include <filesystem>
 
 #include "app/InstanceServer.h"
@@ -29,6 +31,9 @@ QStringList ResolvedFiles(const QStringList& arguments)
 
 int main(int argc, char** argv)
 {
+    // The sound library would otherwise take over SIGINT and SIGTERM, and
+    // the editor could no longer be ended from outside.
+    SDL_SetHint(SDL_HINT_NO_SIGNAL_HANDLERS, "1");
     QApplication toolkit(argc, argv);
     QApplication::setApplicationName(QStringLiteral("Glimmet"));
     QApplication::setDesktopFileName(QStringLiteral("glimmet"));
