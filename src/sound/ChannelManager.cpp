@@ -329,7 +329,7 @@ void ChannelManager::PlayRange(int64_t total, int64_t* start, int64_t* end)
         *end = *start;
 }
 
-int16_t* ChannelManager::ScratchFor(int32_t channelCount, int64_t frames)
+void ChannelManager::ReserveScratch(int32_t channelCount, int64_t frames)
 {
     // Grows only when the buffer or the channel count grows, so a steady
     // playback allocates nothing per buffer.
@@ -342,7 +342,6 @@ int16_t* ChannelManager::ScratchFor(int32_t channelCount, int64_t frames)
         integerLeft_.resize(size_t(frames));
         integerRight_.resize(size_t(frames));
     }
-    return scratch_.data();
 }
 
 void ChannelManager::FillScratch(int32_t channelCount, int64_t frames, int64_t from, int64_t offset, int64_t count)
@@ -453,7 +452,7 @@ bool ChannelManager::FillBuffer(float* out, int64_t frames)
         currentFrame_ = current;
         return false;
     }
-    ScratchFor(channelCount, frames);
+    ReserveScratch(channelCount, frames);
 
     if (current + frames <= end) {
         FillScratch(channelCount, frames, current, 0, frames);
@@ -489,7 +488,7 @@ bool ChannelManager::FillBuffer(int16_t* out, int64_t* frames)
     const int64_t count = *frames;
 
     const int32_t channelCount = int32_t(channels_.size());
-    ScratchFor(channelCount, count);
+    ReserveScratch(channelCount, count);
     FillScratch(channelCount, count, current, 0, count);
 
     MixScratch(channelCount, count, out);

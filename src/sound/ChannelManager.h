@@ -90,7 +90,7 @@ public:
 private:
     int64_t FrameCountLocked();
     void PlayRange(int64_t total, int64_t* start, int64_t* end);
-    int16_t* ScratchFor(int32_t channelCount, int64_t frames);
+    void ReserveScratch(int32_t channelCount, int64_t frames);
     void FillScratch(int32_t channelCount, int64_t frames, int64_t from, int64_t offset, int64_t count);
     void ZeroScratch(int32_t channelCount, int64_t frames, int64_t offset, int64_t count);
     /// Sums the scratch arrays of the heard channels into the integer sums of
