@@ -9,6 +9,7 @@
 extern "C" {
 #include <libavformat/avformat.h>
 #include <libavutil/dict.h>
+#include <libavutil/opt.h>
 }
 
 #include "files/FFmpegStatus.h"
@@ -125,6 +126,14 @@ const char* MediaDemuxer::FormatName() const
 int64_t MediaDemuxer::FileSize() const
 {
     return io_ == nullptr ? 0 : std::max<int64_t>(0, avio_size(io_));
+}
+
+bool MediaDemuxer::SetMaxPacketSize(int bytes)
+{
+    const std::string name = FormatName();
+    if (name != "wav" && name != "w64")
+        return false;
+    return av_opt_set_int(context_->priv_data, "max_size", bytes, 0) >= 0;
 }
 
 void MediaDemuxer::KeepOnlyStream(int32_t index)

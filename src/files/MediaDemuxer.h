@@ -39,6 +39,12 @@ public:
     /// The file's size in bytes; 0 when unknown.
     int64_t FileSize() const;
 
+    /// Asks for packets of at most bytes bytes (a whole number of the
+    /// stream's blocks) from a container that lets the reader choose (WAV and
+    /// Wave64 give 4096 bytes by default). False, changing nothing, for any
+    /// other container.
+    bool SetMaxPacketSize(int bytes);
+
     /// Makes the demuxer drop the packets of every stream but this one.
     void KeepOnlyStream(int32_t index);
 

@@ -21,6 +21,10 @@ namespace {
 // The most samples (all channels) one decoded block may hold: far above any
 // real codec's block, far below what would hurt.
 constexpr int64_t kMaxSamplesPerBlock = 1 << 22;
+// Packets of plain PCM where the container lets us choose: large enough
+// that the per-packet work vanishes, small enough to stay in the cache while
+// its frames are spread over the channels.
+constexpr int kLargePacketBytes = 256 * 1024;
 // Errors a decoder may report after the end of its input before we stop
 // asking it for more.
 constexpr int kMaxErrorsAfterEnd = 64;
@@ -105,6 +109,12 @@ status_t TrackDecoder::OpenDecoder(int32_t stream)
     if (error < 0)
         return StatusFromAVError(error);
     passThrough_ = IsPlainPCM() && codec_->codec_id == kNativeShortCodec;
+    // Each packet is decoded on its own and loses a trailing partial frame,
+    // so packets may only grow where every one but the last of a data chunk
+    // stays a whole number of frames: where a block is whole frames.
+    const int64_t frameBytes = IsPlainPCM() ? BytesPerFrame() : 0;
+    if (frameBytes > 0 && parameters->block_align > 0 && parameters->block_align % frameBytes == 0)
+        demuxer_.SetMaxPacketSize(kLargePacketBytes);
     return B_OK;
 }
 

@@ -15,11 +15,13 @@ struct WavBytes {
     /// When set, written instead of the true sizes.
     int64_t riffSizeOverride = -1;
     int64_t dataSizeOverride = -1;
+    int32_t blockAlignOverride = -1;
 
     std::string Make(const std::vector<int16_t>& samples) const
     {
         const uint32_t dataSize = uint32_t(samples.size() * 2);
-        const uint16_t blockAlign = uint16_t(channels * bitsPerSample / 8);
+        const uint16_t blockAlign =
+            uint16_t(blockAlignOverride >= 0 ? blockAlignOverride : channels * bitsPerSample / 8);
         std::string bytes;
         auto put32 = [&bytes](uint32_t value) {
             for (int i = 0; i < 4; ++i)
