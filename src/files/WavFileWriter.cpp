@@ -27,6 +27,7 @@ constexpr int kBytesPerFrame = WavFileWriter::kChannelCount * int(sizeof(int16_t
 // Names tried for the temporary file before giving up.
 constexpr int kTemporaryNameAttempts = 100;
 
+
 std::string RandomSuffix()
 {
     static thread_local std::mt19937_64 generator{std::random_device{}()};
@@ -53,7 +54,8 @@ void SyncDirectory(const std::filesystem::path& directory)
 
 }  // namespace
 
-WavFileWriter::WavFileWriter(const std::filesystem::path& destination) : destination_(destination)
+WavFileWriter::WavFileWriter(const std::filesystem::path& destination, Writeback writeback)
+    : destination_(destination), writeback_(writeback)
 {
     openStatus_ = CreateTemporaryFile();
     if (openStatus_ == B_OK)
@@ -146,6 +148,10 @@ status_t WavFileWriter::CommitHeader()
         avio_flush(io_);
         status = IOStatus();
     }
+    if (status == B_OK) {
+        dataStart_ = avio_tell(io_);
+        writebackStarted_ = writebackWaited_ = dataStart_;
+    }
     headerWritten_ = status == B_OK;
     NoteFailure(status);
     return status;
@@ -157,24 +163,70 @@ status_t WavFileWriter::WriteFrames(const int16_t* frames, int64_t count)
         return B_NO_INIT;
     if (frames == nullptr || count <= 0 || count > INT32_MAX / kBytesPerFrame)
         return B_BAD_VALUE;
-    AVPacket* packet = av_packet_alloc();
-    if (packet == nullptr)
-        return B_NO_MEMORY;
-    // The muxer writes the bytes out at once; it never keeps the pointer.
-    packet->data = const_cast<uint8_t*>(reinterpret_cast<const uint8_t*>(frames));
-    packet->size = int(count) * kBytesPerFrame;
-    packet->stream_index = 0;
-    packet->pts = packet->dts = framesWritten_;
-    packet->duration = count;
-    const int error = av_write_frame(muxer_, packet);
-    av_packet_free(&packet);
-    status_t status = StatusFromAVError(error);
-    if (status == B_OK)
-        status = IOStatus();
-    if (status == B_OK)
-        framesWritten_ += count;
+    if (firstFailure_ != B_OK)
+        return firstFailure_;
+    // The samples go to the file as they are, at the end of the data, past
+    // the muxer: for 16-bit PCM it would only copy them through its buffer.
+    // The muxer learns where the data ends before it writes the trailer.
+    const size_t bytes = size_t(count) * kBytesPerFrame;
+    status_t status = WriteAt(reinterpret_cast<const char*>(frames), bytes, dataStart_ + dataBytes_);
+    if (status == B_OK) {
+        dataBytes_ += int64_t(bytes);
+        status = StartWriteback();
+    }
     NoteFailure(status);
     return status;
+}
+
+status_t WavFileWriter::WriteAt(const char* bytes, size_t size, int64_t offset)
+{
+    size_t done = 0;
+    while (done < size) {
+        const ssize_t written = pwrite(fd_, bytes + done, size - done, off_t(offset + int64_t(done)));
+        if (written < 0 && errno == EINTR)
+            continue;
+        if (written < 0)
+            return StatusFromErrno(errno);
+        if (written == 0)
+            return B_IO_ERROR;
+        done += size_t(written);
+    }
+    return B_OK;
+}
+
+status_t WavFileWriter::StartWriteback()
+{
+    // The disk starts on each stretch of data as soon as it is complete, so
+    // that it works while the rest is mixed and the final fsync has little
+    // left to do. Stretches long written are waited for, which keeps the
+    // dirty pages (and the final wait) bounded.
+    const int64_t end = dataStart_ + dataBytes_;
+    if (!writebackWorks_ || end - writebackStarted_ < writeback_.startEvery)
+        return B_OK;
+    if (sync_file_range(fd_, writebackStarted_, end - writebackStarted_, SYNC_FILE_RANGE_WRITE) != 0)
+        return WritebackFailure(errno);
+    writebackStarted_ = end;
+    const int64_t waitUpTo = end - writeback_.waitBehind;
+    if (waitUpTo > writebackWaited_) {
+        if (sync_file_range(fd_, writebackWaited_, waitUpTo - writebackWaited_,
+                            SYNC_FILE_RANGE_WAIT_BEFORE | SYNC_FILE_RANGE_WRITE | SYNC_FILE_RANGE_WAIT_AFTER)
+            != 0)
+            return WritebackFailure(errno);
+        writebackWaited_ = waitUpTo;
+    }
+    return B_OK;
+}
+
+status_t WavFileWriter::WritebackFailure(int error)
+{
+    // A file system or kernel that does not offer this only loses the head
+    // start; fsync still does all the work. Any other error is a failed
+    // write: once reported here, fsync might not report it again.
+    if (error == ENOSYS || error == EINVAL || error == ESPIPE || error == EOPNOTSUPP) {
+        writebackWorks_ = false;
+        return B_OK;
+    }
+    return StatusFromErrno(error);
 }
 
 status_t WavFileWriter::Finish()
@@ -190,6 +242,11 @@ status_t WavFileWriter::Finish()
 
 status_t WavFileWriter::Complete()
 {
+    // The trailer fills the sizes in from where the muxer stands, so it is
+    // put at the end of the data written past it.
+    const int64_t end = avio_seek(io_, dataStart_ + dataBytes_, SEEK_SET);
+    if (end < 0)
+        return StatusFromAVError(int(end));
     status_t status = StatusFromAVError(av_write_trailer(muxer_));
     avio_flush(io_);
     if (status == B_OK)

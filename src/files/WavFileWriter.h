@@ -15,7 +15,10 @@ namespace glimmet {
 /// the canonical 44-byte header, without ever damaging the file it replaces.
 ///
 /// Everything goes to a hidden temporary file beside the destination; Finish
-/// flushes it to disk and renames it over the destination. Until then the
+/// flushes it to disk and renames it over the destination. FFmpeg's muxer
+/// writes the header and fills in the sizes at the end; the samples go
+/// straight to the file, and the disk is set to work on them while more are
+/// written. Until then the
 /// destination is untouched, and a writer that fails or is destroyed
 /// unfinished removes its temporary file.
 class WavFileWriter : public FrameWriter {
@@ -23,8 +26,16 @@ public:
     static constexpr int kFrameRate = 44100;
     static constexpr int kChannelCount = 2;
 
+    /// How often the disk is asked to start on the data written so far, and
+    /// how far behind the writing that is waited for (bytes).
+    struct Writeback {
+        int64_t startEvery;
+        int64_t waitBehind;
+    };
+    static constexpr Writeback kDefaultWriteback{int64_t(8) << 20, int64_t(64) << 20};
+
     /// Creates the temporary file and the one audio track.
-    explicit WavFileWriter(const std::filesystem::path& destination);
+    explicit WavFileWriter(const std::filesystem::path& destination, Writeback writeback = kDefaultWriteback);
     ~WavFileWriter() override;
     WavFileWriter(const WavFileWriter&) = delete;
     WavFileWriter& operator=(const WavFileWriter&) = delete;
@@ -49,11 +60,17 @@ private:
     void Discard();
     void NoteFailure(status_t status);
     status_t IOStatus() const;
+    status_t WriteAt(const char* bytes, size_t size, int64_t offset);
+    /// Has the disk start writing the data written since the last start,
+    /// once there is enough of it.
+    status_t StartWriteback();
+    status_t WritebackFailure(int error);
 
     static int WritePacket(void* opaque, uint8_t* buffer, int size);
     static int64_t Seek(void* opaque, int64_t offset, int whence);
 
     std::filesystem::path destination_;
+    Writeback writeback_;
     std::filesystem::path temporary_;
     int fd_ = -1;
     AVIOContext* io_ = nullptr;
@@ -61,7 +78,13 @@ private:
     status_t openStatus_ = B_NO_INIT;
     status_t firstFailure_ = B_OK;
     bool headerWritten_ = false;
-    int64_t framesWritten_ = 0;
+    // Where the samples begin (right after the header), how many bytes of
+    // them are written, and how far writeback was started and waited for.
+    int64_t dataStart_ = 0;
+    int64_t dataBytes_ = 0;
+    int64_t writebackStarted_ = 0;
+    int64_t writebackWaited_ = 0;
+    bool writebackWorks_ = true;
 };
 
 }  // namespace glimmet
