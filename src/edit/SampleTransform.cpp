@@ -6,27 +6,51 @@
 #include <limits>
 #include <utility>
 
+#include "support/VectorClones.h"
+
 namespace glimmet {
 
 namespace {
 
 // The loops below work in blocks of a fixed number of samples so that the
-// compiler turns each block into vector code; the last, partial block runs
-// the same per-sample function one sample at a time.
+// compiler turns each block into vector code (packed divisions included);
+// the last, partial block runs the same per-sample function one sample at a
+// time. A block is computed into an array of doubles first and truncated and
+// stored in a second loop: with both steps in one loop the compiler leaves
+// the division scalar.
 constexpr int64_t kBlock = 16;
 
 template <typename SampleFunction>
-void ForEachSample(int16_t* samples, int64_t count, SampleFunction function)
+inline void ForEachSample(int16_t* samples, int64_t count, SampleFunction function)
 {
+    double values[kBlock];
     int64_t i = 0;
     for (; i + kBlock <= count; i += kBlock) {
         const double base = double(i);
         int16_t* block = samples + i;
         for (int32_t j = 0; j < int32_t(kBlock); j++)
-            block[j] = function(base + double(j), block[j]);
+            values[j] = function(base + double(j), block[j]);
+        for (int32_t j = 0; j < int32_t(kBlock); j++)
+            block[j] = SampleTransform::StoreTruncated(values[j]);
     }
     for (; i < count; i++)
-        samples[i] = function(double(i), samples[i]);
+        samples[i] = SampleTransform::StoreTruncated(function(double(i), samples[i]));
+}
+
+GLIMMET_VECTOR_CLONES void FadeInSamples(int16_t* samples, int64_t count, double last)
+{
+    ForEachSample(samples, count, [last](double position, int16_t sample) { return position * double(sample) / last; });
+}
+
+GLIMMET_VECTOR_CLONES void FadeOutSamples(int16_t* samples, int64_t count, double last)
+{
+    ForEachSample(
+        samples, count, [last](double position, int16_t sample) { return (1.0 - position / last) * double(sample); });
+}
+
+GLIMMET_VECTOR_CLONES void ScaleSamples(int16_t* samples, int64_t count, double factor)
+{
+    ForEachSample(samples, count, [factor](double, int16_t sample) { return factor * double(sample); });
 }
 
 // A one-sample range divides 0 by 0: not-a-number, which stores 0. Said
@@ -45,20 +69,14 @@ void SampleTransform::FadeIn(int16_t* samples, int64_t count)
 {
     if (ClearSingleSample(samples, count))
         return;
-    const double last = double(count - 1);
-    ForEachSample(samples, count, [last](double position, int16_t sample) {
-        return StoreTruncated(position * double(sample) / last);
-    });
+    FadeInSamples(samples, count, double(count - 1));
 }
 
 void SampleTransform::FadeOut(int16_t* samples, int64_t count)
 {
     if (ClearSingleSample(samples, count))
         return;
-    const double last = double(count - 1);
-    ForEachSample(samples, count, [last](double position, int16_t sample) {
-        return StoreTruncated((1.0 - position / last) * double(sample));
-    });
+    FadeOutSamples(samples, count, double(count - 1));
 }
 
 void SampleTransform::Revert(int16_t* samples, int64_t count)
@@ -100,8 +118,7 @@ float SampleTransform::MaximizeFactor(int16_t peak)
 
 void SampleTransform::Scale(int16_t* samples, int64_t count, float factor)
 {
-    const double wide = double(factor);
-    ForEachSample(samples, count, [wide](double, int16_t sample) { return StoreTruncated(wide * double(sample)); });
+    ScaleSamples(samples, count, double(factor));
 }
 
 }  // namespace glimmet

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdint>
 #include <limits>
 #include <random>
 #include <vector>
@@ -136,6 +137,43 @@ TEST(SampleTransformTest, FadeInOfEveryValueAtEveryPositionOfAShortRange)
             std::vector<int16_t> in = data;
             SampleTransform::FadeIn(in.data(), n);
             ASSERT_EQ(in, TransformReference::FadeIn(data)) << n << " " << value;
+        }
+    }
+}
+
+// The low 16 bits of the int32 truncation, 0x80000000 (low bits 0) for
+// anything no int32 holds, worked out with 64-bit integers.
+int16_t LowBitsOfTruncation(double value)
+{
+    if (!(value > -2147483649.0 && value < 2147483648.0))
+        return 0;
+    const int64_t truncated = int64_t(std::trunc(value));
+    return int16_t(uint16_t(uint64_t(truncated) & 0xffffu));
+}
+
+TEST(SampleTransformTest, ScaledBlocksStoreValuesNoInt32HoldsAsSingleSamplesDo)
+{
+    // Long enough for whole vector blocks and a remainder; every sample
+    // value class, so that lanes overflow in both directions next to lanes
+    // that do not.
+    std::vector<int16_t> data;
+    for (int i = 0; i < 45; i++) {
+        for (int16_t value : {int16_t(0), int16_t(1), int16_t(-1), int16_t(3), int16_t(-32768), int16_t(32767),
+                 int16_t(100), int16_t(-2500)})
+            data.push_back(int16_t(value + (value != 0 && value > -32768 && value < 32767 ? i : 0)));
+    }
+    const float factors[] = {std::numeric_limits<float>::infinity(), -std::numeric_limits<float>::infinity(),
+        std::numeric_limits<float>::quiet_NaN(), 1e6f, 65537.5f, 65536.0f, 2.5f, -3.75f, 0.0f, -0.0f,
+        std::numeric_limits<float>::max(), std::numeric_limits<float>::denorm_min()};
+    for (float factor : factors) {
+        std::vector<int16_t> expected;
+        for (int16_t sample : data)
+            expected.push_back(LowBitsOfTruncation(double(factor) * double(sample)));
+        for (size_t length : {data.size(), size_t(16), size_t(17), size_t(33)}) {
+            std::vector<int16_t> samples(data.begin(), data.begin() + ptrdiff_t(length));
+            SampleTransform::Scale(samples.data(), int64_t(length), factor);
+            EXPECT_EQ(samples, std::vector<int16_t>(expected.begin(), expected.begin() + ptrdiff_t(length)))
+                << "factor " << factor << " length " << length;
         }
     }
 }
