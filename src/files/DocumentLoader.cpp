@@ -5,6 +5,7 @@
 #include <system_error>
 
 #include "edit/ChannelContainer.h"
+#include "files/FrameSpreader.h"
 #include "files/LoadTarget.h"
 #include "files/MediaFile.h"
 #include "files/MediaFormat.h"
@@ -33,32 +34,29 @@ media_format ShortAudioRequest()
     return request;
 }
 
-std::unique_ptr<int16_t[]> AllocateSamples(int64_t count)
+using SampleArray = std::unique_ptr<int16_t[]>;
+
+SampleArray AllocateSamples(int64_t count)
 {
     if (count <= 0 || count > int64_t(UINT32_MAX))
         return nullptr;
-    return std::unique_ptr<int16_t[]>(new (std::nothrow) int16_t[size_t(count)]);
+    return SampleArray(new (std::nothrow) int16_t[size_t(count)]);
 }
 
 /// Copies frames interleaved frames of channels samples into the arrays
 /// (null entries are skipped) from index at on.
-void SpreadFrames(const int16_t* interleaved, int64_t frames, std::vector<std::unique_ptr<int16_t[]>>& arrays,
-                  int64_t at)
+void SpreadFrames(const int16_t* interleaved, int64_t frames, std::vector<SampleArray>& arrays, int64_t at)
 {
     const size_t channels = arrays.size();
     if (channels == 1) {
         if (arrays[0] != nullptr)
-            std::copy(interleaved, interleaved + frames, arrays[0].get() + at);
+            FrameSpreader::SpreadMono(interleaved, frames, arrays[0].get() + at);
         return;
     }
-    if (channels == 2 && arrays[0] != nullptr && arrays[1] != nullptr) {
-        // The common case gets a loop the compiler can vectorise.
-        int16_t* left = arrays[0].get() + at;
-        int16_t* right = arrays[1].get() + at;
-        for (int64_t frame = 0; frame < frames; ++frame) {
-            left[frame] = interleaved[2 * frame];
-            right[frame] = interleaved[2 * frame + 1];
-        }
+    if (channels == 2) {
+        int16_t* left = arrays[0] == nullptr ? nullptr : arrays[0].get() + at;
+        int16_t* right = arrays[1] == nullptr ? nullptr : arrays[1].get() + at;
+        FrameSpreader::SpreadStereo(interleaved, frames, left, right);
         return;
     }
     for (size_t k = 0; k < channels; ++k) {
@@ -72,7 +70,7 @@ void SpreadFrames(const int16_t* interleaved, int64_t frames, std::vector<std::u
 
 /// Reads the whole track once and spreads its interleaved frames over the
 /// arrays, at most capacity frames; returns how many frames it stored.
-int64_t Deinterleave(MediaTrack* track, int64_t capacity, std::vector<std::unique_ptr<int16_t[]>>& arrays)
+int64_t Deinterleave(MediaTrack* track, int64_t capacity, std::vector<SampleArray>& arrays)
 {
     int64_t seekTo = 0;
     track->SeekToFrame(&seekTo, 0);
@@ -84,6 +82,7 @@ int64_t Deinterleave(MediaTrack* track, int64_t capacity, std::vector<std::uniqu
         SpreadFrames(block, frames, arrays, stored);
         stored += frames;
     }
+    FrameSpreader::Finish();
     return stored;
 }
 
@@ -159,7 +158,7 @@ std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* t
     if (capacity <= 0)
         return channels;
 
-    std::vector<std::unique_ptr<int16_t[]>> arrays(channelCount);
+    std::vector<SampleArray> arrays(channelCount);
     for (size_t k = 0; k < channelCount; ++k)
         arrays[k] = AllocateSamples(capacity);
     const int64_t stored = Deinterleave(track, capacity, arrays);
