@@ -5,10 +5,13 @@
 #include <SDL.h>
 
 #include <filesystem>
+#include <string_view>
 
+#include "app/BatchRunner.h"
 #include "app/InstanceServer.h"
 #include "app/Quillex.h"
 
+using glimmet::BatchRunner;
 using glimmet::InstanceServer;
 using glimmet::Quillex;
 
@@ -34,6 +37,10 @@ int main(int argc, char** argv)
     // The sound library would otherwise take over SIGINT and SIGTERM, and
     // the editor could no longer be ended from outside.
     SDL_SetHint(SDL_HINT_NO_SIGNAL_HANDLERS, "1");
+    // A script run is headless and stands alone: no display, no hand-over
+    // to a running editor.
+    if (argc >= 2 && std::string_view(argv[1]) == "--batch")
+        return BatchRunner::Main(argc, argv);
     QApplication toolkit(argc, argv);
     QApplication::setApplicationName(QStringLiteral("Glimmet"));
     QApplication::setDesktopFileName(QStringLiteral("glimmet"));

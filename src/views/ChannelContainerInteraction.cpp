@@ -94,6 +94,15 @@ void ChannelContainerView::ShowContextMenu(SampleView* view, QPointF point)
     menu->popup(view->mapToGlobal(point.toPoint()));
 }
 
+QMenu* ChannelContainerView::ContextMenuForChannel(int32_t index)
+{
+    Channel* channel = manager_ != nullptr ? manager_->ChannelAt(index) : nullptr;
+    if (channel == nullptr)
+        return nullptr;
+    contextChannel_ = index;
+    return ContextMenuFor(channel);
+}
+
 QMenu* ChannelContainerView::OpenContextMenu() const
 {
     return openMenu_.data();
@@ -280,6 +289,23 @@ void ChannelContainerView::Moving(float x)
     // The document's length may have changed.
     CheckZoomSlider(false);
     UpdateZoomSlider();
+}
+
+void ChannelContainerView::MoveChannel(int32_t index, int64_t frames)
+{
+    Channel* channel = manager_ != nullptr ? manager_->ChannelAt(index) : nullptr;
+    if (channel == nullptr)
+        return;
+    movingChannel_ = index;
+    moveStartFrame_ = channel->FirstFrame();
+    grabOffset_ = 0;
+    {
+        std::lock_guard documentLock(manager_->DocumentLock());
+        channel->SetStartFrameOffset(moveStartFrame_ + frames);
+    }
+    CheckZoomSlider(false);
+    UpdateZoomSlider();
+    StopMoving();
 }
 
 void ChannelContainerView::StopMoving()

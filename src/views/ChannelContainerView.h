@@ -119,9 +119,15 @@ public:
     void Moving(float x);
     void StopMoving();
     bool IsMoving() const { return movingChannel_ >= 0; }
+    /// Moves channel index by frames in one go, ending like a finished drag:
+    /// the window records the move as an undoable action.
+    void MoveChannel(int32_t index, int64_t frames);
     /// The channel's context menu; it deletes itself when closed.
     QMenu* ContextMenuFor(Channel* channel);
     int32_t ContextChannel() const { return contextChannel_; }
+    /// The context menu of channel index as a secondary click would build
+    /// it, without showing it; null when there is no such channel.
+    QMenu* ContextMenuForChannel(int32_t index);
     /// The menu opened by the last secondary click, while it exists.
     QMenu* OpenContextMenu() const;
 

@@ -1,0 +1,107 @@
+#include "app/DocumentStateReport.h"
+
+#include <QCheckBox>
+#include <QComboBox>
+
+#include <cstdint>
+#include <cstdio>
+#include <mutex>
+#include <sstream>
+
+#include "app/QuillexWindow.h"
+#include "edit/HistoryManager.h"
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+#include "views/ChannelContainerView.h"
+#include "views/SampleView.h"
+
+namespace glimmet {
+
+namespace {
+
+const char* Boolean(bool value)
+{
+    return value ? "true" : "false";
+}
+
+std::string NameOrNull(const char* name)
+{
+    return name != nullptr ? DocumentStateReport::Quoted(name) : std::string("null");
+}
+
+const char* PlayModeName(int index)
+{
+    switch (index) {
+    case 1:
+        return "range";
+    case 2:
+        return "visible";
+    default:
+        return "all";
+    }
+}
+
+void WriteChannel(std::ostringstream& out, Channel& channel, SampleView* view, QuillexWindow& window)
+{
+    out << "{\"first\": " << channel.FirstFrame() << ", \"frames\": " << channel.FrameCount()
+        << ", \"muted\": " << Boolean(channel.IsMuted()) << ", \"pan\": " << int(channel.PanPosition())
+        << ", \"selected\": " << Boolean(channel.IsSelected())
+        << ", \"focused\": " << Boolean(view != nullptr && view->IsFocus()) << ", \"view\": ";
+    if (view == nullptr) {
+        out << "null}";
+        return;
+    }
+    const QPoint origin = view->mapTo(&window, QPoint(0, 0));
+    out << '[' << origin.x() << ", " << origin.y() << ", " << view->width() << ", " << view->height() << "]}";
+}
+
+}  // namespace
+
+std::string DocumentStateReport::Quoted(const std::string& text)
+{
+    std::string quoted = "\"";
+    for (const char c : text) {
+        const auto byte = static_cast<unsigned char>(c);
+        if (c == '"' || c == '\\') {
+            quoted += '\\';
+            quoted += c;
+        } else if (byte < 0x20) {
+            char escape[8];
+            std::snprintf(escape, sizeof escape, "\\u%04x", unsigned(byte));
+            quoted += escape;
+        } else {
+            quoted += c;
+        }
+    }
+    return quoted + '"';
+}
+
+std::string DocumentStateReport::Json(QuillexWindow& window)
+{
+    // The history's own lock comes before the document lock.
+    HistoryManager* history = window.History();
+    const std::string undo = NameOrNull(history->UndoName());
+    const std::string redo = NameOrNull(history->RedoName());
+    const bool saved = history->IsSaved();
+
+    ChannelManager* manager = window.Manager();
+    ChannelContainerView* container = window.ContainerView();
+    std::lock_guard documentLock(manager->DocumentLock());
+    std::ostringstream out;
+    out << "{\"title\": " << Quoted(window.windowTitle().toStdString()) << ", \"frames\": " << manager->FrameCount()
+        << ", \"range\": [" << manager->RangeStart() << ", " << manager->RangeEnd() << "]"
+        << ", \"cursor\": " << container->CursorFrame() << ", \"playmark\": " << container->PlaymarkFrame()
+        << ", \"display\": [" << container->FirstDisplayedFrame() << ", " << container->LastDisplayedFrame() << "]"
+        << ", \"playmode\": \"" << PlayModeName(window.PlayModePopup()->currentIndex()) << '"'
+        << ", \"loop\": " << Boolean(window.LoopBox()->isChecked()) << ", \"undo\": " << undo
+        << ", \"redo\": " << redo << ", \"saved\": " << Boolean(saved) << ", \"channels\": [";
+    for (int32_t index = 0; Channel* channel = manager->ChannelAt(index); ++index) {
+        if (index > 0)
+            out << ", ";
+        WriteChannel(out, *channel, container->SampleViewAtIndex(index), window);
+    }
+    out << "]}";
+    return out.str();
+}
+
+}  // namespace glimmet

@@ -1,0 +1,28 @@
+#pragma once
+
+#include <string>
+
+namespace glimmet {
+
+class QuillexWindow;
+
+/// The state of a document window as one line of JSON, for scripts that
+/// drive the editor headless and check what it did:
+///
+///   {"title": ..., "frames": N, "range": [S, E], "cursor": C, "playmark": P,
+///    "display": [FIRST, LAST], "playmode": "all"|"range"|"visible",
+///    "loop": B, "undo": NAME|null, "redo": NAME|null, "saved": B,
+///    "channels": [{"first": F, "frames": N, "muted": B, "pan": P,
+///                  "selected": B, "focused": B, "view": [X, Y, W, H]}, ...]}
+///
+/// "view" is the channel's sample view in window coordinates, the same
+/// coordinates as a grab of the whole window.
+class DocumentStateReport {
+public:
+    /// Reads the window under the document lock; no trailing newline.
+    static std::string Json(QuillexWindow& window);
+    /// text as a JSON string literal, quotes included.
+    static std::string Quoted(const std::string& text);
+};
+
+}  // namespace glimmet
