@@ -30,7 +30,7 @@ bool ForwardWhileServing(const QString& name, const QStringList& paths)
         forwarded = InstanceServer::ForwardToRunningInstance(name, paths);
         done = true;
     });
-    QTest::qWaitFor([&] { return done.load(); }, 10000);
+    EXPECT_TRUE(QTest::qWaitFor([&] { return done.load(); }, 10000));
     launch.join();
     Drain();
     return forwarded;
@@ -50,7 +50,7 @@ TEST(InstanceServer, ASecondLaunchOpensItsFilesInTheRunningInstance)
     ASSERT_TRUE(server.IsListening());
     const auto file = fixture.MakeSound("handed.wav", 2);
     ASSERT_TRUE(ForwardWhileServing(name, {QString::fromStdString(file.string())}));
-    QTest::qWaitFor([&] { return fixture.App().CountWindows() == 2; }, 2000);
+    EXPECT_TRUE(QTest::qWaitFor([&] { return fixture.App().CountWindows() == 2; }, 2000));
     Drain();
     ASSERT_EQ(fixture.App().CountWindows(), 2);
     EXPECT_EQ(fixture.App().WindowAt(1)->FileEntry(), file);
@@ -64,7 +64,7 @@ TEST(InstanceServer, ASecondLaunchWithoutFilesOpensANewWindow)
     const QString name = UniqueName();
     InstanceServer server(name, &fixture.App());
     ASSERT_TRUE(ForwardWhileServing(name, {}));
-    QTest::qWaitFor([&] { return fixture.App().CountWindows() == 2; }, 2000);
+    EXPECT_TRUE(QTest::qWaitFor([&] { return fixture.App().CountWindows() == 2; }, 2000));
     EXPECT_EQ(fixture.App().CountWindows(), 2);
 }
 
@@ -88,7 +88,7 @@ TEST(InstanceServer, TheGlimmetProgramHandsItsFileToTheRunningInstance)
     ASSERT_TRUE(launch.waitForStarted(5000));
     ASSERT_TRUE(QTest::qWaitFor([&] { return launch.state() == QProcess::NotRunning; }, 30000));
     EXPECT_EQ(launch.exitCode(), 0);
-    QTest::qWaitFor([&] { return fixture.App().CountWindows() == 2; }, 2000);
+    EXPECT_TRUE(QTest::qWaitFor([&] { return fixture.App().CountWindows() == 2; }, 2000));
     Drain();
     ASSERT_EQ(fixture.App().CountWindows(), 2);
     EXPECT_EQ(fixture.App().WindowAt(1)->FileEntry(), file);
