@@ -294,6 +294,59 @@ TEST_F(BatchTest, TransformsUndoAndRedoByCode)
     EXPECT_NE(states[2].find("\"undo\": \"Fade Out\", \"redo\": null"), std::string::npos);
 }
 
+// Every command code the issue lists, each with what it visibly does to a
+// stereo document of 1000 frames with frames 100 to 199 of both channels
+// selected and channel 1 focused.
+TEST_F(BatchTest, EveryListedCodeReachesTheWindow)
+{
+    const auto file = fixture_.MakeSound("s.wav", 2, 1000);
+    const std::string setup = "open " + file.string() + "\nrange 100 199\nselect 0 1\nfocus 1\n";
+    struct Case {
+        std::string lines;
+        std::vector<std::string> expected;
+    };
+    const std::vector<Case> cases = {
+        {"fdin", {"\"undo\": \"Fade In\""}},
+        {"fdot", {"\"undo\": \"Fade Out\""}},
+        {"maxi", {"\"undo\": \"Maximize\""}},
+        {"rvrt", {"\"undo\": \"Revert\""}},
+        {"rvph", {"\"undo\": \"Revert Phases\""}},
+        // A paste replaces the selected range.
+        {"COPY\nPSTE", {"\"frames\": 1000", "\"undo\": \"Paste\""}},
+        {"CCUT", {"\"frames\": 900", "\"undo\": \"Remove\""}},
+        {"CCUT\nPSTE", {"\"frames\": 1000", "\"undo\": \"Paste\""}},
+        {"rmov", {"\"frames\": 900", "\"undo\": \"Remove\""}},
+        {"trnc", {"\"frames\": 100", "\"undo\": \"Truncate\""}},
+        {"addc", {"\"undo\": \"Add Channel\"", "{\"first\": 0, \"frames\": 0"}},
+        {"remc", {"\"undo\": \"Remove Channel\"", "\"channels\": [{\"first\": 0, \"frames\": 1000, "
+                                                    "\"muted\": false, \"pan\": -128"}},
+        {"fdin\nundo", {"\"undo\": null, \"redo\": \"Fade In\""}},
+        {"fdin\nundo\nredo", {"\"undo\": \"Fade In\", \"redo\": null"}},
+        {"fdin\nclub", {"\"undo\": null, \"redo\": null"}},
+        {"SALL", {"\"range\": [0, 999]"}},
+        {"slno", {"\"range\": [-1, -1]", "\"selected\": false"}},
+        // At most one frame per column: the 687 columns show at least 688 frames.
+        {"zora", {"\"display\": [0, 687]"}},
+        {"zora\nshal", {"\"display\": [0, 999]"}},
+        {"tstr", {"\"undo\": null"}},
+        {"cnpl\nwait 50\nstop\nwait 50", {"\"frames\": 1000"}},
+    };
+    for (const Case& c : cases) {
+        QuillexWindow* window = fixture_.App().NewWindow();
+        std::swap(window_, window);
+        ASSERT_EQ(Run(setup + c.lines + "\nprint\n"), BatchRunner::kSucceeded) << c.lines << Errors();
+        const std::string state = LastState();
+        for (const std::string& part : c.expected)
+            EXPECT_NE(state.find(part), std::string::npos) << c.lines << " gave " << state;
+        std::swap(window_, window);
+    }
+    // Playing and stopping: the window's own state.
+    ASSERT_EQ(Run(setup + "cnpl\n"), BatchRunner::kSucceeded);
+    EXPECT_TRUE(window_->IsPlaying());
+    ASSERT_EQ(Run("stop\nwait 100\n"), BatchRunner::kSucceeded);
+    EXPECT_FALSE(window_->IsPlaying());
+}
+
 TEST_F(BatchTest, SamplesWritesLittleEndianSixteenBit)
 {
     std::vector<std::vector<int16_t>> channels = {{-32768, -1, 0, 1, 32767, 258}};
