@@ -75,6 +75,17 @@ expect_pixel() {
     [ "$got" = "$4" ] || fail "$1 at ($2, $3) is $got, expected $4 ($5)"
 }
 
+# Takes screenshot $1 again and again (a slow build may still be drawing)
+# until pixel ($2, $3) is $4, for up to ten seconds.
+await_pixel() {
+    for _ in $(seq 50); do
+        screenshot "$1"
+        [ "$(pixel "$1" "$2" "$3")" = "$4" ] && return 0
+        sleep 0.2
+    done
+    expect_pixel "$@"
+}
+
 # One integer field of the batch mode's JSON state.
 json_view() {
     # "view": [X, Y, W, H] of channel $2 (0-based) in state line $1.
@@ -118,13 +129,12 @@ for step in 1 2 3 4 5 6 7 8; do
     sleep 0.05
 done
 xdotool mouseup 1
-sleep 0.5
-screenshot 02-dragged.png
 
 # The range is coloured in both channels: an empty row inside the range is
 # black, outside it light grey. Channel 0 was clicked and has the focus frame.
 middle_x=$(((start_x + end_x) / 2))
 outside_x=$((wx + v0x + v0w / 8))
+await_pixel 02-dragged.png "$middle_x" $((wy + v1y + 1)) "0,0,0" "channel 1 inside the range"
 for channel in 0 1; do
     if [ $channel = 0 ]; then top=$((wy + v0y + 1)); else top=$((wy + v1y + 1)); fi
     expect_pixel 02-dragged.png "$middle_x" "$top" "0,0,0" "channel $channel inside the range"
