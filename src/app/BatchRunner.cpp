@@ -529,6 +529,11 @@ int BatchRunner::Main(int argc, char** argv)
 
     // No display is needed: the window is drawn off screen.
     qputenv("QT_QPA_PLATFORM", "offscreen");
+    // One device pixel per pixel, whatever scaling the user's desktop asks
+    // for, so that snapshots and "view" rectangles agree.
+    qputenv("QT_SCALE_FACTOR", "1");
+    qunsetenv("QT_SCREEN_SCALE_FACTORS");
+    qputenv("QT_ENABLE_HIGHDPI_SCALING", "0");
     gToolkitMessages = qInstallMessageHandler(FilterToolkitMessages);
     QApplication toolkit(argc, argv);
     QApplication::setApplicationName(QStringLiteral("Glimmet"));

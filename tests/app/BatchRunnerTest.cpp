@@ -444,7 +444,8 @@ TEST(DocumentStateReport, QuotesLikeJson)
 // status and both output streams.
 class BatchProgram : public ::testing::Test {
 protected:
-    int RunProgram(const QStringList& arguments, const QByteArray& input)
+    int RunProgram(const QStringList& arguments, const QByteArray& input,
+        const std::vector<std::pair<QString, QString>>& extraEnvironment = {})
     {
         const QString program = QCoreApplication::applicationDirPath() + "/../glimmet";
         EXPECT_TRUE(QFile::exists(program)) << program.toStdString();
@@ -454,6 +455,8 @@ protected:
         environment.remove("WAYLAND_DISPLAY");
         environment.remove("QT_QPA_PLATFORM");
         environment.insert("SDL_AUDIODRIVER", "dummy");
+        for (const auto& [name, value] : extraEnvironment)
+            environment.insert(name, value);
         process.setProcessEnvironment(environment);
         process.start(program, arguments);
         EXPECT_TRUE(process.waitForStarted(5000));
@@ -512,6 +515,16 @@ TEST_F(BatchProgram, ScriptFileAndMissingScript)
     EXPECT_NE(errors_.find("cannot read the script"), std::string::npos) << errors_;
     EXPECT_EQ(RunProgram({"--batch"}, ""), 2);
     EXPECT_NE(errors_.find("usage:"), std::string::npos) << errors_;
+}
+
+TEST_F(BatchProgram, SnapshotsHaveOnePixelPerPixelWhateverTheDesktopScale)
+{
+    const QString image = dir_.filePath("scaled.png");
+    EXPECT_EQ(RunProgram({"--batch", "-"}, QByteArray("size 640 300\nsnapshot ") + image.toUtf8() + "\n",
+                  {{"QT_SCALE_FACTOR", "2"}, {"QT_SCREEN_SCALE_FACTORS", "3"}}),
+        0)
+        << errors_;
+    EXPECT_EQ(QImage(image).size(), QSize(640, 300));
 }
 
 TEST_F(BatchProgram, DiagnosticsStillGoToStandardOutput)
