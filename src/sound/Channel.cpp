@@ -37,23 +37,6 @@ Channel::SampleArray Channel::Allocate(int64_t count)
     return SampleAllocator::Shared().Allocate(size_t(count));
 }
 
-void Channel::CopyOut(int16_t* destination, int64_t index, int64_t count) const
-{
-    if (count <= 0)
-        return;
-    // Reads beyond either end of the array give silence.
-    int64_t validBegin = std::clamp<int64_t>(index, 0, count_);
-    int64_t validEnd = std::clamp<int64_t>(index + count, 0, count_);
-    int64_t leading = std::min(count, validBegin - index);
-    FillZeros(destination, leading);
-    int64_t copied = std::max<int64_t>(0, validEnd - validBegin);
-    if (samples_ != nullptr)
-        CopySamples(destination + leading, samples_.get() + validBegin, copied);
-    else
-        copied = 0;
-    FillZeros(destination + leading + copied, count - leading - copied);
-}
-
 void Channel::Install(SampleArray samples, int64_t count)
 {
     samples_ = std::move(samples);
@@ -139,30 +122,48 @@ bool Channel::FillBuffer(int16_t* buffer, int64_t start, int64_t count)
     std::lock_guard guard(lock_);
     if (buffer == nullptr)
         return false;
+    const int16_t* samples = nullptr;
+    int64_t offset = 0;
+    int64_t length = 0;
+    if (!FindSamples(start, count, &samples, &offset, &length))
+        return false;
+    FillZeros(buffer, offset);
+    CopySamples(buffer + offset, samples, length);
+    FillZeros(buffer + offset + length, count - offset - length);
+    return true;
+}
+
+bool Channel::FindSamples(int64_t start, int64_t count, const int16_t** samples, int64_t* offset,
+    int64_t* length) const
+{
+    *samples = nullptr;
+    *offset = 0;
+    *length = 0;
     const int64_t end = End();
     const int64_t last = start + count - 1;
+    int64_t index = 0;
     if (start >= first_ && start < end) {
-        // The bound is last <= end on purpose: a request ending one frame
-        // past the data takes the copy path, and that frame reads as 0.
-        if (last <= end) {
-            CopyOut(buffer, start - first_, count);
-        } else {
-            CopyOut(buffer, start - first_, end - start);
-            FillZeros(buffer + (end - start), count - (end - start));
-        }
+        // A request running past the data reads silence there, one ending
+        // exactly one frame past it included.
+        index = start - first_;
     } else if (start >= first_ && start > end) {
-        FillZeros(buffer, count);
+        return true;
     } else if (start == end) {
         std::printf("what the....?\n");
         std::fflush(stdout);
         return false;
     } else if (last <= first_) {
-        FillZeros(buffer, count);
+        // Also when the request ends exactly on the first frame: that frame
+        // reads as silence.
+        return true;
     } else {
-        const int64_t gap = first_ - start;
-        FillZeros(buffer, gap);
-        CopyOut(buffer + gap, 0, count - gap);
+        *offset = first_ - start;
     }
+    if (samples_ == nullptr)
+        return true;
+    *length = std::max<int64_t>(0, std::min(count - *offset, count_ - index));
+    if (*length > 0)
+        *samples = samples_.get() + index;
     return true;
 }
 

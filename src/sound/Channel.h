@@ -72,6 +72,40 @@ public:
     /// both once per buffer).
     void GetMixSettings(bool* muted, int8_t* pan);
 
+    /// What a mix takes from the channel for one request, read under one
+    /// hold of the lock.
+    struct MixSource {
+        bool muted = false;
+        int8_t pan = kPanMiddle;
+        /// The samples FillBuffer would copy for the same request, which
+        /// belong at index offset of the request on; every other index is
+        /// silence. Null, with length 0, when nothing would be copied.
+        const int16_t* samples = nullptr;
+        int64_t offset = 0;
+        int64_t length = 0;
+        /// How many samples of the array follow the copied ones.
+        int64_t following = 0;
+    };
+
+    /// Calls mix(const MixSource&) for count frames of the timeline from
+    /// start while holding the channel's lock, so the samples stay valid and
+    /// unchanged during the call: the mixer sums them where they lie instead
+    /// of copying them out. Returns what FillBuffer would return for the
+    /// request, and prints what it would print.
+    template <typename Mix>
+    bool ReadForMix(int64_t start, int64_t count, Mix&& mix)
+    {
+        std::lock_guard guard(lock_);
+        MixSource source;
+        source.muted = muted_;
+        source.pan = pan_;
+        const bool filled = FindSamples(start, count, &source.samples, &source.offset, &source.length);
+        if (source.length > 0)
+            source.following = samples_.get() + count_ - (source.samples + source.length);
+        mix(static_cast<const MixSource&>(source));
+        return filled;
+    }
+
     /// The sample array itself, valid only while no edit runs (callers hold
     /// the document lock). Null for a channel that never held data.
     int16_t* Data();
@@ -87,9 +121,12 @@ private:
     /// An uninitialised array of count samples from the shared allocator, or
     /// null when it cannot be had (arrays are limited to 2^32 - 1 samples).
     static SampleArray Allocate(int64_t count);
-    /// Copies count samples of the current array from index on; positions
-    /// outside the array read as 0.
-    void CopyOut(int16_t* destination, int64_t index, int64_t count) const;
+    /// Which samples a request of count frames of the timeline from start
+    /// copies: *length samples from *samples on go to index *offset of the
+    /// request, the rest of it is silence. False, after printing "what
+    /// the....?", for a request that starts exactly at the end of the data.
+    /// The lock is held.
+    bool FindSamples(int64_t start, int64_t count, const int16_t** samples, int64_t* offset, int64_t* length) const;
     void Install(SampleArray samples, int64_t count);
     /// Steps of loading from a track; each false ends the load.
     bool AcceptTrackFormat(MediaTrack* track, uint32_t index, int32_t* channels, size_t* bufferSize);

@@ -10,6 +10,7 @@
 #include "sound/SoftClip.h"
 #include "support/Message.h"
 #include "support/MessageCodes.h"
+#include "support/VectorClones.h"
 
 namespace glimmet {
 
@@ -17,18 +18,6 @@ namespace {
 
 constexpr float kSampleScale = 3.0517578125e-05f;  // 1 / 32768
 constexpr float kOutputScale = 32767.0f;
-
-// The hot loops of the mix get a second, AVX2 build picked at load time on
-// processors that have it. Plain SSE2 and AVX2 give identical results here:
-// there is no contraction into fused multiply-adds in standard C++ mode, and
-// every operation is exactly rounded either way.
-// Not under ThreadSanitizer: the loader runs the clones' resolvers before
-// the sanitizer's runtime is up, and the program dies at start-up.
-#if defined(__GNUC__) && !defined(__clang__) && defined(__x86_64__) && !defined(__SANITIZE_THREAD__)
-#define GLIMMET_VECTOR_CLONES __attribute__((target_clones("avx2", "default")))
-#else
-#define GLIMMET_VECTOR_CLONES
-#endif
 
 // Every channel sample enters the mix as s / 32768, and such values add up
 // exactly in single precision as long as no partial sum reaches 512 in
@@ -42,13 +31,22 @@ constexpr int32_t kExactIntegerSumLimit = 511;
 // a 16-bit integer store of the FPU does. Written without branches or calls
 // so that the conversion loop vectorises; adding and removing 1.5 * 2^23
 // rounds exactly for every magnitude that passes the range test.
+constexpr float kRoundingMagic = 12582912.0f;
+
 inline int16_t ToSample(float value)
 {
     const float scaled = value * kOutputScale;
     const bool inRange = (scaled >= -32768.5f) & (scaled < 32767.5f);
-    constexpr float kRoundingMagic = 12582912.0f;
     const float rounded = (scaled + kRoundingMagic) - kRoundingMagic;
     return int16_t(int32_t(inRange ? rounded : -32768.0f));
+}
+
+// ToSample for a value that cannot leave the 16-bit range: silence, or a
+// single channel's s / 32768, which scales to at most 32767 in magnitude.
+inline int16_t ToSampleInRange(float value)
+{
+    const float scaled = value * kOutputScale;
+    return int16_t(int32_t((scaled + kRoundingMagic) - kRoundingMagic));
 }
 
 // How one side of the mix is heard: nothing heard gives silence, a single
@@ -64,62 +62,102 @@ SideMode ModeFor(int32_t contributors)
     return contributors == 1 ? SideMode::kSingle : SideMode::kCurve;
 }
 
+// One side's input to the last pass: the integer sums, and for a side that
+// goes through the curve, its values already bent.
+struct SideInput {
+    const int32_t* sums;
+    const float* curved;
+};
+
 template <SideMode mode>
-inline float SideValue(float sum)
+inline float SideValue(const SideInput& side, int64_t i)
 {
     if constexpr (mode == SideMode::kSilent)
         return 0.0f;
     else if constexpr (mode == SideMode::kSingle)
-        return sum;
+        return float(side.sums[i]) * kSampleScale;
     else
-        return soft_clip(sum);
+        return side.curved[i];
 }
 
 // The last pass of a mix: scale the integer sums, combine each side and
 // interleave. One instance per pair of side modes keeps the loop free of
 // branches, so the common cases vectorise.
 template <SideMode left, SideMode right>
-GLIMMET_VECTOR_CLONES void WriteFrames(const int32_t* leftSums, const int32_t* rightSums, int64_t frames, float* out)
+GLIMMET_VECTOR_CLONES void WriteFrames(SideInput leftSide, SideInput rightSide, int64_t frames, float* out)
 {
     for (int64_t i = 0; i < frames; ++i) {
-        out[2 * i] = SideValue<left>(float(leftSums[i]) * kSampleScale);
-        out[2 * i + 1] = SideValue<right>(float(rightSums[i]) * kSampleScale);
+        out[2 * i] = SideValue<left>(leftSide, i);
+        out[2 * i + 1] = SideValue<right>(rightSide, i);
     }
 }
 
+// Only the curve can leave the 16-bit range (its parabola falls without
+// bound); the other sides skip the range test.
+template <SideMode mode>
+inline int16_t SideSample(const SideInput& side, int64_t i)
+{
+    if constexpr (mode == SideMode::kCurve)
+        return ToSample(SideValue<mode>(side, i));
+    else
+        return ToSampleInRange(SideValue<mode>(side, i));
+}
+
 template <SideMode left, SideMode right>
-GLIMMET_VECTOR_CLONES void WriteFrames(const int32_t* leftSums, const int32_t* rightSums, int64_t frames, int16_t* out)
+GLIMMET_VECTOR_CLONES void WriteFrames(SideInput leftSide, SideInput rightSide, int64_t frames, int16_t* out)
 {
     for (int64_t i = 0; i < frames; ++i) {
-        out[2 * i] = ToSample(SideValue<left>(float(leftSums[i]) * kSampleScale));
-        out[2 * i + 1] = ToSample(SideValue<right>(float(rightSums[i]) * kSampleScale));
+        out[2 * i] = SideSample<left>(leftSide, i);
+        out[2 * i + 1] = SideSample<right>(rightSide, i);
     }
 }
 
 template <typename Sample, SideMode left>
-void WriteFramesFor(SideMode right, const int32_t* leftSums, const int32_t* rightSums, int64_t frames, Sample* out)
+void WriteFramesFor(SideMode right, SideInput leftSide, SideInput rightSide, int64_t frames, Sample* out)
 {
     switch (right) {
-        case SideMode::kSilent: WriteFrames<left, SideMode::kSilent>(leftSums, rightSums, frames, out); break;
-        case SideMode::kSingle: WriteFrames<left, SideMode::kSingle>(leftSums, rightSums, frames, out); break;
-        case SideMode::kCurve: WriteFrames<left, SideMode::kCurve>(leftSums, rightSums, frames, out); break;
+        case SideMode::kSilent: WriteFrames<left, SideMode::kSilent>(leftSide, rightSide, frames, out); break;
+        case SideMode::kSingle: WriteFrames<left, SideMode::kSingle>(leftSide, rightSide, frames, out); break;
+        case SideMode::kCurve: WriteFrames<left, SideMode::kCurve>(leftSide, rightSide, frames, out); break;
     }
 }
 
+GLIMMET_VECTOR_CLONES void ScaleSums(const int32_t* sums, int64_t frames, float* values)
+{
+    for (int64_t i = 0; i < frames; ++i)
+        values[i] = float(sums[i]) * kSampleScale;
+}
+
+// Bends a side heard from several channels: its scaled sums go through the
+// curve in vector code, into curved.
+SideInput PrepareSide(SideMode mode, const int32_t* sums, int64_t frames, float* curved)
+{
+    if (mode == SideMode::kCurve) {
+        ScaleSums(sums, frames, curved);
+        soft_clip_block(curved, curved, frames);
+    }
+    return SideInput{sums, curved};
+}
+
+// Mixes the integer sums into interleaved frames; leftCurved and rightCurved
+// hold frames values each and are overwritten.
 template <typename Sample>
 void WriteMix(int32_t leftCount, int32_t rightCount, const int32_t* leftSums, const int32_t* rightSums,
-    int64_t frames, Sample* out)
+    float* leftCurved, float* rightCurved, int64_t frames, Sample* out)
 {
+    const SideMode leftMode = ModeFor(leftCount);
     const SideMode right = ModeFor(rightCount);
-    switch (ModeFor(leftCount)) {
+    const SideInput leftSide = PrepareSide(leftMode, leftSums, frames, leftCurved);
+    const SideInput rightSide = PrepareSide(right, rightSums, frames, rightCurved);
+    switch (leftMode) {
         case SideMode::kSilent:
-            WriteFramesFor<Sample, SideMode::kSilent>(right, leftSums, rightSums, frames, out);
+            WriteFramesFor<Sample, SideMode::kSilent>(right, leftSide, rightSide, frames, out);
             break;
         case SideMode::kSingle:
-            WriteFramesFor<Sample, SideMode::kSingle>(right, leftSums, rightSums, frames, out);
+            WriteFramesFor<Sample, SideMode::kSingle>(right, leftSide, rightSide, frames, out);
             break;
         case SideMode::kCurve:
-            WriteFramesFor<Sample, SideMode::kCurve>(right, leftSums, rightSums, frames, out);
+            WriteFramesFor<Sample, SideMode::kCurve>(right, leftSide, rightSide, frames, out);
             break;
     }
 }
@@ -142,6 +180,46 @@ GLIMMET_VECTOR_CLONES void CopySamples(const int16_t* samples, int64_t frames, i
 {
     for (int64_t i = 0; i < frames; ++i)
         sums[i] = samples[i];
+}
+
+GLIMMET_VECTOR_CLONES void AddSamplesToBoth(const int16_t* samples, int64_t frames, int32_t* left, int32_t* right)
+{
+    for (int64_t i = 0; i < frames; ++i) {
+        left[i] += samples[i];
+        right[i] += samples[i];
+    }
+}
+
+// Asks the processor to start loading the samples the next buffer will most
+// likely read, so that they arrive while this buffer is mixed: the samples
+// come from main memory, and waiting for each cache line in turn took most
+// of the mix's time, with many channels in playback and in saving alike. Up
+// to kPrefetchLimit samples per channel, the next buffer for playback and
+// for saving; far larger requests would only have the first of them evicted
+// again before their turn.
+constexpr int64_t kPrefetchLimit = 4096;
+
+void PrefetchSamples(const int16_t* samples, int64_t count)
+{
+    constexpr int64_t kLineSamples = 64 / sizeof(int16_t);
+    for (int64_t i = 0; i < count; i += kLineSamples)
+        __builtin_prefetch(samples + i);
+}
+
+// The sides a channel is heard on.
+constexpr uint8_t kHeardLeft = 1;
+constexpr uint8_t kHeardRight = 2;
+
+uint8_t HeardSides(bool muted, int8_t pan)
+{
+    if (muted)
+        return 0;
+    uint8_t sides = 0;
+    if (pan == Channel::kPanMiddle || pan == Channel::kPanLeft)
+        sides |= kHeardLeft;
+    if (pan == Channel::kPanMiddle || pan == Channel::kPanRight)
+        sides |= kHeardRight;
+    return sides;
 }
 
 }  // namespace
@@ -416,7 +494,8 @@ void ChannelManager::MixScratch(int32_t channelCount, int64_t frames, Sample* ou
     int32_t leftCount = 0;
     int32_t rightCount = 0;
     if (SumChannels(channelCount, frames, &leftCount, &rightCount)) {
-        WriteMix(leftCount, rightCount, integerLeft_.data(), integerRight_.data(), frames, out);
+        WriteMix(leftCount, rightCount, integerLeft_.data(), integerRight_.data(), leftSum_.data(),
+            rightSum_.data(), frames, out);
         return;
     }
     SumChannelsInFloat(channelCount, frames);
@@ -431,6 +510,104 @@ void ChannelManager::MixScratch(int32_t channelCount, int64_t frames, Sample* ou
             out[2 * i + 1] = ToSample(right);
         }
     }
+}
+
+void ChannelManager::ReserveSums(int32_t channelCount, int64_t frames)
+{
+    // Grows only when the buffer or the channel count grows, so a steady
+    // playback allocates nothing per buffer.
+    if (sides_.size() < size_t(channelCount))
+        sides_.resize(size_t(channelCount));
+    if (integerLeft_.size() < size_t(frames)) {
+        integerLeft_.resize(size_t(frames));
+        integerRight_.resize(size_t(frames));
+        leftSum_.resize(size_t(frames));
+        rightSum_.resize(size_t(frames));
+    }
+}
+
+void ChannelManager::AddChannels(int32_t channelCount, const Part& part, bool firstPart)
+{
+    int32_t* left = integerLeft_.data() + part.offset;
+    int32_t* right = integerRight_.data() + part.offset;
+    // The first channel heard on a side sets the sums of the part (its
+    // samples, zeros around them) instead of adding to zeros.
+    bool leftSet = false;
+    bool rightSet = false;
+    auto addTo = [&part](int32_t* sums, bool* set, const Channel::MixSource& source) {
+        if (*set) {
+            AddSamples(source.samples, source.length, sums + source.offset);
+            return;
+        }
+        std::fill_n(sums, source.offset, 0);
+        CopySamples(source.samples, source.length, sums + source.offset);
+        const int64_t after = source.offset + source.length;
+        std::fill_n(sums + after, part.count - after, 0);
+        *set = true;
+    };
+    for (int32_t c = 0; c < channelCount; ++c) {
+        uint8_t& heard = sides_[size_t(c)];
+        // A request the channel refuses adds nothing, but the channel still
+        // counts as heard on its sides.
+        channels_[size_t(c)]->ReadForMix(part.from, part.count, [&](const Channel::MixSource& source) {
+            // The sides are read once per buffer: a buffer that wraps around
+            // the loop hears each channel on the same sides in both parts.
+            if (firstPart)
+                heard = HeardSides(source.muted, source.pan);
+            if (source.length <= 0)
+                return;
+            if (heard == (kHeardLeft | kHeardRight) && leftSet && rightSet) {
+                AddSamplesToBoth(source.samples, source.length, left + source.offset, right + source.offset);
+            } else {
+                if ((heard & kHeardLeft) != 0)
+                    addTo(left, &leftSet, source);
+                if ((heard & kHeardRight) != 0)
+                    addTo(right, &rightSet, source);
+            }
+            PrefetchSamples(
+                source.samples + source.length, std::min({source.following, source.length, kPrefetchLimit}));
+        });
+    }
+    if (!leftSet)
+        std::fill_n(left, part.count, 0);
+    if (!rightSet)
+        std::fill_n(right, part.count, 0);
+}
+
+template <typename Sample>
+void ChannelManager::Mix(int32_t channelCount, int64_t frames, const Part* parts, int32_t partCount, Sample* out)
+{
+    if (channelCount > kExactIntegerSumLimit) {
+        // So many channels that a side might need the float sum: copy every
+        // channel out and take the general path.
+        ReserveScratch(channelCount, frames);
+        int64_t filled = 0;
+        for (int32_t p = 0; p < partCount; ++p) {
+            FillScratch(channelCount, frames, parts[p].from, parts[p].offset, parts[p].count);
+            filled = parts[p].offset + parts[p].count;
+        }
+        ZeroScratch(channelCount, frames, filled, frames - filled);
+        MixScratch(channelCount, frames, out);
+        return;
+    }
+    // Every side has at most kExactIntegerSumLimit channels: the integer sum
+    // is exact, and each channel's samples are added where they lie.
+    ReserveSums(channelCount, frames);
+    int64_t filled = 0;
+    for (int32_t p = 0; p < partCount; ++p) {
+        AddChannels(channelCount, parts[p], p == 0);
+        filled = parts[p].offset + parts[p].count;
+    }
+    std::fill_n(integerLeft_.data() + filled, frames - filled, 0);
+    std::fill_n(integerRight_.data() + filled, frames - filled, 0);
+    int32_t leftCount = 0;
+    int32_t rightCount = 0;
+    for (int32_t c = 0; c < channelCount; ++c) {
+        leftCount += (sides_[size_t(c)] & kHeardLeft) != 0;
+        rightCount += (sides_[size_t(c)] & kHeardRight) != 0;
+    }
+    WriteMix(leftCount, rightCount, integerLeft_.data(), integerRight_.data(), leftSum_.data(), rightSum_.data(),
+        frames, out);
 }
 
 bool ChannelManager::FillBuffer(float* out, int64_t frames)
@@ -452,27 +629,30 @@ bool ChannelManager::FillBuffer(float* out, int64_t frames)
         currentFrame_ = current;
         return false;
     }
-    ReserveScratch(channelCount, frames);
 
+    // The buffer in parts of the timeline: one, or the tail of the range and,
+    // when looping, its head again. Without the loop the rest is silence.
+    Part parts[2];
+    int32_t partCount = 1;
     if (current + frames <= end) {
-        FillScratch(channelCount, frames, current, 0, frames);
+        parts[0] = {current, 0, frames};
         current += frames;
     } else {
         const int64_t head = end - current + 1;
         const int64_t tail = frames - head;
-        FillScratch(channelCount, frames, current, 0, head);
+        parts[0] = {current, 0, head};
         if (Loop()) {
-            FillScratch(channelCount, frames, start, head, tail);
+            parts[1] = {start, head, tail};
+            partCount = 2;
             current = start + tail;
         } else {
-            ZeroScratch(channelCount, frames, head, tail);
             PostToWindow(kMsgStop);
             current = end + 1;
         }
     }
     currentFrame_ = current;
 
-    MixScratch(channelCount, frames, out);
+    Mix(channelCount, frames, parts, partCount, out);
     return true;
 }
 
@@ -487,11 +667,8 @@ bool ChannelManager::FillBuffer(int16_t* out, int64_t* frames)
         *frames = total - current;
     const int64_t count = *frames;
 
-    const int32_t channelCount = int32_t(channels_.size());
-    ReserveScratch(channelCount, count);
-    FillScratch(channelCount, count, current, 0, count);
-
-    MixScratch(channelCount, count, out);
+    const Part part{current, 0, count};
+    Mix(int32_t(channels_.size()), count, &part, 1, out);
     currentFrame_ = current + count;
     return true;
 }

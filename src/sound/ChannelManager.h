@@ -88,8 +88,26 @@ public:
     bool FillBuffer(int16_t* out, int64_t* frames);
 
 private:
+    /// count frames of the timeline from frame from, mixed into the buffer
+    /// from index offset on.
+    struct Part {
+        int64_t from;
+        int64_t offset;
+        int64_t count;
+    };
+
     int64_t FrameCountLocked();
     void PlayRange(int64_t total, int64_t* start, int64_t* end);
+    /// Mixes the parts (which cover the buffer from its start; the rest is
+    /// silence) into interleaved stereo frames.
+    template <typename Sample>
+    void Mix(int32_t channelCount, int64_t frames, const Part* parts, int32_t partCount, Sample* out);
+    void ReserveSums(int32_t channelCount, int64_t frames);
+    /// Adds each heard channel's samples for the part straight from the
+    /// channel into the integer sums of its sides, under the channel's lock.
+    /// The first part of a buffer also notes the sides each channel is heard
+    /// on in sides_.
+    void AddChannels(int32_t channelCount, const Part& part, bool firstPart);
     void ReserveScratch(int32_t channelCount, int64_t frames);
     void FillScratch(int32_t channelCount, int64_t frames, int64_t from, int64_t offset, int64_t count);
     void ZeroScratch(int32_t channelCount, int64_t frames, int64_t offset, int64_t count);
@@ -110,6 +128,7 @@ private:
     std::vector<float> rightSum_;
     std::vector<int32_t> integerLeft_;
     std::vector<int32_t> integerRight_;
+    std::vector<uint8_t> sides_;
 
     DocumentWindow* window_;
     std::atomic<float> frameRate_{44100.0f};

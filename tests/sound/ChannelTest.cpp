@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <numeric>
+#include <string>
 #include <vector>
 
 #include "sound/Channel.h"
@@ -131,6 +133,42 @@ TEST_P(ChannelFillTest, FillsTheTimeline)
         EXPECT_EQ(printed, "");
     } else {
         EXPECT_EQ(buffer, Samples(size_t(fill.count), int16_t(-7)));
+        EXPECT_EQ(printed, "what the....?\n");
+    }
+}
+
+// What ReadForMix reports, laid out as a buffer, is what FillBuffer writes.
+TEST_P(ChannelFillTest, ReadForMixDescribesTheSameSamples)
+{
+    const FillCase& fill = GetParam();
+    auto channel = MakeChannel(Ramp(10), 100);
+    channel->SetMuted(true);
+    channel->SetPanPosition(Channel::kPanRight);
+    Samples buffer = Zeros(fill.count);
+    int calls = 0;
+    testing::internal::CaptureStdout();
+    const bool result = channel->ReadForMix(fill.start, fill.count, [&](const Channel::MixSource& source) {
+        ++calls;
+        EXPECT_TRUE(source.muted);
+        EXPECT_EQ(source.pan, Channel::kPanRight);
+        ASSERT_GE(source.offset, 0);
+        ASSERT_GE(source.length, 0);
+        ASSERT_LE(source.offset + source.length, fill.count);
+        EXPECT_EQ(source.samples == nullptr, source.length == 0);
+        if (source.length == 0)
+            return;
+        const int16_t* data = channel->Data();
+        ASSERT_GE(source.samples, data);
+        EXPECT_EQ(source.samples + source.length + source.following, data + 10);
+        std::copy_n(source.samples, source.length, buffer.begin() + source.offset);
+    });
+    const std::string printed = testing::internal::GetCapturedStdout();
+    EXPECT_EQ(calls, 1);
+    EXPECT_EQ(result, fill.result);
+    if (fill.result) {
+        EXPECT_EQ(buffer, fill.expected);
+        EXPECT_EQ(printed, "");
+    } else {
         EXPECT_EQ(printed, "what the....?\n");
     }
 }
