@@ -1,7 +1,6 @@
 #include "files/DocumentLoader.h"
 
 #include <algorithm>
-#include <new>
 #include <system_error>
 
 #include "edit/ChannelContainer.h"
@@ -12,6 +11,7 @@
 #include "files/MediaTrack.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "sound/SampleAllocator.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet {
@@ -34,13 +34,16 @@ media_format ShortAudioRequest()
     return request;
 }
 
-using SampleArray = std::unique_ptr<int16_t[]>;
+using SampleArray = SampleAllocator::Array;
 
+/// Arrays come from the allocator channels use, so that the first edit after
+/// a load can reuse the block it frees, and a long array is faulted in with
+/// one call rather than page by page while it is filled.
 SampleArray AllocateSamples(int64_t count)
 {
     if (count <= 0 || count > int64_t(UINT32_MAX))
         return nullptr;
-    return SampleArray(new (std::nothrow) int16_t[size_t(count)]);
+    return SampleAllocator::Shared().Allocate(size_t(count));
 }
 
 /// Copies frames interleaved frames of channels samples into the arrays
@@ -177,7 +180,7 @@ std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* t
         channels[k] = std::make_unique<Channel>();
         channels[k]->SetFrameRate(decoded.raw_audio.frame_rate);
         channels[k]->SetPanPosition(k % 2 == 1 ? Channel::kPanRight : Channel::kPanLeft);
-        channels[k]->SetTo(arrays[k].release(), count);
+        channels[k]->SetTo(std::move(arrays[k]), count);
     }
     return channels;
 }

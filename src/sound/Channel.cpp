@@ -117,6 +117,15 @@ bool Channel::SetTo(int16_t* samples, int64_t count)
     return true;
 }
 
+bool Channel::SetTo(SampleAllocator::Array samples, int64_t count)
+{
+    if (samples == nullptr || count <= 0)
+        return false;
+    std::lock_guard guard(lock_);
+    Install(std::move(samples), count);
+    return true;
+}
+
 bool Channel::FillBuffer(int16_t* buffer, int64_t start, int64_t count)
 {
     std::lock_guard guard(lock_);

@@ -43,6 +43,10 @@ public:
     /// changing nothing, for a null pointer or a count below 1. Meant for a
     /// freshly made channel: the first frame is left as it is.
     bool SetTo(int16_t* samples, int64_t count);
+    /// Adopts an array from a SampleAllocator, which takes it back when the
+    /// channel lets go of it; otherwise as above (a null array or a count
+    /// below 1 changes nothing and frees the array).
+    bool SetTo(SampleAllocator::Array samples, int64_t count);
 
     /// Writes count samples of the channel's timeline from start into buffer:
     /// zeros where the channel is silent. False for a null buffer, and for a

@@ -5,6 +5,7 @@
 #include "WavBytes.h"
 #include "files/DocumentLoader.h"
 #include "sound/Channel.h"
+#include "sound/SampleAllocator.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet {
@@ -229,6 +230,40 @@ TEST_F(DocumentLoaderTest, ChunksAfterTheDataDoNotLengthenTheChannels)
     ASSERT_EQ(right->FrameCount(), 1000);
     for (int64_t i = 0; i < 1000; ++i)
         ASSERT_EQ(right->Data()[i], source[size_t(2 * i + 1)]) << i;
+}
+
+}  // namespace
+}  // namespace glimmet
+
+namespace glimmet {
+namespace {
+
+TEST_F(DocumentLoaderTest, LongChannelsTakeTheirArraysFromTheSampleAllocator)
+{
+    // 2.5 million frames: arrays of 5 MB, beyond the size the allocator maps.
+    const std::vector<int16_t> source = SoundFixtures::Pattern(2500000, 2);
+    const auto path = fixtures.WriteBytes("long.wav", test::WavBytes{}.Make(source));
+    SampleAllocator& allocator = SampleAllocator::Shared();
+    allocator.ReleaseCached();
+    const size_t mappings = allocator.MappingsMade();
+    ASSERT_EQ(DocumentLoader::Load(path, window), B_OK);
+    EXPECT_EQ(allocator.MappingsMade(), mappings + 2);
+
+    // Loading again first empties the document, and the new arrays reuse
+    // the blocks the old channels gave back.
+    ASSERT_EQ(DocumentLoader::Load(path, window), B_OK);
+    EXPECT_EQ(allocator.MappingsMade(), mappings + 2);
+    ASSERT_EQ(window.manager.CountChannels(), 2);
+    for (int32_t k = 0; k < 2; ++k) {
+        Channel* channel = window.manager.ChannelAt(k);
+        ASSERT_EQ(channel->FrameCount(), 2500000);
+        for (int64_t i = 0; i < 2500000; ++i)
+            ASSERT_EQ(channel->Data()[i], source[size_t(2 * i + k)]) << k << " " << i;
+    }
+    while (window.manager.RemoveChannelAt(0))
+        window.container.RemoveSampleViewAt(0);
+    EXPECT_EQ(allocator.CachedBlocks(), 2u);
+    allocator.ReleaseCached();
 }
 
 }  // namespace
