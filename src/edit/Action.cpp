@@ -16,11 +16,11 @@ Action::Action(MessageTarget* window) : window_(window) {}
 
 Action::~Action() = default;
 
-std::unique_ptr<int16_t[]> Action::AllocateSamples(int64_t count)
+SampleAllocator::Array Action::AllocateSamples(int64_t count)
 {
     if (count < 1 || count > int64_t(UINT32_MAX))
         return nullptr;
-    return std::unique_ptr<int16_t[]>(new (std::nothrow) int16_t[size_t(count)]);
+    return SampleAllocator::Shared().Allocate(size_t(count));
 }
 
 status_t Action::InitCheck()
@@ -63,13 +63,18 @@ void Action::TakeSnapshot()
             continue;
         SavedChannel record;
         record.index = i;
-        record.data = AllocateSamples(frameCount_);
-        // A copy that fails leaves the snapshot as silence.
-        if (record.data != nullptr && !channel->FillBuffer(record.data.get(), rangeStart_, frameCount_))
-            std::memset(record.data.get(), 0, size_t(frameCount_) * sizeof(int16_t));
+        SnapshotChannel(channel, record);
         savedChannels_.push_back(std::move(record));
     }
     manager_->Unlock();
+}
+
+void Action::SnapshotChannel(Channel* channel, SavedChannel& record) const
+{
+    record.data = AllocateSamples(frameCount_);
+    // A copy that fails leaves the snapshot as silence.
+    if (record.data != nullptr && !channel->FillBuffer(record.data.get(), rangeStart_, frameCount_))
+        std::memset(record.data.get(), 0, size_t(frameCount_) * sizeof(int16_t));
 }
 
 int64_t Action::SnapshotBytes() const

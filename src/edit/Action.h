@@ -5,6 +5,7 @@
 #include <memory>
 #include <vector>
 
+#include "sound/SampleAllocator.h"
 #include "support/Status.h"
 
 namespace glimmet {
@@ -62,14 +63,19 @@ public:
     /// An uninitialised sample array of count samples, or null when count is
     /// not a size a channel can hold (below 1 or above 2^32 - 1) or memory
     /// is short.
-    static std::unique_ptr<int16_t[]> AllocateSamples(int64_t count);
+    /// Comes from the shared SampleAllocator: a long range gets one mapping
+    /// faulted in at once instead of page by page as it is copied.
+    static SampleAllocator::Array AllocateSamples(int64_t count);
 
 protected:
     /// One selected channel's range as it was at SetTo.
     struct SavedChannel {
-        std::unique_ptr<int16_t[]> data;  // null when it could not be had
+        SampleAllocator::Array data;  // null when it could not be had
         int32_t index = 0;                // position in the manager
     };
+
+    /// Allocates record's array and copies the channel's range into it.
+    void SnapshotChannel(Channel* channel, SavedChannel& record) const;
 
     /// Called for each recorded channel met by WalkRecordedChannels with the
     /// channel and the position of its record.

@@ -5,6 +5,8 @@
 #include <mutex>
 #include <vector>
 
+#include "sound/SampleAllocator.h"
+
 namespace glimmet {
 
 /// The samples last copied in any window, shared by all windows so that a
@@ -15,7 +17,9 @@ namespace glimmet {
 /// SetApplicationBuffer; edits find it through ApplicationBuffer().
 class CopyBuffer {
 public:
-    using Samples = std::unique_ptr<int16_t[]>;
+    /// From the shared SampleAllocator, or adopted from new[] (the default
+    /// deleter of an array without an allocator is delete[]).
+    using Samples = SampleAllocator::Array;
 
     CopyBuffer() = default;
     CopyBuffer(const CopyBuffer&) = delete;
