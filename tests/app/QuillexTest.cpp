@@ -179,14 +179,14 @@ TEST(Quillex, CopyBufferRefusesEmptyInputAndKeepsTheOldOne)
     EXPECT_EQ(frames, -7);
 
     std::vector<CopyBuffer::Samples> first;
-    first.push_back(std::make_unique<int16_t[]>(3));
+    first.push_back(CopyBuffer::Samples(new int16_t[3]()));
     first[0][1] = 42;
     const int16_t* held = first[0].get();
     ASSERT_TRUE(fixture.App().SetCopyBuffer(std::move(first), 3));
 
     EXPECT_FALSE(fixture.App().SetCopyBuffer({}, 5));
     std::vector<CopyBuffer::Samples> noFrames;
-    noFrames.push_back(std::make_unique<int16_t[]>(1));
+    noFrames.push_back(CopyBuffer::Samples(new int16_t[1]()));
     EXPECT_FALSE(fixture.App().SetCopyBuffer(std::move(noFrames), 0));
 
     ASSERT_TRUE(fixture.App().GetCopyBuffer(channels, count, frames));
@@ -201,8 +201,8 @@ TEST(Quillex, TwoReadsOfTheCopyBufferShareTheSampleArrays)
 {
     AppFixture fixture;
     std::vector<CopyBuffer::Samples> arrays;
-    arrays.push_back(std::make_unique<int16_t[]>(4));
-    arrays.push_back(std::make_unique<int16_t[]>(4));
+    arrays.push_back(CopyBuffer::Samples(new int16_t[4]()));
+    arrays.push_back(CopyBuffer::Samples(new int16_t[4]()));
     ASSERT_TRUE(fixture.App().SetCopyBuffer(std::move(arrays), 4));
     std::vector<const int16_t*> first, second;
     int32_t count = 0;
@@ -219,7 +219,7 @@ TEST(Quillex, TheApplicationBufferIsTheOneEditsFind)
     AppFixture fixture;
     ASSERT_NE(CopyBuffer::ApplicationBuffer(), nullptr);
     std::vector<CopyBuffer::Samples> arrays;
-    arrays.push_back(std::make_unique<int16_t[]>(2));
+    arrays.push_back(CopyBuffer::Samples(new int16_t[2]()));
     ASSERT_TRUE(fixture.App().SetCopyBuffer(std::move(arrays), 2));
     std::vector<const int16_t*> channels;
     int32_t count = 0;
