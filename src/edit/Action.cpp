@@ -18,9 +18,9 @@ Action::~Action() = default;
 
 SampleAllocator::Array Action::AllocateSamples(int64_t count)
 {
-    if (count < 1 || count > int64_t(UINT32_MAX))
+    if (count < 1)
         return nullptr;
-    return SampleAllocator::Shared().Allocate(size_t(count));
+    return Channel::Allocate(count);
 }
 
 status_t Action::InitCheck()

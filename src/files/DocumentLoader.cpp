@@ -41,9 +41,9 @@ using SampleArray = SampleAllocator::Array;
 /// one call rather than page by page while it is filled.
 SampleArray AllocateSamples(int64_t count)
 {
-    if (count <= 0 || count > int64_t(UINT32_MAX))
+    if (count <= 0)
         return nullptr;
-    return SampleAllocator::Shared().Allocate(size_t(count));
+    return Channel::Allocate(count);
 }
 
 /// Copies frames interleaved frames of channels samples into the arrays

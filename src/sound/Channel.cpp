@@ -30,7 +30,7 @@ void CopySamples(int16_t* destination, const int16_t* source, int64_t count)
 Channel::Channel() = default;
 Channel::~Channel() = default;
 
-Channel::SampleArray Channel::Allocate(int64_t count)
+SampleAllocator::Array Channel::Allocate(int64_t count)
 {
     if (count < 0 || count > int64_t(UINT32_MAX))
         return nullptr;

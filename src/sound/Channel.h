@@ -114,6 +114,11 @@ public:
     /// the document lock). Null for a channel that never held data.
     int16_t* Data();
 
+    /// An uninitialised array of count samples from the shared allocator, or
+    /// null when it cannot be had: arrays hold 0 to 2^32 - 1 samples. Every
+    /// array that may become a channel's, or a copy of one, comes from here.
+    static SampleAllocator::Array Allocate(int64_t count);
+
     /// Loading from a track stores the decoded rate here.
     void SetFrameRate(float rate);
 
@@ -122,9 +127,6 @@ private:
     /// shared SampleAllocator, or delete[] for adopted arrays.
     using SampleArray = SampleAllocator::Array;
 
-    /// An uninitialised array of count samples from the shared allocator, or
-    /// null when it cannot be had (arrays are limited to 2^32 - 1 samples).
-    static SampleArray Allocate(int64_t count);
     /// Which samples a request of count frames of the timeline from start
     /// copies: *length samples from *samples on go to index *offset of the
     /// request, the rest of it is silence. False, after printing "what
