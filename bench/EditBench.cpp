@@ -8,6 +8,8 @@
 
 #include <benchmark/benchmark.h>
 
+#include "BenchSupport.h"
+
 #include <chrono>
 #include <cstring>
 #include <memory>
@@ -23,29 +25,12 @@
 namespace glimmet {
 namespace {
 
+using bench::NoContainer;
+using bench::Seconds;
+
 constexpr int64_t kRate = 44100;
 constexpr int64_t kFrames = 3600 * kRate;
 constexpr int kChannels = 2;
-
-class NoContainer : public ChannelContainer {
-public:
-    int64_t CursorFrame() override { return cursor; }
-    int32_t FocusedChannel() override { return 0; }
-    int32_t CountChannelViews() override { return 0; }
-    ChannelView* ChannelViewAt(int32_t) override { return nullptr; }
-    ChannelView* AddChannel(Channel*) override { return nullptr; }
-    void AddChannelAt(Channel*, int32_t) override {}
-    void RemoveSampleView(ChannelView*) override {}
-    void RemoveSampleViewAt(int32_t) override {}
-    void UpdateAll() override {}
-
-    int64_t cursor = 0;
-};
-
-double Seconds(std::chrono::steady_clock::duration duration)
-{
-    return std::chrono::duration<double>(duration).count();
-}
 
 template <typename Function>
 double Timed(Function function)

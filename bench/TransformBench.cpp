@@ -12,6 +12,8 @@
 
 #include <benchmark/benchmark.h>
 
+#include "BenchSupport.h"
+
 #include <chrono>
 #include <cmath>
 #include <cstdlib>
@@ -31,21 +33,11 @@
 namespace glimmet {
 namespace {
 
+using bench::NoContainer;
+using bench::Seconds;
+
 constexpr int64_t kFrames = int64_t(3600) * 44100;
 constexpr int kChannels = 2;
-
-class NoContainer : public ChannelContainer {
-public:
-    int64_t CursorFrame() override { return 0; }
-    int32_t FocusedChannel() override { return 0; }
-    int32_t CountChannelViews() override { return 0; }
-    ChannelView* ChannelViewAt(int32_t) override { return nullptr; }
-    ChannelView* AddChannel(Channel*) override { return nullptr; }
-    void AddChannelAt(Channel*, int32_t) override {}
-    void RemoveSampleView(ChannelView*) override {}
-    void RemoveSampleViewAt(int32_t) override {}
-    void UpdateAll() override {}
-};
 
 /// A deterministic, quiet signal (peak well below full scale, so Maximize
 /// scales) with every value's sign represented.
@@ -56,11 +48,6 @@ void FillSignal(int16_t* samples, int64_t count, int channel)
         state = state * 1664525u + 1013904223u;
         samples[i] = int16_t(int32_t(state >> 16) % 12000);
     }
-}
-
-double Seconds(std::chrono::steady_clock::duration duration)
-{
-    return std::chrono::duration<double>(duration).count();
 }
 
 /// The selected data before and after one run, per channel.
