@@ -417,8 +417,6 @@ void ChannelManager::ReserveScratch(int32_t channelCount, int64_t frames)
     if (leftSum_.size() < size_t(frames)) {
         leftSum_.resize(size_t(frames));
         rightSum_.resize(size_t(frames));
-        integerLeft_.resize(size_t(frames));
-        integerRight_.resize(size_t(frames));
     }
 }
 
@@ -437,8 +435,18 @@ void ChannelManager::ZeroScratch(int32_t channelCount, int64_t frames, int64_t o
         std::fill_n(scratch_.data() + size_t(c) * size_t(frames) + offset, count, int16_t(0));
 }
 
-bool ChannelManager::SumChannels(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount)
+// The plain frame-by-frame float sum in channel order, for documents so
+// crowded that a side may have more contributors than an integer sum keeps
+// exact. Below that many it gives the very values the integer sums give:
+// every partial sum is a multiple of 1/32768 under 512 in size, which a
+// float holds exactly. Counts the contributors of each side.
+void ChannelManager::SumChannelsInFloat(int32_t channelCount, int64_t frames, int32_t* leftCount,
+    int32_t* rightCount)
 {
+    float* left = leftSum_.data();
+    float* right = rightSum_.data();
+    std::fill_n(left, frames, 0.0f);
+    std::fill_n(right, frames, 0.0f);
     *leftCount = 0;
     *rightCount = 0;
     for (int32_t c = 0; c < channelCount; ++c) {
@@ -447,42 +455,16 @@ bool ChannelManager::SumChannels(int32_t channelCount, int64_t frames, int32_t* 
         channels_[size_t(c)]->GetMixSettings(&muted, &pan);
         if (muted)
             continue;
-        const int16_t* samples = scratch_.data() + size_t(c) * size_t(frames);
-        if (pan == Channel::kPanMiddle || pan == Channel::kPanLeft) {
-            (*leftCount == 0 ? CopySamples : AddSamples)(samples, frames, integerLeft_.data());
-            ++*leftCount;
-        }
-        if (pan == Channel::kPanMiddle || pan == Channel::kPanRight) {
-            (*rightCount == 0 ? CopySamples : AddSamples)(samples, frames, integerRight_.data());
-            ++*rightCount;
-        }
-    }
-    if (*leftCount == 0)
-        std::fill_n(integerLeft_.data(), frames, 0);
-    if (*rightCount == 0)
-        std::fill_n(integerRight_.data(), frames, 0);
-    return *leftCount <= kExactIntegerSumLimit && *rightCount <= kExactIntegerSumLimit;
-}
-
-// The plain frame-by-frame float sum in channel order, for documents so
-// crowded that the integer sum might differ from it.
-void ChannelManager::SumChannelsInFloat(int32_t channelCount, int64_t frames)
-{
-    float* left = leftSum_.data();
-    float* right = rightSum_.data();
-    std::fill_n(left, frames, 0.0f);
-    std::fill_n(right, frames, 0.0f);
-    for (int32_t c = 0; c < channelCount; ++c) {
-        Channel* channel = channels_[size_t(c)].get();
-        if (channel->IsMuted())
-            continue;
-        const int8_t pan = channel->PanPosition();
+        const bool toLeft = pan == Channel::kPanMiddle || pan == Channel::kPanLeft;
+        const bool toRight = pan == Channel::kPanMiddle || pan == Channel::kPanRight;
+        *leftCount += toLeft;
+        *rightCount += toRight;
         const int16_t* samples = scratch_.data() + size_t(c) * size_t(frames);
         for (int64_t i = 0; i < frames; ++i) {
             const float value = float(samples[i]) * kSampleScale;
-            if (pan == Channel::kPanMiddle || pan == Channel::kPanLeft)
+            if (toLeft)
                 left[i] += value;
-            if (pan == Channel::kPanMiddle || pan == Channel::kPanRight)
+            if (toRight)
                 right[i] += value;
         }
     }
@@ -493,12 +475,7 @@ void ChannelManager::MixScratch(int32_t channelCount, int64_t frames, Sample* ou
 {
     int32_t leftCount = 0;
     int32_t rightCount = 0;
-    if (SumChannels(channelCount, frames, &leftCount, &rightCount)) {
-        WriteMix(leftCount, rightCount, integerLeft_.data(), integerRight_.data(), leftSum_.data(),
-            rightSum_.data(), frames, out);
-        return;
-    }
-    SumChannelsInFloat(channelCount, frames);
+    SumChannelsInFloat(channelCount, frames, &leftCount, &rightCount);
     for (int64_t i = 0; i < frames; ++i) {
         const float left = CombineSide(leftSum_[size_t(i)], leftCount);
         const float right = CombineSide(rightSum_[size_t(i)], rightCount);

@@ -111,11 +111,10 @@ private:
     void ReserveScratch(int32_t channelCount, int64_t frames);
     void FillScratch(int32_t channelCount, int64_t frames, int64_t from, int64_t offset, int64_t count);
     void ZeroScratch(int32_t channelCount, int64_t frames, int64_t offset, int64_t count);
-    /// Sums the scratch arrays of the heard channels into the integer sums of
-    /// each side and counts the channels heard on each. False when a side has
-    /// so many that only the float sum gives the exact mix.
-    bool SumChannels(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount);
-    void SumChannelsInFloat(int32_t channelCount, int64_t frames);
+    /// Sums the scratch arrays of the heard channels into the float sums of
+    /// each side, frame by frame in channel order, and counts the channels
+    /// heard on each.
+    void SumChannelsInFloat(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount);
     /// Mixes the scratch arrays into interleaved stereo frames.
     template <typename Sample>
     void MixScratch(int32_t channelCount, int64_t frames, Sample* out);
