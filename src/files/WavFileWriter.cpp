@@ -27,7 +27,6 @@ constexpr int kBytesPerFrame = WavFileWriter::kChannelCount * int(sizeof(int16_t
 // Names tried for the temporary file before giving up.
 constexpr int kTemporaryNameAttempts = 100;
 
-
 std::string RandomSuffix()
 {
     static thread_local std::mt19937_64 generator{std::random_device{}()};
