@@ -5,7 +5,6 @@
 #include <cstring>
 #include <vector>
 
-#include "edit/ChannelContainer.h"
 
 namespace glimmet::bench {
 
@@ -44,22 +43,5 @@ inline double Seconds(std::chrono::steady_clock::duration duration)
 {
     return std::chrono::duration<double>(duration).count();
 }
-
-/// A channel container without views, so that actions can be timed without
-/// widgets; the cursor is wherever the benchmark puts it.
-class NoContainer : public ChannelContainer {
-public:
-    int64_t CursorFrame() override { return cursor; }
-    int32_t FocusedChannel() override { return 0; }
-    int32_t CountChannelViews() override { return 0; }
-    ChannelView* ChannelViewAt(int32_t) override { return nullptr; }
-    ChannelView* AddChannel(Channel*) override { return nullptr; }
-    void AddChannelAt(Channel*, int32_t) override {}
-    void RemoveSampleView(ChannelView*) override {}
-    void RemoveSampleViewAt(int32_t) override {}
-    void UpdateAll() override {}
-
-    int64_t cursor = 0;
-};
 
 }  // namespace glimmet::bench

@@ -15,8 +15,8 @@
 #include <memory>
 #include <vector>
 
-#include "edit/ChannelContainer.h"
 #include "edit/CopyBuffer.h"
+#include "edit/EditPosition.h"
 #include "edit/PasteAction.h"
 #include "edit/RemoveAction.h"
 #include "sound/Channel.h"
@@ -25,7 +25,6 @@
 namespace glimmet {
 namespace {
 
-using bench::NoContainer;
 using bench::Seconds;
 
 constexpr int64_t kRate = 44100;
@@ -43,7 +42,7 @@ double Timed(Function function)
 /// A one-hour stereo document with both channels selected.
 struct Document {
     ChannelManager manager{nullptr};
-    NoContainer container;
+    EditPosition position;
 
     Document()
     {
@@ -64,7 +63,7 @@ struct Document {
             manager.ChannelAt(c)->SetSelected(selected);
         manager.SetRangeStart(start);
         manager.SetRangeEnd(end);
-        container.cursor = start;
+        position.SetCursorFrame(start);
     }
 };
 
@@ -81,7 +80,7 @@ void RunEdit(benchmark::State& state, Document& document, int64_t start, int64_t
         document.Select(start, end, selected);
         auto action = make();
         const double go = Timed([&] {
-            action->SetTo(&document.manager, &document.container);
+            action->SetTo(&document.manager, &document.position);
             action->Go();
         });
         goTotal += go;
@@ -133,7 +132,7 @@ void BM_PasteOneMinute(benchmark::State& state)
     Document& document = SharedDocument();
     const int64_t middle = kFrames / 2;
     RunEdit(state, document, -1, -1, false, [&document, middle] {
-        document.container.cursor = middle;
+        document.position.SetCursorFrame(middle);
         return std::make_unique<PasteAction>(nullptr);
     });
     CopyBuffer::SetApplicationBuffer(nullptr);

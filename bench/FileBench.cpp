@@ -17,11 +17,11 @@
 #include <memory>
 #include <string>
 
-#include "../tests/files/FakeDocumentWindow.h"
 #include "files/DocumentLoader.h"
 #include "files/DocumentSaver.h"
 #include "files/FrameWriter.h"
 #include "sound/Channel.h"
+#include "sound/ChannelManager.h"
 #include "sound/SampleAllocator.h"
 
 namespace {
@@ -152,15 +152,15 @@ void BM_OpenOneHourWav(benchmark::State& state)
         // machine falls on both alike. Only the opening is timed: closing a
         // document is no part of it (and ffmpeg never holds the data).
         for (int round = 0; round < kRounds; ++round) {
-            auto window = std::make_unique<test::FakeDocumentWindow>();
+            auto document = std::make_unique<ChannelManager>(nullptr);
             const int64_t before = ProcessMemory("VmRSS");
             ResetPeakMemory();
             const double seconds = SecondsOf([&] {
-                if (DocumentLoader::Load(file, *window) != B_OK)
+                if (DocumentLoader::Load(file, document.get(), false) != B_OK)
                     std::abort();
             });
-            peakRatio = double(ProcessMemory("VmHWM") - before) / double(DecodedBytes(window->manager));
-            window.reset();
+            peakRatio = double(ProcessMemory("VmHWM") - before) / double(DecodedBytes(*document));
+            document.reset();
             // Every round opens into fresh memory, as the first open of a
             // session does, instead of into the blocks the last round freed.
             SampleAllocator::Shared().ReleaseCached();
@@ -190,8 +190,8 @@ public:
 void BM_SaveOneHourWav(benchmark::State& state)
 {
     const auto& file = SourceFile();
-    test::FakeDocumentWindow window;
-    if (DocumentLoader::Load(file, window) != B_OK)
+    ChannelManager document(nullptr);
+    if (DocumentLoader::Load(file, &document, false) != B_OK)
         std::abort();
     const auto soxCopy = WorkDirectory::Path() / "sox-copy.wav";
     const auto ddCopy = WorkDirectory::Path() / "dd-copy.wav";
@@ -200,12 +200,12 @@ void BM_SaveOneHourWav(benchmark::State& state)
     std::vector<double> best;
     for (auto _ : state) {
         best = BestAlternating({
-            [&] { DocumentSaver::SaveFile(ourCopy, window); },
+            [&] { DocumentSaver::SaveFile(ourCopy, &document, nullptr); },
             Command("sox " + Quote(file) + " " + Quote(soxCopy)),
             // The floor for any save that survives a crash: the same bytes
             // copied and flushed to disk.
             Command("dd if=" + Quote(file) + " of=" + Quote(ddCopy) + " bs=1M conv=fsync status=none"),
-            [&] { DocumentSaver::WriteDocument(&window.manager, discard); },
+            [&] { DocumentSaver::WriteDocument(&document, discard); },
         });
         state.SetIterationTime(best[0]);
     }

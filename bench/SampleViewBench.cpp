@@ -45,7 +45,7 @@ struct Scene {
         // As in a document window: a zoom slider along the bottom.
         container = std::make_unique<ChannelContainerView>(&manager, new ZoomSlider(nullptr, 0, 0, 0), nullptr);
         container->resize(kContainerWidth, kContainerHeight);
-        view = container->AddChannel(manager.ChannelAt(0));
+        view = container->SampleViewAtIndex(0);
     }
 
     ChannelManager manager{nullptr};

@@ -22,7 +22,7 @@
 #include <memory>
 #include <vector>
 
-#include "edit/ChannelContainer.h"
+#include "edit/EditPosition.h"
 #include "edit/FadeInAction.h"
 #include "edit/MaximizeAction.h"
 #include "edit/RevertAction.h"
@@ -33,7 +33,6 @@
 namespace glimmet {
 namespace {
 
-using bench::NoContainer;
 using bench::Seconds;
 
 constexpr int64_t kFrames = int64_t(3600) * 44100;
@@ -103,7 +102,7 @@ template <typename T>
 void RunTransform(benchmark::State& state, const Check& check)
 {
     ChannelManager manager(nullptr);
-    NoContainer container;
+    EditPosition position;
     for (int c = 0; c < kChannels; c++) {
         auto* channel = new Channel();
         auto* samples = new int16_t[size_t(kFrames)];
@@ -135,7 +134,7 @@ void RunTransform(benchmark::State& state, const Check& check)
         T action(nullptr);
         SampleAllocator::Shared().ReleaseCached();
         auto begin = std::chrono::steady_clock::now();
-        action.SetTo(&manager, &container);
+        action.SetTo(&manager, &position);
         snapshotTotal += Seconds(std::chrono::steady_clock::now() - begin);
         snapshotBytes = action.SnapshotBytes();
 

@@ -13,7 +13,7 @@ extern "C" {
 #include <libavutil/log.h>
 }
 
-#include "FakeDocumentWindow.h"
+#include "RecordingTarget.h"
 #include "files/DocumentLoader.h"
 #include "files/MediaFile.h"
 #include "files/MediaFormat.h"
@@ -91,7 +91,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
         }
     }
     if (withinBudget) {
-        test::FakeDocumentWindow window;
+        test::RecordingTarget window;
         DocumentLoader::Load(InputPath(), window);
     }
     return 0;

@@ -496,13 +496,13 @@ void QuillexWindow::HandleActionGo()
 void QuillexWindow::HandleSampleMoved(const Message& message)
 {
     Channel* channel = nullptr;
-    ChannelView* view = nullptr;
+    void* view = nullptr;
     int64_t offset = 0;
     if (message.FindPointer("channel", &channel) != B_OK || message.FindPointer("sample view", &view) != B_OK
         || message.FindInt64("offset", &offset) != B_OK)
         return;
     auto action = std::make_unique<MoveSampleAction>(this);
-    action->SetTo(channel, view, offset);
+    action->SetTo(manager_, channel, offset);
     // A move is bound to its channel rather than to the range, so it skips
     // the common setup and runs at once.
     if (action->InitCheck() != B_OK || action->SupportsConfiguration())
@@ -768,11 +768,6 @@ status_t QuillexWindow::SetTo(const std::filesystem::path& file)
 status_t QuillexWindow::SaveFile(const std::filesystem::path& file)
 {
     return DocumentSaver::SaveFile(file, *this);
-}
-
-ChannelContainer* QuillexWindow::DocumentContainer()
-{
-    return containerView_;
 }
 
 void QuillexWindow::SetWindowTitle(const std::string& title)

@@ -25,7 +25,6 @@ class QMenuBar;
 namespace glimmet {
 
 class Action;
-class ChannelContainer;
 class ChannelContainerView;
 class ChannelManager;
 class HistoryManager;
@@ -68,7 +67,6 @@ public:
 
     // LoadTarget and SaveTarget: the window's thread, while it loads or saves.
     ChannelManager* DocumentManager() override { return manager_; }
-    ChannelContainer* DocumentContainer() override;
     bool IsAppendOnLoad() override { return appendOnLoad_; }
     void ReplaceFileEntry(const std::filesystem::path& entry) override { fileEntry_ = entry; }
     void SetWindowTitle(const std::string& title) override;

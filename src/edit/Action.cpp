@@ -5,7 +5,7 @@
 #include <mutex>
 #include <new>
 
-#include "edit/ChannelContainer.h"
+#include "edit/EditContext.h"
 #include "edit/RangeTransformer.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
@@ -25,29 +25,29 @@ SampleAllocator::Array Action::AllocateSamples(int64_t count)
 
 status_t Action::InitCheck()
 {
-    if (manager_ == nullptr || container_ == nullptr)
+    if (manager_ == nullptr || context_ == nullptr)
         return B_NO_INIT;
     return B_OK;
 }
 
-void Action::BindDocument(ChannelManager* manager, ChannelContainer* container)
+void Action::BindDocument(ChannelManager* manager, EditContext* context)
 {
     manager_ = manager;
-    container_ = container;
+    context_ = context;
 }
 
 void Action::CopyRangeAndCursor()
 {
     rangeStart_ = manager_->RangeStart();
     rangeEnd_ = manager_->RangeEnd();
-    cursor_ = container_->CursorFrame();
+    cursor_ = context_->CursorFrame();
 }
 
-status_t Action::SetTo(ChannelManager* manager, ChannelContainer* container)
+status_t Action::SetTo(ChannelManager* manager, EditContext* context)
 {
-    if (manager == nullptr || container == nullptr)
+    if (manager == nullptr || context == nullptr)
         return B_BAD_VALUE;
-    BindDocument(manager, container);
+    BindDocument(manager, context);
     CopyRangeAndCursor();
     frameCount_ = rangeEnd_ - rangeStart_ + 1;
     TakeSnapshot();

@@ -11,8 +11,8 @@
 namespace glimmet {
 
 class Channel;
-class ChannelContainer;
 class ChannelManager;
+class EditContext;
 class MessageTarget;
 
 /// One undoable change to a document.
@@ -31,11 +31,13 @@ public:
     Action(const Action&) = delete;
     Action& operator=(const Action&) = delete;
 
-    /// B_OK once SetTo bound a manager and a container, else B_NO_INIT.
+    /// B_OK once SetTo bound a document and an edit context, else B_NO_INIT.
     virtual status_t InitCheck();
-    /// Binds the action and snapshots the range of every selected channel.
-    /// B_BAD_VALUE, changing nothing, when either pointer is null.
-    virtual status_t SetTo(ChannelManager* manager, ChannelContainer* container);
+    /// Binds the action to the document and to where the user edits it (not
+    /// owned; both outlive the action), and snapshots the range of every
+    /// selected channel. B_BAD_VALUE, changing nothing, when either pointer
+    /// is null.
+    virtual status_t SetTo(ChannelManager* manager, EditContext* context);
     /// Performs the action; the base version does nothing and fails.
     virtual status_t Go();
     /// Writes the snapshot back and restores range and selection.
@@ -50,7 +52,7 @@ public:
 
     MessageTarget* Window() const { return window_; }
     ChannelManager* Manager() const { return manager_; }
-    ChannelContainer* Container() const { return container_; }
+    EditContext* Context() const { return context_; }
     int64_t RangeStart() const { return rangeStart_; }
     int64_t RangeEnd() const { return rangeEnd_; }
     int64_t Cursor() const { return cursor_; }
@@ -91,10 +93,10 @@ protected:
     void RestoreSelection(const RecordVisitor& visit);
     void RestoreRange();
 
-    /// Binds manager and container without a snapshot (actions that keep
+    /// Binds document and context without a snapshot (actions that keep
     /// their own undo data).
-    void BindDocument(ChannelManager* manager, ChannelContainer* container);
-    /// Copies the manager's range and the container's cursor, as SetTo does.
+    void BindDocument(ChannelManager* manager, EditContext* context);
+    /// Copies the document's range and the context's cursor, as SetTo does.
     void CopyRangeAndCursor();
 
     const std::vector<SavedChannel>& SavedChannels() const { return savedChannels_; }
@@ -109,7 +111,7 @@ private:
 
     MessageTarget* window_;
     ChannelManager* manager_ = nullptr;
-    ChannelContainer* container_ = nullptr;
+    EditContext* context_ = nullptr;
     int64_t rangeStart_ = 0;
     int64_t rangeEnd_ = 0;
     int64_t cursor_ = 0;

@@ -1,6 +1,5 @@
 #include "edit/AddChannelAction.h"
 
-#include "edit/ChannelContainer.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 
@@ -8,21 +7,20 @@ namespace glimmet {
 
 AddChannelAction::~AddChannelAction() = default;
 
-status_t AddChannelAction::SetTo(ChannelManager* manager, ChannelContainer* container)
+status_t AddChannelAction::SetTo(ChannelManager* manager, EditContext* context)
 {
-    if (manager == nullptr || container == nullptr)
+    if (manager == nullptr || context == nullptr)
         return B_BAD_VALUE;
-    BindDocument(manager, container);
+    BindDocument(manager, context);
     return B_OK;
 }
 
 status_t AddChannelAction::Go()
 {
-    if (Manager() == nullptr || Container() == nullptr)
+    if (Manager() == nullptr || Context() == nullptr)
         return B_ERROR;
     channel_ = new Channel();
     Manager()->AddChannel(channel_);
-    view_ = Container()->AddChannel(channel_);
     return B_OK;
 }
 
@@ -31,9 +29,6 @@ status_t AddChannelAction::Undo()
     if (Manager() == nullptr)
         return B_ERROR;
     owned_ = Manager()->RemoveChannel(channel_);
-    if (Container() != nullptr && view_ != nullptr)
-        Container()->RemoveSampleView(view_);
-    view_ = nullptr;
     return B_OK;
 }
 
@@ -44,7 +39,6 @@ status_t AddChannelAction::Redo()
     if (owned_ == nullptr)
         return B_OK;  // the channel never left the document
     Manager()->AddChannel(owned_.release());
-    view_ = Container()->AddChannel(channel_);
     return B_OK;
 }
 

@@ -6,30 +6,27 @@
 
 namespace glimmet {
 
-class ChannelView;
-
-/// "Add Channel": appends a new, empty channel to the document and shows it.
+/// "Add Channel": appends a new, empty channel to the document (whose views
+/// show it as they hear of it).
 class AddChannelAction : public Action {
 public:
     using Action::Action;
     ~AddChannelAction() override;
 
     /// Binds without a snapshot; B_BAD_VALUE for a null pointer.
-    status_t SetTo(ChannelManager* manager, ChannelContainer* container) override;
+    status_t SetTo(ChannelManager* manager, EditContext* context) override;
     status_t Go() override;
     /// Takes the channel out of the document; the action owns it until redo.
     status_t Undo() override;
-    /// Puts the same channel back at the end, with a new view.
+    /// Puts the same channel back at the end.
     status_t Redo() override;
     const char* Name() override;
     const char* PreferredMenu() override;
 
     Channel* AddedChannel() const { return channel_; }
-    ChannelView* View() const { return view_; }
 
 private:
     Channel* channel_ = nullptr;
-    ChannelView* view_ = nullptr;
     /// Holds the channel while it is outside the document.
     std::unique_ptr<Channel> owned_;
 };

@@ -1,26 +1,26 @@
 #include "edit/MoveSampleAction.h"
 
-#include "edit/ChannelView.h"
 #include "sound/Channel.h"
+#include "sound/ChannelManager.h"
 
 namespace glimmet {
 
 status_t MoveSampleAction::InitCheck()
 {
-    return channel_ != nullptr && view_ != nullptr ? B_OK : B_ERROR;
+    return channel_ != nullptr && Manager() != nullptr ? B_OK : B_ERROR;
 }
 
-status_t MoveSampleAction::SetTo(ChannelManager*, ChannelContainer*)
+status_t MoveSampleAction::SetTo(ChannelManager*, EditContext*)
 {
     return B_ERROR;
 }
 
-status_t MoveSampleAction::SetTo(Channel* channel, ChannelView* view, int64_t offset)
+status_t MoveSampleAction::SetTo(ChannelManager* manager, Channel* channel, int64_t offset)
 {
-    if (channel == nullptr || view == nullptr)
+    if (manager == nullptr || channel == nullptr)
         return B_BAD_VALUE;
+    BindDocument(manager, nullptr);
     channel_ = channel;
-    view_ = view;
     offset_ = offset;
     return B_OK;
 }
@@ -35,7 +35,7 @@ status_t MoveSampleAction::Shift(int64_t frames)
     if (InitCheck() != B_OK)
         return B_ERROR;
     channel_->SetStartFrameOffset(channel_->FirstFrame() + frames);
-    view_->Update();
+    Manager()->ChannelChanged(channel_);
     return B_OK;
 }
 

@@ -4,8 +4,6 @@
 
 namespace glimmet {
 
-class ChannelView;
-
 /// "Move Sample": records a channel the user has dragged along the time
 /// axis. The drag itself moved the channel; Go does nothing, undo and redo
 /// shift the channel's first frame by the recorded offset. Listed in no menu.
@@ -13,13 +11,13 @@ class MoveSampleAction : public Action {
 public:
     using Action::Action;
 
-    /// B_OK when a channel and its view are bound, else B_ERROR.
+    /// B_OK when a document and one of its channels are bound, else B_ERROR.
     status_t InitCheck() override;
     /// Moves are bound with the other SetTo: this one always fails.
-    status_t SetTo(ChannelManager* manager, ChannelContainer* container) override;
+    status_t SetTo(ChannelManager* manager, EditContext* context) override;
     /// offset is the channel's first frame before the move minus its first
-    /// frame after it. B_BAD_VALUE for a null channel or view.
-    status_t SetTo(Channel* channel, ChannelView* view, int64_t offset);
+    /// frame after it. B_BAD_VALUE for a null document or channel.
+    status_t SetTo(ChannelManager* manager, Channel* channel, int64_t offset);
     status_t Go() override;
     status_t Undo() override;
     status_t Redo() override;
@@ -32,7 +30,6 @@ private:
     status_t Shift(int64_t frames);
 
     Channel* channel_ = nullptr;
-    ChannelView* view_ = nullptr;
     int64_t offset_ = 0;
 };
 

@@ -1,9 +1,10 @@
 #include "edit/PasteAction.h"
 
+#include <algorithm>
 #include <cstdio>
 
-#include "edit/ChannelContainer.h"
 #include "edit/CopyBuffer.h"
+#include "edit/EditContext.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 
@@ -66,7 +67,8 @@ void PasteAction::PasteOverRange(const std::vector<const int16_t*>& buffers, int
 
 void PasteAction::InsertAtCursor(const std::vector<const int16_t*>& buffers, int64_t frames)
 {
-    firstChannel_ = Container()->FocusedChannel();
+    // With no channel focused, the paste starts at the first one.
+    firstChannel_ = std::max(Context()->FocusIndex(), 0);
     for (size_t i = 0; i < buffers.size(); i++) {
         Channel* channel = Manager()->ChannelAt(firstChannel_ + int32_t(i));
         if (channel == nullptr)

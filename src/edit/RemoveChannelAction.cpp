@@ -1,7 +1,6 @@
 #include "edit/RemoveChannelAction.h"
 
-#include "edit/ChannelContainer.h"
-#include "edit/ChannelView.h"
+#include "edit/EditContext.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 
@@ -9,51 +8,46 @@ namespace glimmet {
 
 RemoveChannelAction::~RemoveChannelAction() = default;
 
-status_t RemoveChannelAction::SetTo(ChannelManager* manager, ChannelContainer* container)
+status_t RemoveChannelAction::SetTo(ChannelManager* manager, EditContext* context)
 {
-    if (manager == nullptr || container == nullptr)
+    if (manager == nullptr || context == nullptr)
         return B_BAD_VALUE;
-    BindDocument(manager, container);
+    BindDocument(manager, context);
     return B_OK;
 }
 
 void RemoveChannelAction::RemoveAtIndex()
 {
     channel_ = Manager()->ChannelAt(index_);
-    Container()->RemoveSampleViewAt(index_);
     owned_ = Manager()->RemoveChannel(channel_);
 }
 
 status_t RemoveChannelAction::Go()
 {
-    if (Manager() == nullptr || Container() == nullptr)
+    if (Manager() == nullptr || Context() == nullptr)
         return B_ERROR;
-    for (int32_t i = 0; i < Container()->CountChannelViews(); i++) {
-        ChannelView* view = Container()->ChannelViewAt(i);
-        if (view != nullptr && view->IsFocus()) {
-            index_ = i;
-            RemoveAtIndex();
-            return B_OK;
-        }
+    const int32_t focus = Context()->FocusIndex();
+    if (focus >= 0 && focus < Manager()->CountChannels()) {
+        index_ = focus;
+        RemoveAtIndex();
     }
     return B_OK;
 }
 
 status_t RemoveChannelAction::Undo()
 {
-    if (Manager() == nullptr || Container() == nullptr)
+    if (Manager() == nullptr || Context() == nullptr)
         return B_ERROR;
     // A removal that found no focused view has nothing to put back.
     if (owned_ == nullptr)
         return B_OK;
     Manager()->AddChannel(owned_.release(), index_);
-    Container()->AddChannelAt(channel_, index_);
     return B_OK;
 }
 
 status_t RemoveChannelAction::Redo()
 {
-    if (Manager() == nullptr || Container() == nullptr)
+    if (Manager() == nullptr || Context() == nullptr)
         return B_ERROR;
     if (channel_ == nullptr)
         return B_OK;

@@ -14,7 +14,7 @@ public:
     ~RemoveChannelAction() override;
 
     /// Binds without a snapshot; B_BAD_VALUE for a null pointer.
-    status_t SetTo(ChannelManager* manager, ChannelContainer* container) override;
+    status_t SetTo(ChannelManager* manager, EditContext* context) override;
     status_t Go() override;
     /// Puts the channel back at its old position.
     status_t Undo() override;

@@ -25,11 +25,11 @@ std::unique_ptr<int16_t[]> CopyOf(Channel* channel, int64_t start, int64_t count
 
 }  // namespace
 
-status_t TruncateAction::SetTo(ChannelManager* manager, ChannelContainer* container)
+status_t TruncateAction::SetTo(ChannelManager* manager, EditContext* context)
 {
-    if (manager == nullptr || container == nullptr)
+    if (manager == nullptr || context == nullptr)
         return B_BAD_VALUE;
-    BindDocument(manager, container);
+    BindDocument(manager, context);
     CopyRangeAndCursor();
     std::lock_guard guard(manager->DocumentLock());
     records_.clear();

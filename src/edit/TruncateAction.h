@@ -16,7 +16,7 @@ public:
 
     /// Records, per selected channel, the frames before and after the
     /// range and the channel's first frame. B_BAD_VALUE for a null pointer.
-    status_t SetTo(ChannelManager* manager, ChannelContainer* container) override;
+    status_t SetTo(ChannelManager* manager, EditContext* context) override;
     /// B_ERROR when not bound. The range is left as it was.
     status_t Go() override;
     status_t Undo() override;

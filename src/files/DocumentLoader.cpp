@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <system_error>
 
-#include "edit/ChannelContainer.h"
 #include "files/FrameSpreader.h"
 #include "files/LoadTarget.h"
 #include "files/MediaFile.h"
@@ -93,57 +92,68 @@ int64_t Deinterleave(MediaTrack* track, int64_t capacity, std::vector<SampleArra
 
 status_t DocumentLoader::Load(const std::filesystem::path& file, LoadTarget& target)
 {
+    LoadReport report;
+    const status_t status = Load(file, target.DocumentManager(), target.IsAppendOnLoad(), &report);
+    if (!report.opened)
+        return status;
+    target.ReplaceFileEntry(report.entry);
+    const std::string name = report.entry.filename().string();
+    if (!target.IsAppendOnLoad() && !name.empty())
+        target.SetWindowTitle(kTitlePrefix + name);
+    for (int32_t track = 0; track < report.decodedTracks; ++track)
+        target.PostToSelf(kMsgShowAll);
+    return status;
+}
+
+status_t DocumentLoader::Load(const std::filesystem::path& file, ChannelManager* document, bool append,
+                              LoadReport* report)
+{
+    LoadReport ignored;
+    if (report == nullptr)
+        report = &ignored;
     MediaFile media(file);
     status_t status = media.InitCheck();
     if (status != B_OK)
         return status;
-
-    const std::filesystem::path entry = FollowLinks(file);
-    target.ReplaceFileEntry(entry);
-    const std::string name = entry.filename().string();
-    if (!target.IsAppendOnLoad() && !name.empty())
-        target.SetWindowTitle(kTitlePrefix + name);
+    report->opened = true;
+    report->entry = FollowLinks(file);
 
     for (int32_t index = 0;; ++index) {
         MediaTrack* track = media.TrackAt(index);
         if (track == nullptr)
             break;
-        LoadTrack(track, target, &status);
+        if (LoadTrack(track, document, append, &status))
+            report->decodedTracks++;
         media.ReleaseTrack(track);
     }
     return status;
 }
 
-void DocumentLoader::LoadTrack(MediaTrack* track, LoadTarget& target, status_t* status)
+bool DocumentLoader::LoadTrack(MediaTrack* track, ChannelManager* document, bool append, status_t* status)
 {
     media_format encoded;
     if (track->EncodedFormat(&encoded) != B_OK || !IsAudio(encoded))
-        return;
-    ChannelManager* manager = target.DocumentManager();
-    ChannelContainer* container = target.DocumentContainer();
-    if (manager == nullptr || container == nullptr)
-        return;
-    if (!target.IsAppendOnLoad())
-        EmptyDocument(target);
+        return false;
+    if (document == nullptr)
+        return false;
+    if (!append)
+        EmptyDocument(document);
 
     media_format decoded = ShortAudioRequest();
     *status = track->DecodedFormat(&decoded);
     if (*status != B_OK)
-        return;
+        return false;
     for (std::unique_ptr<Channel>& channel : LoadChannels(track, decoded)) {
-        if (channel == nullptr)
-            continue;
-        Channel* added = channel.release();
-        manager->AddChannel(added);
-        container->AddChannel(added);
+        if (channel != nullptr)
+            document->AddChannel(channel.release());
     }
-    target.PostToSelf(kMsgShowAll);
+    return true;
 }
 
-void DocumentLoader::EmptyDocument(LoadTarget& target)
+void DocumentLoader::EmptyDocument(ChannelManager* document)
 {
-    while (target.DocumentManager()->RemoveChannelAt(0))
-        target.DocumentContainer()->RemoveSampleViewAt(0);
+    while (document->RemoveChannelAt(0))
+        continue;
 }
 
 std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* track, const media_format& decoded)

@@ -10,14 +10,25 @@
 namespace glimmet {
 
 class Channel;
+class ChannelManager;
 class LoadTarget;
 class MediaTrack;
 struct media_format;
 
+/// What loading learnt of a file, for the window that shows the document.
+struct LoadReport {
+    /// The file could be opened (the document may still be unchanged).
+    bool opened = false;
+    /// The file with its links followed.
+    std::filesystem::path entry;
+    /// Audio tracks that agreed to a decoded format.
+    int32_t decodedTracks = 0;
+};
+
 /// Loads a sound file into a document: every channel of every audio track
-/// becomes a Channel of the document's manager and gets a strip in its
-/// container view. A window that implements LoadTarget loads a file with
-/// `return DocumentLoader::Load(path, *this);`, in its own thread.
+/// becomes a Channel of the document, whose views follow it. A window that
+/// implements LoadTarget loads a file with `return DocumentLoader::Load(path,
+/// *this);`, in its own thread.
 class DocumentLoader {
 public:
     /// Opens file and loads it into target. Returns the file's open status
@@ -27,6 +38,11 @@ public:
     /// document, so only the last audio track's channels remain. Each audio
     /// track that decodes posts 'shal' to the target, loaded channels or not.
     static status_t Load(const std::filesystem::path& file, LoadTarget& target);
+    /// The same for a document on its own: the channels go into document
+    /// (skipped when it is null), after its channels when append is set;
+    /// report (may be null) takes what the window would be told.
+    static status_t Load(const std::filesystem::path& file, ChannelManager* document, bool append,
+                         LoadReport* report = nullptr);
 
     /// The channels of an audio track from one decoding pass, in track order;
     /// a channel that could not be had (no frames, no memory) is null. The
@@ -37,9 +53,9 @@ public:
 
 private:
     /// Loads one track; *status takes the decoded-format result of an audio
-    /// track.
-    static void LoadTrack(MediaTrack* track, LoadTarget& target, status_t* status);
-    static void EmptyDocument(LoadTarget& target);
+    /// track. True when an audio track agreed to a decoded format.
+    static bool LoadTrack(MediaTrack* track, ChannelManager* document, bool append, status_t* status);
+    static void EmptyDocument(ChannelManager* document);
     static std::filesystem::path FollowLinks(const std::filesystem::path& file);
 };
 

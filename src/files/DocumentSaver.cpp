@@ -15,18 +15,29 @@ namespace glimmet {
 
 status_t DocumentSaver::SaveFile(const std::filesystem::path& file, SaveTarget& target)
 {
+    bool created = false;
+    const status_t status = SaveFile(file, target.DocumentManager(), target.DocumentHistory(), &created);
+    if (created)
+        target.SetSaveItemEnabled(false);
+    return status;
+}
+
+status_t DocumentSaver::SaveFile(const std::filesystem::path& file, ChannelManager* document,
+                                 HistoryManager* history, bool* created)
+{
     const std::filesystem::path destination = FollowLinks(file);
     WavFileWriter writer(destination);
     if (writer.InitCheck() == B_OK) {
         if (writer.CommitHeader() == B_OK) {
             // The file is written on a second thread while the mix goes on.
             AsyncFrameWriter background(writer);
-            WriteDocument(target.DocumentManager(), background);
+            WriteDocument(document, background);
             background.Close();
         }
-        if (HistoryManager* history = target.DocumentHistory())
+        if (history != nullptr)
             history->Save();
-        target.SetSaveItemEnabled(false);
+        if (created != nullptr)
+            *created = true;
     }
     const status_t released = writer.Finish();
     if (released != B_OK) {

@@ -9,6 +9,7 @@ namespace glimmet {
 
 class ChannelManager;
 class FrameWriter;
+class HistoryManager;
 class SaveTarget;
 
 /// Saves a document as a stereo, 16-bit, 44100 Hz WAV file: the whole mix of
@@ -28,6 +29,10 @@ public:
     /// Returns the result of setting the file's type attribute to
     /// "audio/x-wav", not that of the writing.
     static status_t SaveFile(const std::filesystem::path& file, SaveTarget& target);
+    /// The same for a document on its own: history (may be null) is marked
+    /// saved, and *created (may be null) set, once the file's track exists.
+    static status_t SaveFile(const std::filesystem::path& file, ChannelManager* document, HistoryManager* history,
+                             bool* created = nullptr);
 
     /// Mixes the whole document from frame 0 into writer, kFramesPerBuffer
     /// frames at a time, holding the document lock throughout; stops at the

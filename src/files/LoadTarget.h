@@ -8,7 +8,6 @@
 
 namespace glimmet {
 
-class ChannelContainer;
 class ChannelManager;
 
 /// What loading a sound file needs of the document window it loads into
@@ -18,12 +17,9 @@ class LoadTarget {
 public:
     virtual ~LoadTarget() = default;
 
-    /// The document's channels; null when the window has none, in which case
-    /// audio tracks are skipped.
+    /// The document the channels go into (its views follow it); null when
+    /// the window has none, in which case audio tracks are skipped.
     virtual ChannelManager* DocumentManager() = 0;
-    /// The view that shows one strip per channel; null when the window has
-    /// none, in which case audio tracks are skipped.
-    virtual ChannelContainer* DocumentContainer() = 0;
     /// The append-on-load flag: when set, the file's channels go after the
     /// existing ones and the title stays.
     virtual bool IsAppendOnLoad() = 0;

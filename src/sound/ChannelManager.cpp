@@ -6,10 +6,12 @@
 #include <type_traits>
 
 #include "sound/Channel.h"
+#include "sound/DocumentChange.h"
 #include "sound/DocumentWindow.h"
 #include "sound/SoftClip.h"
 #include "support/Message.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "support/VectorClones.h"
 
 namespace glimmet {
@@ -232,40 +234,79 @@ void ChannelManager::AddChannel(Channel* channel)
 {
     if (channel == nullptr)
         return;
-    std::lock_guard guard(lock_);
-    channels_.emplace_back(channel);
+    int32_t index;
+    {
+        std::lock_guard guard(lock_);
+        channels_.emplace_back(channel);
+        index = int32_t(channels_.size()) - 1;
+    }
+    NotifyChannel(DocumentChange::kChannelAdded, index);
 }
 
 bool ChannelManager::AddChannel(Channel* channel, int32_t index)
 {
     if (channel == nullptr)
         return false;
-    std::lock_guard guard(lock_);
-    if (index < 0 || size_t(index) > channels_.size())
-        return false;
-    channels_.emplace(channels_.begin() + index, channel);
+    {
+        std::lock_guard guard(lock_);
+        if (index < 0 || size_t(index) > channels_.size())
+            return false;
+        channels_.emplace(channels_.begin() + index, channel);
+    }
+    NotifyChannel(DocumentChange::kChannelAdded, index);
     return true;
 }
 
 std::unique_ptr<Channel> ChannelManager::RemoveChannel(Channel* channel)
 {
-    std::lock_guard guard(lock_);
-    auto found = std::find_if(channels_.begin(), channels_.end(),
-        [channel](const std::unique_ptr<Channel>& item) { return item.get() == channel; });
-    if (found == channels_.end() || channel == nullptr)
-        return nullptr;
-    std::unique_ptr<Channel> removed = std::move(*found);
-    channels_.erase(found);
+    std::unique_ptr<Channel> removed;
+    int32_t index;
+    {
+        std::lock_guard guard(lock_);
+        auto found = std::find_if(channels_.begin(), channels_.end(),
+            [channel](const std::unique_ptr<Channel>& item) { return item.get() == channel; });
+        if (found == channels_.end() || channel == nullptr)
+            return nullptr;
+        index = int32_t(found - channels_.begin());
+        removed = std::move(*found);
+        channels_.erase(found);
+    }
+    NotifyChannel(DocumentChange::kChannelRemoved, index);
     return removed;
 }
 
 bool ChannelManager::RemoveChannelAt(int32_t index)
 {
-    std::lock_guard guard(lock_);
-    if (index < 0 || size_t(index) >= channels_.size())
-        return false;
-    channels_.erase(channels_.begin() + index);
+    // The channel is freed only after the listeners have let go of it.
+    std::unique_ptr<Channel> removed;
+    {
+        std::lock_guard guard(lock_);
+        if (index < 0 || size_t(index) >= channels_.size())
+            return false;
+        removed = std::move(channels_[size_t(index)]);
+        channels_.erase(channels_.begin() + index);
+    }
+    NotifyChannel(DocumentChange::kChannelRemoved, index);
     return true;
+}
+
+void ChannelManager::NotifyChannel(uint32_t change, int32_t index)
+{
+    Message data;
+    data.AddInt32(kFieldIndex, index);
+    listeners_.Notify(change, &data);
+}
+
+void ChannelManager::ChannelChanged(Channel* channel)
+{
+    const int32_t index = IndexOf(channel);
+    if (index >= 0)
+        NotifyChannel(DocumentChange::kChannelData, index);
+}
+
+void ChannelManager::ChannelsChanged()
+{
+    listeners_.Notify(DocumentChange::kChannelData);
 }
 
 int32_t ChannelManager::CountChannels()

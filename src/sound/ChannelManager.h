@@ -5,6 +5,7 @@
 #include <memory>
 #include <vector>
 
+#include "sound/Observable.h"
 #include "support/Locker.h"
 
 namespace glimmet {
@@ -15,6 +16,10 @@ class DocumentWindow;
 /// The document's sound: its ordered channels, frame rate, range, play mode,
 /// loop flag and play position, and the mixer that turns the channels into
 /// stereo for playback (float) and for saving (16-bit).
+///
+/// The document tells its listeners what changed (DocumentChange masks):
+/// loading, actions and views change the document only, and the views follow
+/// it by listening.
 ///
 /// The channel list is guarded by the document lock (Lock/Unlock). The range,
 /// current frame, play mode, loop flag and rate are plain values read without
@@ -77,6 +82,15 @@ public:
 
     DocumentWindow* Window() const { return window_; }
 
+    /// Where listeners subscribe to the DocumentChange masks. GUI thread.
+    Observable& Listeners() { return listeners_; }
+    /// Tells the listeners that the channel's samples, first frame, mute,
+    /// pan or selection changed; nothing for a channel not in the document.
+    /// Call without holding the document lock.
+    void ChannelChanged(Channel* channel);
+    /// The same for every channel at once.
+    void ChannelsChanged();
+
     /// Playback mix: frames interleaved stereo float frames from the current
     /// frame within the play range, looping or posting a stop at its end.
     /// False, writing nothing, when the play range is shorter than the buffer.
@@ -118,6 +132,7 @@ private:
     /// Mixes the scratch arrays into interleaved stereo frames.
     template <typename Sample>
     void MixScratch(int32_t channelCount, int64_t frames, Sample* out);
+    void NotifyChannel(uint32_t change, int32_t index);
     void PostToWindow(uint32_t what, const char* field = nullptr, int64_t value = 0);
 
     // Guarded by lock_.
@@ -130,6 +145,7 @@ private:
     std::vector<uint8_t> sides_;
 
     DocumentWindow* window_;
+    Observable listeners_;
     std::atomic<float> frameRate_{44100.0f};
     std::atomic<int64_t> currentFrame_{0};
     std::atomic<int32_t> playMode_{kPlayAll};

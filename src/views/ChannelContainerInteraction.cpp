@@ -316,7 +316,7 @@ void ChannelContainerView::StopMoving()
         // the opposite of the distance moved.
         Message message(kMsgSampleMoved);
         message.AddPointer("channel", channel);
-        message.AddPointer("sample view", static_cast<ChannelView*>(SampleViewAtIndex(movingChannel_)));
+        message.AddPointer("sample view", SampleViewAtIndex(movingChannel_));
         message.AddInt64("offset", moveStartFrame_ - channel->FirstFrame());
         window_->PostMessage(message);
     }

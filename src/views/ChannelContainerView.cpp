@@ -8,8 +8,10 @@
 
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "sound/DocumentChange.h"
 #include "sound/DocumentWindow.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "views/PixelCanvas.h"
 #include "views/SampleView.h"
 #include "views/ZoomSlider.h"
@@ -64,9 +66,18 @@ ChannelContainerView::ChannelContainerView(ChannelManager* manager, ZoomSlider* 
     if (zoomSlider_ != nullptr)
         zoomSlider_->setParent(this);
     UpdateSizeLimits();
+    if (manager_ != nullptr) {
+        for (int32_t i = 0; Channel* channel = manager_->ChannelAt(i); i++)
+            AddChannelAt(channel, i);
+        manager_->Listeners().Subscribe(static_cast<Observer*>(this), DocumentChange::kAll);
+    }
 }
 
-ChannelContainerView::~ChannelContainerView() = default;
+ChannelContainerView::~ChannelContainerView()
+{
+    if (manager_ != nullptr)
+        manager_->Listeners().Unsubscribe(static_cast<Observer*>(this));
+}
 
 float ChannelContainerView::Width() const
 {
@@ -128,21 +139,21 @@ int32_t ChannelContainerView::IndexOf(const SampleView* view) const
 // Deliberately 0, not -1, when no view has the focus.
 int32_t ChannelContainerView::FocusedChannel()
 {
+    return std::max(FocusIndex(), 0);
+}
+
+int32_t ChannelContainerView::FocusIndex()
+{
     for (size_t i = 0; i < sampleViews_.size(); ++i) {
         if (sampleViews_[i]->IsFocus())
             return int32_t(i);
     }
-    return 0;
+    return -1;
 }
 
 int32_t ChannelContainerView::CountChannelViews()
 {
     return int32_t(sampleViews_.size());
-}
-
-ChannelView* ChannelContainerView::ChannelViewAt(int32_t index)
-{
-    return SampleViewAtIndex(index);
 }
 
 void ChannelContainerView::SetDisplayRange(int64_t first, int64_t last)
@@ -345,11 +356,21 @@ void ChannelContainerView::RangeChanged()
     }
 }
 
-SampleView* ChannelContainerView::AddChannel(Channel* channel)
+void ChannelContainerView::ObserverNotified(Observable*, uint32_t mask, const Message* data)
 {
-    auto* view = new SampleView(channel, this, this);
-    InsertSampleView(view, int32_t(sampleViews_.size()));
-    return view;
+    int32_t index = -1;
+    if (data != nullptr)
+        data->FindInt32(kFieldIndex, &index);
+    if (mask & DocumentChange::kChannelRemoved)
+        RemoveSampleViewAt(index);
+    if (mask & DocumentChange::kChannelAdded)
+        AddChannelAt(manager_->ChannelAt(index), index);
+    if (mask & DocumentChange::kChannelData) {
+        if (SampleView* view = SampleViewAtIndex(index))
+            view->Update();
+        else if (index < 0)
+            UpdateAll();
+    }
 }
 
 void ChannelContainerView::AddChannelAt(Channel* channel, int32_t index)
@@ -370,15 +391,6 @@ void ChannelContainerView::InsertSampleView(SampleView* view, int32_t index)
     UpdateSizeLimits();
     LayoutChildren();
     update();
-}
-
-void ChannelContainerView::RemoveSampleView(ChannelView* view)
-{
-    const auto found = std::find_if(sampleViews_.begin(), sampleViews_.end(),
-                                    [view](SampleView* candidate) { return candidate == view; });
-    if (found == sampleViews_.end())
-        return;
-    RemoveSampleViewAt(int32_t(found - sampleViews_.begin()));
 }
 
 void ChannelContainerView::RemoveSampleViewAt(int32_t index)

@@ -8,7 +8,8 @@
 #include <QMenu>
 #include <QWidget>
 
-#include "edit/ChannelContainer.h"
+#include "edit/EditContext.h"
+#include "sound/Observer.h"
 #include "views/MessageView.h"
 #include "views/FrameMapping.h"
 #include "views/SampleView.h"
@@ -35,9 +36,12 @@ class ZoomSlider;
 /// end of a move, 'pmup' after a play mark update, 'remc' from the context
 /// menu. It posts 'dprs' to the zoom slider after a display range change.
 ///
+/// It follows the document: a view comes and goes with each channel the
+/// manager announces, and a channel whose data changed is redrawn.
+///
 /// GUI thread only. The manager, the window and the channels are not owned;
 /// the zoom slider and the sample views are child widgets.
-class ChannelContainerView : public MessageView, public ChannelContainer {
+class ChannelContainerView : public MessageView, public EditContext, public Observer {
     Q_OBJECT
 
 public:
@@ -59,9 +63,10 @@ public:
     /// Null when index is out of range.
     SampleView* SampleViewAtIndex(int32_t index) const;
     int32_t IndexOf(const SampleView* view) const;
-    int32_t FocusedChannel() override;
-    int32_t CountChannelViews() override;
-    ChannelView* ChannelViewAt(int32_t index) override;
+    /// Index of the first channel view that has the focus; 0 when none has.
+    int32_t FocusedChannel();
+    int32_t FocusIndex() override;
+    int32_t CountChannelViews();
     ZoomSlider* GetZoomSlider() const { return zoomSlider_; }
     ChannelManager* Manager() const { return manager_; }
     DocumentWindow* Window() const { return window_; }
@@ -97,12 +102,10 @@ public:
     /// Redraws the view of every selected channel.
     void RangeChanged();
 
-    // Children.
-    SampleView* AddChannel(Channel* channel) override;
-    void AddChannelAt(Channel* channel, int32_t index) override;
-    void RemoveSampleView(ChannelView* view) override;
-    void RemoveSampleViewAt(int32_t index) override;
-    void UpdateAll() override;
+    /// Redraws every channel view.
+    void UpdateAll();
+    /// Views for added and removed channels; a redraw for changed data.
+    void ObserverNotified(Observable* source, uint32_t mask, const Message* data) override;
 
     // Mouse interaction; points are in the coordinates named.
     /// A mouse-down in a sample view (view coordinates).
@@ -148,6 +151,8 @@ private:
     void DrawEmptyState(QPainter& painter);
     void WidenToOneFramePerColumn();
     void UpdateSizeLimits();
+    void AddChannelAt(Channel* channel, int32_t index);
+    void RemoveSampleViewAt(int32_t index);
     void InsertSampleView(SampleView* view, int32_t index);
     void RedrawColumns(SampleView* view, float left, float right);
     void RedrawColumnInAll(float x);

@@ -5,7 +5,6 @@
 
 #include <QImage>
 
-#include "edit/ChannelView.h"
 #include "views/MessageView.h"
 
 namespace glimmet {
@@ -25,7 +24,7 @@ class ChannelContainerView;
 /// re-renders the whole view.
 ///
 /// GUI thread only. The channel and container are not owned.
-class SampleView : public MessageView, public ChannelView {
+class SampleView : public MessageView {
     Q_OBJECT
 
 public:
@@ -45,11 +44,11 @@ public:
     void FrameResized(float width, float height);
 
     /// Re-renders the whole view.
-    void Update() override;
+    void Update();
     /// Re-renders the columns of rect (always over the full height) and
     /// schedules a repaint of it.
     void Update(ViewRect rect);
-    bool IsFocus() const override;
+    bool IsFocus() const;
 
     /// The off-screen image: one pixel per view pixel, null when it could not
     /// be made.

@@ -109,7 +109,7 @@ TEST(EditCommands, AFinishedMoveBecomesAnUndoableMove)
     AppFixture fixture;
     QuillexWindow* window = LoadedWindow(fixture, 1, 100);
     Channel* channel = window->Manager()->ChannelAt(0);
-    ChannelView* view = window->ContainerView()->ChannelViewAt(0);
+    SampleView* view = window->ContainerView()->SampleViewAtIndex(0);
     channel->SetStartFrameOffset(40);  // where the drag left it
     Message moved(kMsgSampleMoved);
     moved.AddPointer("channel", channel);

@@ -42,7 +42,7 @@ TEST(ActionTest, SetToWithANullPointerFailsAndBindsNothing)
 {
     TestDocument document;
     Action action(nullptr);
-    EXPECT_EQ(action.SetTo(nullptr, &document.container), B_BAD_VALUE);
+    EXPECT_EQ(action.SetTo(nullptr, &document.position), B_BAD_VALUE);
     EXPECT_EQ(action.SetTo(&document.manager, nullptr), B_BAD_VALUE);
     EXPECT_EQ(action.InitCheck(), B_NO_INIT);
     EXPECT_EQ(action.Manager(), nullptr);
@@ -55,9 +55,9 @@ TEST(ActionTest, SetToSnapshotsTheRangeOfTheSelectedChannels)
     document.AddChannel({6, 7, 8, 9, 10}, 0, false);
     document.AddChannel({11, 12, 13, 14, 15}, 0, true);
     document.SetRange(1, 3);
-    document.container.cursor = 4;
+    document.position.SetCursorFrame(4);
     Action action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     EXPECT_EQ(action.InitCheck(), B_OK);
     EXPECT_EQ(action.RangeStart(), 1);
     EXPECT_EQ(action.RangeEnd(), 3);
@@ -77,7 +77,7 @@ TEST(ActionTest, UndoWritesTheSnapshotBackAndWalksTheSelection)
     document.AddChannel({21, 22, 23, 24, 25}, 0, false);
     document.SetRange(1, 2);
     CountingAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     const DocumentState before = document.State();
 
     // Change data, selection and range behind the action's back.
@@ -113,7 +113,7 @@ TEST(ActionTest, UndoWithoutSelectedChannelsOnlyResetsTheRange)
     document.AddChannel({4, 5, 6}, 0, false);
     document.SetRange(0, 1);
     CountingAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     EXPECT_EQ(action.SavedChannelCount(), 0);
     EXPECT_EQ(action.SnapshotBytes(), 0);
     document.Select({true, true});
@@ -134,7 +134,7 @@ TEST(ActionTest, RedoRestoresRangeAndSelectionThenRunsGo)
     document.AddChannel({7, 8, 9}, 0, true);
     document.SetRange(0, 1);
     CountingAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     document.Select({false, true, false});
     document.SetRange(2, 2);
     const int16_t changed[2] = {100, 100};
@@ -158,7 +158,7 @@ TEST(ActionTest, BaseRedoReportsTheFailureOfTheBaseGo)
     document.AddChannel({1, 2, 3});
     document.SetRange(0, 1);
     Action action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     EXPECT_EQ(action.Redo(), B_ERROR);
 }
 
@@ -169,7 +169,7 @@ TEST(ActionTest, SnapshotOfARangePastTheDataHoldsSilence)
     document.AddChannel({4, 5, 6, 7, 8, 9}, 0, false);
     document.SetRange(2, 5);
     CountingAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     EXPECT_EQ(action.SnapshotBytes(), 4 * 2);
     ASSERT_EQ(action.Undo(), B_OK);
     // The zeros read past the end are written back over the range.

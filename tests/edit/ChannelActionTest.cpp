@@ -21,34 +21,32 @@ TEST(AddChannelActionTest, NamesAndBinding)
     EXPECT_EQ(action.Undo(), B_ERROR);
     EXPECT_EQ(action.Redo(), B_ERROR);
     TestDocument document;
-    EXPECT_EQ(action.SetTo(nullptr, &document.container), B_BAD_VALUE);
-    EXPECT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    EXPECT_EQ(action.SetTo(nullptr, &document.position), B_BAD_VALUE);
+    EXPECT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     EXPECT_EQ(action.SavedChannelCount(), 0);
 }
 
-TEST(AddChannelActionTest, AppendsAnEmptyChannelWithAView)
+TEST(AddChannelActionTest, AppendsAnEmptyChannelAndAnnouncesIt)
 {
     TestDocument document;
     document.AddChannel({1, 2, 3});
     AddChannelAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     ASSERT_EQ(document.manager.CountChannels(), 2);
     Channel* added = document.manager.ChannelAt(1);
     EXPECT_EQ(added, action.AddedChannel());
     EXPECT_EQ(added->FrameCount(), 0);
-    EXPECT_EQ(document.container.CountChannelViews(), 2);
-    EXPECT_EQ(document.container.View(1)->channel, added);
-    EXPECT_EQ(action.View(), document.container.View(1));
+    EXPECT_EQ(document.mirror.Count(), 2);
+    EXPECT_EQ(document.mirror.shown[1], added);
 
     ASSERT_EQ(action.Undo(), B_OK);
     EXPECT_EQ(document.manager.CountChannels(), 1);
-    EXPECT_EQ(document.container.CountChannelViews(), 1);
-    EXPECT_EQ(action.View(), nullptr);
+    EXPECT_EQ(document.mirror.Count(), 1);
 
     ASSERT_EQ(action.Redo(), B_OK);
     EXPECT_EQ(document.manager.ChannelAt(1), added);
-    EXPECT_EQ(document.container.CountChannelViews(), 2);
+    EXPECT_EQ(document.mirror.Count(), 2);
 }
 
 TEST(AddChannelActionTest, AddUndoAndDeleteHistoryDeletesTheChannel)
@@ -58,7 +56,7 @@ TEST(AddChannelActionTest, AddUndoAndDeleteHistoryDeletesTheChannel)
     TestDocument document;
     HistoryManager history;
     auto* action = new AddChannelAction(nullptr);
-    ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(history.AddAction(action), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     ASSERT_EQ(history.Undo(), B_OK);
@@ -71,7 +69,7 @@ TEST(AddChannelActionTest, AddUndoRedoAndDeleteHistoryKeepsTheChannel)
     TestDocument document;
     HistoryManager history;
     auto* action = new AddChannelAction(nullptr);
-    ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(history.AddAction(action), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     Channel* added = action->AddedChannel();
@@ -91,12 +89,12 @@ TEST(AddChannelActionTest, AddThenUndoneAddDiscardedByANewActionFreesIt)
     TestDocument document;
     HistoryManager history;
     auto* first = new AddChannelAction(nullptr);
-    ASSERT_EQ(first->SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(first->SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(history.AddAction(first), B_OK);
     ASSERT_EQ(first->Go(), B_OK);
     ASSERT_EQ(history.Undo(), B_OK);
     auto* second = new AddChannelAction(nullptr);
-    ASSERT_EQ(second->SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(second->SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(history.AddAction(second), B_OK);
     ASSERT_EQ(second->Go(), B_OK);
     EXPECT_EQ(document.manager.CountChannels(), 1);
@@ -121,22 +119,22 @@ TEST(RemoveChannelActionTest, RemovesTheFocusedChannelAndUndoPutsItBack)
     document.AddChannel({1, 2});
     document.AddChannel({3, 4});
     document.AddChannel({5, 6});
-    document.container.View(1)->focus = true;
+    document.position.SetFocusIndex(1);
     const DocumentState before = document.State();
     Channel* middle = document.manager.ChannelAt(1);
     RemoveChannelAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     EXPECT_EQ(action.Index(), 1);
     EXPECT_EQ(action.RemovedChannel(), middle);
     ASSERT_EQ(document.manager.CountChannels(), 2);
-    EXPECT_EQ(document.container.CountChannelViews(), 2);
+    EXPECT_EQ(document.mirror.Count(), 2);
     EXPECT_EQ(document.State().channels[1].samples, (std::vector<int16_t>{5, 6}));
 
     ASSERT_EQ(action.Undo(), B_OK);
     EXPECT_EQ(document.State(), before);
     EXPECT_EQ(document.manager.ChannelAt(1), middle);
-    EXPECT_EQ(document.container.View(1)->channel, middle);
+    EXPECT_EQ(document.mirror.shown[1], middle);
 
     ASSERT_EQ(action.Redo(), B_OK);
     EXPECT_EQ(document.manager.CountChannels(), 2);
@@ -151,14 +149,14 @@ TEST(RemoveChannelActionTest, WithoutAFocusedViewNothingHappensAndUndoIsHarmless
     const DocumentState before = document.State();
     HistoryManager history;
     auto* action = new RemoveChannelAction(nullptr);
-    ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(history.AddAction(action), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     EXPECT_EQ(document.State(), before);
     EXPECT_STREQ(history.UndoName(), "Remove Channel");
     EXPECT_EQ(history.Undo(), B_OK);
     EXPECT_EQ(document.State(), before);
-    EXPECT_EQ(document.container.CountChannelViews(), 2);
+    EXPECT_EQ(document.mirror.Count(), 2);
     EXPECT_EQ(history.Redo(), B_OK);
     EXPECT_EQ(document.State(), before);
 }
@@ -168,10 +166,10 @@ TEST(RemoveChannelActionTest, RemovedChannelIsFreedWithTheHistory)
     // LeakSanitizer checks that the channel outside the document is freed.
     TestDocument document;
     document.AddChannel({1, 2});
-    document.container.View(0)->focus = true;
+    document.position.SetFocusIndex(0);
     HistoryManager history;
     auto* action = new RemoveChannelAction(nullptr);
-    ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(history.AddAction(action), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     history.Clear();
@@ -187,11 +185,11 @@ TEST(MoveSampleActionTest, BindingAndNames)
     EXPECT_EQ(action.Undo(), B_ERROR);
     EXPECT_EQ(action.Redo(), B_ERROR);
     TestDocument document;
-    EXPECT_EQ(action.SetTo(&document.manager, &document.container), B_ERROR);
+    EXPECT_EQ(action.SetTo(&document.manager, &document.position), B_ERROR);
     Channel* channel = document.AddChannel({1, 2, 3});
-    EXPECT_EQ(action.SetTo(channel, nullptr, 5), B_BAD_VALUE);
-    EXPECT_EQ(action.SetTo(nullptr, document.container.View(0), 5), B_BAD_VALUE);
-    EXPECT_EQ(action.SetTo(channel, document.container.View(0), 5), B_OK);
+    EXPECT_EQ(action.SetTo(&document.manager, nullptr, 5), B_BAD_VALUE);
+    EXPECT_EQ(action.SetTo(nullptr, channel, 5), B_BAD_VALUE);
+    EXPECT_EQ(action.SetTo(&document.manager, channel, 5), B_OK);
     EXPECT_EQ(action.InitCheck(), B_OK);
     EXPECT_EQ(action.Go(), B_OK);
 }
@@ -204,21 +202,21 @@ TEST(MoveSampleActionTest, UndoThenRedoRestoresTheDraggedPosition)
     channel->SetStartFrameOffset(40);
     HistoryManager history;
     auto* action = new MoveSampleAction(nullptr);
-    ASSERT_EQ(action->SetTo(channel, document.container.View(0), 0 - 40), B_OK);
+    ASSERT_EQ(action->SetTo(&document.manager, channel, 0 - 40), B_OK);
     ASSERT_EQ(history.AddAction(action), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     EXPECT_EQ(channel->FirstFrame(), 40);
 
     ASSERT_EQ(history.Undo(), B_OK);
     EXPECT_EQ(channel->FirstFrame(), 0);
-    EXPECT_EQ(document.container.View(0)->updates, 1);
+    EXPECT_EQ(document.mirror.updates[0], 1);
     // A second undo in a row is impossible: the move is on the redo stack.
     EXPECT_EQ(history.Undo(), B_ERROR);
     EXPECT_EQ(channel->FirstFrame(), 0);
 
     ASSERT_EQ(history.Redo(), B_OK);
     EXPECT_EQ(channel->FirstFrame(), 40);
-    EXPECT_EQ(document.container.View(0)->updates, 2);
+    EXPECT_EQ(document.mirror.updates[0], 2);
 }
 
 }  // namespace

@@ -399,8 +399,8 @@ TEST_P(EditSequenceTest, RandomEditsUndosAndRedosFollowTheModel)
                 model.SetRangeStart(start);
                 model.SetRangeEnd(end);
             }
-            document.container.cursor = kind == Kind::Paste && pick(0, 1) == 0 ? model.s.rangeStart : pick(0, total);
-            document.container.focused = int32_t(pick(0, 2));
+            document.position.SetCursorFrame(kind == Kind::Paste && pick(0, 1) == 0 ? model.s.rangeStart : pick(0, total));
+            document.position.SetFocusIndex(int32_t(pick(0, 2)));
             std::unique_ptr<Action> action = MakeAction(kind);
             Record record;
             if (kind == Kind::Move) {
@@ -411,13 +411,13 @@ TEST_P(EditSequenceTest, RandomEditsUndosAndRedosFollowTheModel)
                 const int64_t after = pick(0, 25);
                 channel->SetStartFrameOffset(after);
                 model.s.channels[size_t(c)].first = after;
-                ASSERT_EQ(static_cast<MoveSampleAction*>(action.get())->SetTo(channel, document.container.View(size_t(c)), before - after), B_OK);
+                ASSERT_EQ(static_cast<MoveSampleAction*>(action.get())->SetTo(&document.manager, channel, before - after), B_OK);
                 record.kind = kind;
                 record.channel = c;
                 record.offset = before - after;
             } else {
-                ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
-                record = model.Bind(kind, document.container.cursor, document.container.focused);
+                ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
+                record = model.Bind(kind, document.position.CursorFrame(), document.position.FocusIndex());
             }
             Action* raw = action.get();
             ASSERT_EQ(history.AddAction(action.release()), B_OK);

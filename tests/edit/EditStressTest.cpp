@@ -58,13 +58,10 @@ std::pair<DocumentState, DocumentState> RunSequence(bool withPlayback, int64_t* 
                 channel->SetSelected(pick(0, 1) == 1);
             const int64_t start = pick(0, 20000);
             document.SetRange(start, start + pick(0, 3000));
-            document.container.cursor = pick(0, 20000);
-            if (document.container.CountChannelViews() > 0) {
-                for (auto& view : document.container.views)
-                    view->focus = false;
-                document.container.View(size_t(pick(0, document.container.CountChannelViews() - 1)))->focus
-                    = pick(0, 1) == 1;
-            }
+            document.position.SetCursorFrame(pick(0, 20000));
+            // Sometimes one channel has the focus, sometimes none.
+            const int32_t count = document.mirror.Count();
+            document.position.SetFocusIndex(count > 0 && pick(0, 1) == 1 ? int32_t(pick(0, count - 1)) : -1);
             std::unique_ptr<Action> action;
             switch (pick(0, 4)) {
             case 0: action = std::make_unique<PasteAction>(nullptr); break;
@@ -73,7 +70,7 @@ std::pair<DocumentState, DocumentState> RunSequence(bool withPlayback, int64_t* 
             case 3: action = std::make_unique<AddChannelAction>(nullptr); break;
             default: action = std::make_unique<RemoveChannelAction>(nullptr); break;
             }
-            action->SetTo(&document.manager, &document.container);
+            action->SetTo(&document.manager, &document.position);
             Action* raw = action.get();
             history.AddAction(action.release());
             raw->Go();
@@ -82,6 +79,8 @@ std::pair<DocumentState, DocumentState> RunSequence(bool withPlayback, int64_t* 
         } else {
             history.Redo();
         }
+        // Whatever the step did to the channel list, it was announced.
+        EXPECT_EQ(document.mirror.shown, document.mirror.DocumentChannels());
     }
     const DocumentState edited = document.State();
     while (history.Undo() == B_OK) {

@@ -50,7 +50,7 @@ protected:
     std::unique_ptr<PasteAction> Bound(TestDocument& document)
     {
         auto action = std::make_unique<PasteAction>(nullptr);
-        EXPECT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+        EXPECT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
         return action;
     }
 
@@ -73,7 +73,7 @@ TEST_F(PasteActionTest, ReplacingARangeOf100With40FramesShortensAndUndoRestores)
     document.AddChannel(Ramp(0, 300), 0, true);
     document.AddChannel(Ramp(1000, 300), 0, false);
     document.SetRange(100, 199);
-    document.container.cursor = 100;
+    document.position.SetCursorFrame(100);
     const DocumentState before = document.State();
     Copy({Ramp(-500, 40)});
     auto action = Bound(document);
@@ -103,7 +103,7 @@ TEST_F(PasteActionTest, ReplacingWithALongerBufferGrowsAndUndoRestores)
     TestDocument document;
     document.AddChannel(Ramp(0, 300), 0, true);
     document.SetRange(50, 59);
-    document.container.cursor = 50;
+    document.position.SetCursorFrame(50);
     const DocumentState before = document.State();
     Copy({Ramp(-100, 25)});
     auto action = Bound(document);
@@ -121,10 +121,10 @@ TEST_F(PasteActionTest, PasteEndCountsFromTheStoredCursor)
     TestDocument document;
     document.AddChannel(Ramp(0, 300), 0, true);
     document.SetRange(100, 199);
-    document.container.cursor = 20;
+    document.position.SetCursorFrame(20);
     Copy({Ramp(-500, 40)});
     auto action = Bound(document);
-    document.container.cursor = 250;  // later moves do not count
+    document.position.SetCursorFrame(250);  // later moves do not count
     ASSERT_EQ(action->Go(), B_OK);
     EXPECT_EQ(action->PasteStart(), 100);
     EXPECT_EQ(action->PasteEnd(), 59);
@@ -140,8 +140,8 @@ TEST_F(PasteActionTest, WithoutARangeInsertsAtTheCursorIntoTheFocusedChannelAndT
     document.AddChannel(Ramp(100, 10), 0, false);
     document.AddChannel(Ramp(200, 10), 0, false);
     document.SetRange(-1, -1);
-    document.container.cursor = 4;
-    document.container.focused = 1;
+    document.position.SetCursorFrame(4);
+    document.position.SetFocusIndex(1);
     const DocumentState before = document.State();
     Copy({{-1, -2, -3}, {-4, -5, -6}, {-7, -8, -9}});
     auto action = Bound(document);
@@ -164,8 +164,8 @@ TEST_F(PasteActionTest, InsertWithoutSelectionAndItsUndo)
     document.AddChannel(Ramp(0, 10), 0, false);
     document.AddChannel(Ramp(100, 10), 0, false);
     document.SetRange(2, 5);
-    document.container.cursor = 3;
-    document.container.focused = 0;
+    document.position.SetCursorFrame(3);
+    document.position.SetFocusIndex(0);
     const DocumentState before = document.State();
     Copy({{-1, -2}});
     auto action = Bound(document);
@@ -183,7 +183,7 @@ TEST_F(PasteActionTest, TwoChannelBufferWithTheLastChannelSelectedTouchesOnlyIt)
     document.AddChannel(Ramp(0, 10), 0, false);
     document.AddChannel(Ramp(100, 10), 0, true);
     document.SetRange(2, 3);
-    document.container.cursor = 2;
+    document.position.SetCursorFrame(2);
     const DocumentState before = document.State();
     Copy({{-1, -2}, {-3, -4}});
     auto action = Bound(document);
@@ -203,7 +203,7 @@ TEST_F(PasteActionTest, MissingCopyBufferIsAnEmptyPasteThatIsRecorded)
     const DocumentState before = document.State();
     HistoryManager history;
     auto* action = new PasteAction(nullptr);
-    ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(history.AddAction(action), B_OK);
     CopyBuffer::SetApplicationBuffer(nullptr);
     EXPECT_EQ(action->Go(), B_OK);
@@ -249,7 +249,7 @@ TEST_F(PasteActionTest, CopyInOneWindowPasteInAnother)
     target.AddChannel(Ramp(-100, 8), 0, false);
     target.AddChannel(Ramp(-200, 8), 0, false);
     target.SetRange(-1, -1);
-    target.container.cursor = 8;
+    target.position.SetCursorFrame(8);
     auto action = Bound(target);
     ASSERT_EQ(action->Go(), B_OK);
     const DocumentState after = target.State();
@@ -268,7 +268,7 @@ TEST_F(PasteActionTest, BufferWithMoreChannelsThanRemainIsPastedAsFarAsChannelsG
     document.AddChannel(Ramp(100, 10), 0, false);
     document.AddChannel(Ramp(200, 10), 0, true);
     document.SetRange(0, 9);
-    document.container.cursor = 0;
+    document.position.SetCursorFrame(0);
     Copy({{1}, {2}, {3}});
     auto action = Bound(document);
     ASSERT_EQ(action->Go(), B_OK);

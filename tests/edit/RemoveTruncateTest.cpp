@@ -29,7 +29,7 @@ TEST(RemoveActionTest, RemoveLeavesNoRangeNoSelectionAndUndoGivesBothBack)
     document.SetRange(5, 9);
     const DocumentState before = document.State();
     RemoveAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     const DocumentState after = document.State();
     EXPECT_EQ(after.rangeStart, -1);
@@ -56,7 +56,7 @@ TEST(RemoveActionTest, CutWithNoSelectedChannelKeepsTheRange)
     document.SetRange(5, 9);
     const DocumentState before = document.State();
     RemoveAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     EXPECT_EQ(document.State(), before);
     ASSERT_EQ(action.Undo(), B_OK);
@@ -82,7 +82,7 @@ TEST(TruncateActionTest, KeepsOnlyTheRangeAndUndoRestores)
     document.SetRange(5, 9);
     const DocumentState before = document.State();
     TruncateAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     EXPECT_EQ(action.KeptChannelCount(), 1);
     EXPECT_EQ(action.SavedChannelCount(), 0);
     ASSERT_EQ(action.Go(), B_OK);
@@ -107,7 +107,7 @@ TEST(TruncateActionTest, ChannelStartingAfterTheRangeStartKeepsNoHead)
     document.SetRange(5, 15);
     const DocumentState before = document.State();
     TruncateAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     ASSERT_EQ(action.Undo(), B_OK);
     const DocumentState after = document.State();

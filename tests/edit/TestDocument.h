@@ -6,7 +6,8 @@
 #include <random>
 #include <vector>
 
-#include "FakeChannelContainer.h"
+#include "DocumentMirror.h"
+#include "edit/EditPosition.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 
@@ -51,12 +52,14 @@ inline std::ostream& operator<<(std::ostream& out, const DocumentState& state)
     return out;
 }
 
-/// A channel manager with channels made from plain vectors and a fake
-/// container, for testing actions without widgets.
+/// A document with channels made from plain vectors, an edit position, and
+/// a mirror that follows the document's announcements, for testing actions
+/// without widgets.
 class TestDocument {
 public:
     ChannelManager manager{nullptr};
-    FakeChannelContainer container;
+    EditPosition position;
+    DocumentMirror mirror{manager};
 
     Channel* AddChannel(const std::vector<int16_t>& samples, int64_t first = 0, bool selected = true)
     {
@@ -69,7 +72,6 @@ public:
         channel->SetStartFrameOffset(first);
         channel->SetSelected(selected);
         manager.AddChannel(channel);
-        container.AddChannel(channel);
         return channel;
     }
 

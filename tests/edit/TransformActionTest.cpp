@@ -19,7 +19,7 @@ protected:
     std::unique_ptr<Action> Bound(TestDocument& document)
     {
         std::unique_ptr<Action> action = GetParam().make();
-        EXPECT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+        EXPECT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
         return action;
     }
 };
@@ -176,7 +176,7 @@ TEST(TransformEdgeTest, FadeInAndOutOfOneFrameWriteZero)
         document.AddChannel({500, 600, 700});
         document.SetRange(1, 1);
         std::unique_ptr<Action> action = make();
-        ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+        ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
         ASSERT_EQ(action->Go(), B_OK);
         EXPECT_EQ(document.State().channels[0].samples, (std::vector<int16_t>{500, 0, 700}));
     }
@@ -188,11 +188,11 @@ TEST(TransformEdgeTest, FadesOverThreeFramesOf1000)
     document.AddChannel({1000, 1000, 1000, 1000, 1000, 1000});
     document.SetRange(0, 2);
     FadeInAction fadeIn(nullptr);
-    ASSERT_EQ(fadeIn.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(fadeIn.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(fadeIn.Go(), B_OK);
     document.SetRange(3, 5);
     FadeOutAction fadeOut(nullptr);
-    ASSERT_EQ(fadeOut.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(fadeOut.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(fadeOut.Go(), B_OK);
     EXPECT_EQ(document.State().channels[0].samples, (std::vector<int16_t>{0, 500, 1000, 1000, 500, 0}));
 }
@@ -206,7 +206,7 @@ TEST(TransformEdgeTest, MaximizeAtFullScaleChangesNothingButCanBeUndone)
         const DocumentState before = document.State();
         HistoryManager history;
         auto* action = new MaximizeAction(nullptr);
-        ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+        ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
         ASSERT_EQ(history.AddAction(action), B_OK);
         ASSERT_EQ(action->Go(), B_OK);
         EXPECT_EQ(document.State(), before);
@@ -223,7 +223,7 @@ TEST(TransformEdgeTest, MaximizeOfSilenceStaysSilent)
     document.AddChannel(std::vector<int16_t>(16, 0));
     document.SetRange(0, 15);
     MaximizeAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     EXPECT_EQ(document.State().channels[0].samples, std::vector<int16_t>(16, 0));
 }
@@ -236,7 +236,7 @@ TEST(TransformEdgeTest, MaximizeSharesOneFactorAcrossChannels)
     document.AddChannel({16000, 16000, 16000}, 0, false);
     document.SetRange(0, 2);
     MaximizeAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     const float factor = 32767.0f / 1000.0f;
     auto scaled = [factor](int s) { return int16_t(std::trunc(double(factor) * s)); };
@@ -253,7 +253,7 @@ TEST(TransformEdgeTest, RevertOfAnOddRangeLeavesTheMiddle)
     document.AddChannel({1, 2, 3, 4, 5, 6, 7});
     document.SetRange(1, 5);
     RevertAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     EXPECT_EQ(document.State().channels[0].samples, (std::vector<int16_t>{1, 6, 5, 4, 3, 2, 7}));
 }
@@ -264,7 +264,7 @@ TEST(TransformEdgeTest, RevertPhasesOfTheExtremes)
     document.AddChannel({-32768, 32767, 0});
     document.SetRange(0, 2);
     RevertPhasesAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     EXPECT_EQ(document.State().channels[0].samples, (std::vector<int16_t>{-32768, -32767, 0}));
 }
@@ -276,7 +276,7 @@ TEST(TransformEdgeTest, ChannelsStartingLaterAreTransformedOnTheTimeline)
     document.AddChannel({10, 20, 30}, 2);
     document.SetRange(2, 4);
     RevertAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     const DocumentState after = document.State();
     EXPECT_EQ(after.channels[0].samples, (std::vector<int16_t>{1, 2, 5, 4, 3, 6}));
@@ -299,7 +299,7 @@ TEST(TransformBufferTest, FirstChannelWhoseCopyFailsGetsSilence)
     document.AddChannel({1, 2, 3, 4, 5, 6}, 0, true);
     document.SetRange(3, 5);
     RevertPhasesAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     EXPECT_EQ(document.State().channels[0].samples, (std::vector<int16_t>{7, 8, 9, 0, 0, 0}));
     EXPECT_EQ(document.State().channels[1].samples, (std::vector<int16_t>{1, 2, 3, -4, -5, -6}));
@@ -314,7 +314,7 @@ TEST(TransformBufferTest, MaximizeCarriesTheBufferAcrossItsPasses)
     document.AddChannel({1, 2, 3, 40, -50, 60}, 0, true);
     document.SetRange(3, 5);
     MaximizeAction action(nullptr);
-    ASSERT_EQ(action.SetTo(&document.manager, &document.container), B_OK);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
     const double factor = double(32767.0f / 60.0f);
     auto scaled = [factor](int s) { return test::TransformReference::Low16(factor * s); };

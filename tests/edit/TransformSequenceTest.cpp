@@ -118,7 +118,7 @@ TEST(TransformSequenceTest, RandomTransformsUndosAndRedosFollowTheModel)
             model.state.rangeEnd = end;
             const size_t which = size_t(pick(0, int64_t(transforms.size()) - 1));
             std::unique_ptr<Action> action = transforms[which].make();
-            ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+            ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
             Action* raw = action.get();
             ASSERT_EQ(history.AddAction(action.release()), B_OK);
             ASSERT_EQ(raw->Go(), B_OK);

@@ -55,7 +55,7 @@ TEST(TransformStressTest, TransformsAndUndosWhilePlaybackMixes)
             const int64_t start = pick(0, kLength - 1);
             document.SetRange(start, std::min(kLength - 1, start + pick(0, 5000)));
             std::unique_ptr<Action> action = transforms[size_t(pick(0, 4))].make();
-            ASSERT_EQ(action->SetTo(&document.manager, &document.container), B_OK);
+            ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
             Action* raw = action.get();
             ASSERT_EQ(history.AddAction(action.release()), B_OK);
             ASSERT_EQ(raw->Go(), B_OK);

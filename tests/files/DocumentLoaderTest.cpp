@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "FakeDocumentWindow.h"
+#include "RecordingTarget.h"
 #include "SoundFixtures.h"
 #include "WavBytes.h"
 #include "files/DocumentLoader.h"
@@ -11,7 +11,7 @@
 namespace glimmet {
 namespace {
 
-using test::FakeDocumentWindow;
+using test::RecordingTarget;
 using test::SoundFixtures;
 
 class DocumentLoaderTest : public ::testing::Test {
@@ -22,7 +22,6 @@ protected:
         auto* channel = new Channel();
         channel->SetTo(new int16_t[size_t(frames)](), frames);
         window.manager.AddChannel(channel);
-        window.container.AddChannel(channel);
         return channel;
     }
 
@@ -48,7 +47,7 @@ protected:
     }
 
     SoundFixtures fixtures;
-    FakeDocumentWindow window;
+    RecordingTarget window;
 };
 
 TEST_F(DocumentLoaderTest, MonoFileReplacesTheDocumentByOneLeftChannel)
@@ -60,8 +59,8 @@ TEST_F(DocumentLoaderTest, MonoFileReplacesTheDocumentByOneLeftChannel)
     ASSERT_EQ(window.manager.CountChannels(), 1);
     EXPECT_EQ(Pans(), std::vector<int8_t>{Channel::kPanLeft});
     EXPECT_EQ(window.manager.ChannelAt(0)->FrameCount(), 3000);
-    ASSERT_EQ(window.container.shown.size(), 1u);
-    EXPECT_EQ(window.container.shown[0], window.manager.ChannelAt(0));
+    ASSERT_EQ(window.mirror.shown.size(), 1u);
+    EXPECT_EQ(window.mirror.shown[0], window.manager.ChannelAt(0));
     EXPECT_EQ(window.title, "Glimmet - mono.wav");
     EXPECT_EQ(window.entry, std::filesystem::canonical(path));
     EXPECT_EQ(window.posted, std::vector<uint32_t>{kMsgShowAll});
@@ -106,7 +105,7 @@ TEST_F(DocumentLoaderTest, AppendAddsAfterTheExistingChannelsAndKeepsTheTitle)
     EXPECT_EQ(DocumentLoader::Load(path, window), B_OK);
     ASSERT_EQ(window.manager.CountChannels(), 3);
     EXPECT_EQ(window.manager.ChannelAt(0), existing);
-    EXPECT_EQ(window.container.shown.size(), 3u);
+    EXPECT_EQ(window.mirror.shown.size(), 3u);
     EXPECT_EQ(window.title, "untitled");
     // The file entry is replaced all the same.
     EXPECT_EQ(window.entry.filename(), "stereo.wav");
@@ -118,7 +117,7 @@ TEST_F(DocumentLoaderTest, OnlyTheLastAudioTracksChannelsRemain)
     EXPECT_EQ(DocumentLoader::Load(path, window), B_OK);
     ASSERT_EQ(window.manager.CountChannels(), 1);
     EXPECT_EQ(window.manager.ChannelAt(0)->FrameCount(), 700);
-    EXPECT_EQ(window.container.shown.size(), 1u);
+    EXPECT_EQ(window.mirror.shown.size(), 1u);
     EXPECT_EQ(window.posted, (std::vector<uint32_t>{kMsgShowAll, kMsgShowAll}));
 }
 
@@ -175,7 +174,7 @@ TEST_F(DocumentLoaderTest, TrackWithoutFramesEmptiesTheDocumentAndStillPosts)
     const auto path = fixtures.WriteBytes("nodata.wav", test::WavBytes{}.Make({}));
     EXPECT_EQ(DocumentLoader::Load(path, window), B_OK);
     EXPECT_EQ(window.manager.CountChannels(), 0);
-    EXPECT_TRUE(window.container.shown.empty());
+    EXPECT_TRUE(window.mirror.shown.empty());
     EXPECT_EQ(window.posted, std::vector<uint32_t>{kMsgShowAll});
 }
 
@@ -261,7 +260,7 @@ TEST_F(DocumentLoaderTest, LongChannelsTakeTheirArraysFromTheSampleAllocator)
             ASSERT_EQ(channel->Data()[i], source[size_t(2 * i + k)]) << k << " " << i;
     }
     while (window.manager.RemoveChannelAt(0))
-        window.container.RemoveSampleViewAt(0);
+        continue;
     EXPECT_EQ(allocator.CachedBlocks(), 2u);
     allocator.ReleaseCached();
 }

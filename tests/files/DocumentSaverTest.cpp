@@ -7,10 +7,11 @@
 #include <fstream>
 #include <iterator>
 
-#include "FakeDocumentWindow.h"
+#include "RecordingTarget.h"
 #include "SoundFixtures.h"
 #include "TrackReading.h"
 #include "edit/Action.h"
+#include "edit/EditPosition.h"
 #include "files/DocumentSaver.h"
 #include "files/FileTypeAttribute.h"
 #include "files/FrameWriter.h"
@@ -22,7 +23,7 @@
 namespace glimmet {
 namespace {
 
-using test::FakeDocumentWindow;
+using test::RecordingTarget;
 using test::SoundFixtures;
 
 /// Keeps the size of every buffer it is handed, and the frames.
@@ -99,13 +100,14 @@ protected:
     void MakeUnsaved()
     {
         auto* action = new Action(nullptr);
-        ASSERT_EQ(action->SetTo(&window.manager, &window.container), B_OK);
+        ASSERT_EQ(action->SetTo(&window.manager, &position), B_OK);
         ASSERT_EQ(window.history.AddAction(action), B_OK);
         ASSERT_FALSE(window.history.IsSaved());
     }
 
     SoundFixtures fixtures;
-    FakeDocumentWindow window;
+    RecordingTarget window;
+    EditPosition position;
 };
 
 TEST_F(DocumentSaverTest, WritesBuffersOf1024Frames)

@@ -5,7 +5,7 @@
 #include <iterator>
 #include <thread>
 
-#include "FakeDocumentWindow.h"
+#include "RecordingTarget.h"
 #include "SoundFixtures.h"
 #include "files/DocumentLoader.h"
 #include "files/DocumentSaver.h"
@@ -14,7 +14,7 @@
 namespace glimmet {
 namespace {
 
-using test::FakeDocumentWindow;
+using test::RecordingTarget;
 using test::SoundFixtures;
 
 /// Mixes playback buffers on a thread of its own, as the audio device does,
@@ -48,7 +48,7 @@ private:
 TEST(FileStressTest, SavingWhilePlayingWritesAConsistentMix)
 {
     SoundFixtures fixtures;
-    FakeDocumentWindow window;
+    RecordingTarget window;
     window.manager.SetLoop(true);
     const auto source = fixtures.Encode("play.wav", SoundFixtures::Pattern(20000, 2), 44100, 2);
     ASSERT_EQ(DocumentLoader::Load(source, window), B_OK);
@@ -74,7 +74,7 @@ TEST(FileStressTest, SavingWhilePlayingWritesAConsistentMix)
 TEST(FileStressTest, AppendingWhilePlayingKeepsEveryChannel)
 {
     SoundFixtures fixtures;
-    FakeDocumentWindow window;
+    RecordingTarget window;
     window.appendOnLoad = true;
     const auto source = fixtures.Encode("more.flac", SoundFixtures::Pattern(5000, 2), 44100, 2);
     PlaybackThread playback(window.manager);

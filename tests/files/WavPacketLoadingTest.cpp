@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "FakeDocumentWindow.h"
+#include "RecordingTarget.h"
 #include "SoundFixtures.h"
 #include "WavBytes.h"
 #include "files/DocumentLoader.h"
@@ -16,7 +16,7 @@
 namespace glimmet {
 namespace {
 
-using test::FakeDocumentWindow;
+using test::RecordingTarget;
 using test::SoundFixtures;
 using test::WavBytes;
 
@@ -80,7 +80,7 @@ std::string Bytes(const Case& c, const std::vector<int16_t>& samples)
 class WavPacketLoadingTest : public ::testing::TestWithParam<Case> {
 protected:
     SoundFixtures fixtures;
-    FakeDocumentWindow window;
+    RecordingTarget window;
 };
 
 TEST_P(WavPacketLoadingTest, ChannelsHoldWhatFFmpegDecodes)

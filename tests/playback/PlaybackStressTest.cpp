@@ -8,8 +8,7 @@
 
 #include "PlaybackTestSupport.h"
 #include "edit/Action.h"
-#include "edit/ChannelContainer.h"
-#include "edit/ChannelView.h"
+#include "edit/EditPosition.h"
 #include "edit/FadeInAction.h"
 #include "edit/FadeOutAction.h"
 #include "edit/HistoryManager.h"
@@ -25,34 +24,6 @@ namespace glimmet {
 namespace {
 
 using test::ChannelRecipe;
-
-// What the actions need of the views, without widgets.
-class StressView : public ChannelView {
-public:
-    bool IsFocus() const override { return false; }
-    void Update() override {}
-};
-
-class StressContainer : public ChannelContainer {
-public:
-    explicit StressContainer(ChannelManager* manager) : manager_(manager) {}
-    int64_t CursorFrame() override { return 0; }
-    int32_t FocusedChannel() override { return 0; }
-    int32_t CountChannelViews() override { return manager_->CountChannels(); }
-    ChannelView* ChannelViewAt(int32_t index) override
-    {
-        return index >= 0 && index < manager_->CountChannels() ? &view_ : nullptr;
-    }
-    ChannelView* AddChannel(Channel*) override { return &view_; }
-    void AddChannelAt(Channel*, int32_t) override {}
-    void RemoveSampleView(ChannelView*) override {}
-    void RemoveSampleViewAt(int32_t) override {}
-    void UpdateAll() override {}
-
-private:
-    ChannelManager* manager_;
-    StressView view_;
-};
 
 std::vector<std::vector<int16_t>> Samples(ChannelManager* manager)
 {
@@ -113,7 +84,7 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
     window.PostMessage(kMsgPlay);
     ASSERT_TRUE(window.ProcessUntil([&] { return window.playmarkUpdates.size() >= 5; }));
 
-    StressContainer container(&manager);
+    EditPosition position;
     HistoryManager history;
     auto pick = [&random](int64_t low, int64_t high) {
         return std::uniform_int_distribution<int64_t>(low, high)(random);
@@ -127,7 +98,7 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
             manager.SetRangeStart(start);
             manager.SetRangeEnd(std::min(kLength - 1, start + pick(1, 8000)));
             std::unique_ptr<Action> action = MakeTransform(pick(0, 4));
-            ASSERT_EQ(action->SetTo(&manager, &container), B_OK);
+            ASSERT_EQ(action->SetTo(&manager, &position), B_OK);
             Action* raw = action.get();
             ASSERT_EQ(history.AddAction(action.release()), B_OK);
             ASSERT_EQ(raw->Go(), B_OK);

@@ -305,11 +305,11 @@ TEST_F(Interaction, MiddleButtonMovesTheChannelAndReportsTheMove)
     const auto moved = fixture.window.With(kMsgSampleMoved);
     ASSERT_EQ(moved.size(), 1u);
     Channel* channel = nullptr;
-    ChannelView* sampleView = nullptr;
+    SampleView* sampleView = nullptr;
     ASSERT_EQ(moved[0].FindPointer("channel", &channel), B_OK);
     ASSERT_EQ(moved[0].FindPointer("sample view", &sampleView), B_OK);
     EXPECT_EQ(channel, ChannelAt(1));
-    EXPECT_EQ(sampleView, static_cast<ChannelView*>(view));
+    EXPECT_EQ(sampleView, view);
     EXPECT_EQ(fixture.window.Int64(moved[0], "offset"), 0 - expected);
     EXPECT_EQ(fixture.slider->HighValue(), fixture.manager.FrameCount() - 1);
 }

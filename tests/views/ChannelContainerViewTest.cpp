@@ -409,36 +409,66 @@ TEST(ChannelContainerView, SelectAllAndDeselectAll)
     EXPECT_FALSE(fixture.manager.ChannelAt(1)->IsSelected());
 }
 
-TEST(ChannelContainerView, AddsInsertsAndRemovesViews)
+TEST(ChannelContainerView, FollowsTheChannelsOfTheDocument)
 {
     ViewFixture fixture(400, 200);
     Channel* a = MakeChannel(Ramp(100));
     Channel* b = MakeChannel(Ramp(100));
     Channel* c = MakeChannel(Ramp(100));
     fixture.manager.AddChannel(a);
-    fixture.manager.AddChannel(b);
+    SampleView* first = fixture.View(0);
     fixture.manager.AddChannel(c);
-    SampleView* first = fixture.container->AddChannel(a);
-    fixture.container->AddChannel(c);
-    fixture.container->AddChannelAt(b, 1);
+    ASSERT_TRUE(fixture.manager.AddChannel(b, 1));
     ASSERT_EQ(fixture.container->CountChannelViews(), 3);
     EXPECT_EQ(fixture.View(0), first);
+    EXPECT_EQ(fixture.View(0)->GetChannel(), a);
     EXPECT_EQ(fixture.View(1)->GetChannel(), b);
     EXPECT_EQ(fixture.View(2)->GetChannel(), c);
     EXPECT_EQ(fixture.View(1)->parentWidget(), fixture.container.get());
 
-    SampleView stranger(a, fixture.container.get());
-    fixture.container->RemoveSampleView(&stranger);
+    // A channel the document does not hold changes nothing.
+    Channel stranger;
+    EXPECT_EQ(fixture.manager.RemoveChannel(&stranger), nullptr);
     EXPECT_EQ(fixture.container->CountChannelViews(), 3);
-    fixture.container->RemoveSampleView(first);
+    std::unique_ptr<Channel> removed = fixture.manager.RemoveChannel(a);
+    ASSERT_EQ(removed.get(), a);
     EXPECT_EQ(fixture.container->CountChannelViews(), 2);
     EXPECT_EQ(fixture.View(0)->GetChannel(), b);
-    fixture.container->RemoveSampleViewAt(5);
+    EXPECT_FALSE(fixture.manager.RemoveChannelAt(5));
     EXPECT_EQ(fixture.container->CountChannelViews(), 2);
-    fixture.container->RemoveSampleViewAt(1);
+    EXPECT_TRUE(fixture.manager.RemoveChannelAt(1));
     ASSERT_EQ(fixture.container->CountChannelViews(), 1);
-    EXPECT_EQ(fixture.container->ChannelViewAt(0), fixture.View(0));
-    EXPECT_EQ(fixture.container->ChannelViewAt(1), nullptr);
+    EXPECT_EQ(fixture.View(0)->GetChannel(), b);
+    EXPECT_EQ(fixture.View(1), nullptr);
+}
+
+TEST(ChannelContainerView, MakesViewsForChannelsItFindsAndRedrawsChangedOnes)
+{
+    RecordingWindow window;
+    ChannelManager manager(&window);
+    manager.AddChannel(MakeChannel(Ramp(100)));
+    manager.AddChannel(MakeChannel(Ramp(100)));
+    ChannelContainerView container(&manager, new ZoomSlider(&window, 0, 0, 0), &window);
+    ASSERT_EQ(container.CountChannelViews(), 2);
+    EXPECT_EQ(container.SampleViewAtIndex(1)->GetChannel(), manager.ChannelAt(1));
+
+}
+
+TEST(ChannelContainerView, RedrawsTheChannelTheDocumentSaysChanged)
+{
+    ViewFixture fixture(200, 100);
+    fixture.Add(MakeChannel(Ramp(100)));
+    Channel* moved = MakeChannel(Ramp(100));
+    fixture.Add(moved);
+    fixture.Show();
+    // A moved channel's view shows it at its new place once told, and only
+    // that view is drawn again.
+    moved->SetStartFrameOffset(50);
+    const QImage first = fixture.View(0)->Bitmap();
+    const QImage before = fixture.View(1)->Bitmap();
+    fixture.manager.ChannelChanged(moved);
+    EXPECT_NE(fixture.View(1)->Bitmap(), before);
+    EXPECT_EQ(fixture.View(0)->Bitmap().cacheKey(), first.cacheKey());
 }
 
 TEST(ChannelContainerView, FirstChannelSetsTheLastDisplayedFrame)
@@ -529,7 +559,6 @@ TEST(ZoomSliderAndWindow, HandleDragsSetTheDisplayAndSettle)
     window.container = &container;
     container.resize(500, 150);
     manager.AddChannel(MakeChannel(std::vector<int16_t>(100000, 0)));
-    container.AddChannel(manager.ChannelAt(0));
     container.show();
     ASSERT_TRUE(QTest::qWaitForWindowExposed(&container));
     DeliverPosted();

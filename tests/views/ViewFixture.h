@@ -36,11 +36,11 @@ public:
         container->resize(width, height);
     }
 
-    /// Adds the channel to the manager and a view for it to the container.
+    /// Adds the channel to the document; the container makes its view.
     SampleView* Add(Channel* channel)
     {
         manager.AddChannel(channel);
-        SampleView* view = container->AddChannel(channel);
+        SampleView* view = container->SampleViewAtIndex(manager.IndexOf(channel));
         view->SetClock(&ManualClock::Now);
         return view;
     }
