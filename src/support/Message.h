@@ -17,6 +17,9 @@ class Message {
 public:
     explicit Message(uint32_t what = 0) : what(what) {}
 
+    /// The kinds of value a field can hold, as GetInfo reports them.
+    enum class FieldType : uint32_t { kInt32, kInt64, kBool, kFloat, kPointer, kString, kPath };
+
     uint32_t what;
 
     status_t AddInt32(const std::string& name, int32_t value) { return Add(name, value); }
@@ -52,6 +55,19 @@ public:
     bool IsEmpty() const { return fields_.empty(); }
     void RemoveField(const std::string& name);
 
+    /// The name, type and number of values of the field at index, in the
+    /// order fields were first added; B_BAD_INDEX past the last field. Any
+    /// of the outputs may be null.
+    status_t GetInfo(int32_t index, std::string* name, FieldType* type, int32_t* count) const;
+    /// The type and number of values of the field called name, or
+    /// B_NAME_NOT_FOUND.
+    status_t GetInfo(const std::string& name, FieldType* type, int32_t* count) const;
+    /// Appends value index of from's field name to this message's field of
+    /// that name, so that fields can be copied without knowing their type.
+    /// Fails as a Find on from or an Add here would (B_NAME_NOT_FOUND,
+    /// B_BAD_INDEX, B_BAD_TYPE).
+    status_t CopyValue(const Message& from, const std::string& name, int32_t index);
+
 private:
     using Value = std::variant<int32_t, int64_t, bool, float, void*, std::string, std::filesystem::path>;
     struct Field {
@@ -63,6 +79,7 @@ private:
 
     template <typename T>
     status_t Add(const std::string& name, T value);
+    status_t AddValue(const std::string& name, const Value& value);
 
     template <typename T>
     status_t Find(const std::string& name, T* value, int32_t index) const;

@@ -1,7 +1,6 @@
 #include "views/ChannelContainerView.h"
 
 #include <algorithm>
-#include <cmath>
 
 #include <QFontMetricsF>
 #include <QPainter>
@@ -60,7 +59,7 @@ ChannelContainerView::ChannelContainerView(ChannelManager* manager, ZoomSlider* 
     setObjectName("sample view");
     setAttribute(Qt::WA_OpaquePaintEvent);
     setSizePolicy(QSizePolicy::Expanding, QSizePolicy::Expanding);
-    lastFrame_ = MaxFrameCount() - 1;
+    display_.SetLast(MaxFrameCount() - 1);
     resize(11, 16);
     CheckZoomSlider(true);
     if (zoomSlider_ != nullptr)
@@ -84,29 +83,16 @@ float ChannelContainerView::Width() const
     return Bounds().Width();
 }
 
-FrameMapping ChannelContainerView::Mapping() const
+const DisplayRange& ChannelContainerView::Display() const
 {
-    return FrameMapping(Width(), firstFrame_, lastFrame_);
+    display_.SetWidth(Width());
+    return display_;
 }
 
-float ChannelContainerView::PosAt(int64_t frame) const
+DisplayRange& ChannelContainerView::Display()
 {
-    return Mapping().PosAt(frame);
-}
-
-int64_t ChannelContainerView::FirstFrameAt(float x) const
-{
-    return Mapping().FirstFrameAt(x);
-}
-
-int64_t ChannelContainerView::LastFrameAt(float x) const
-{
-    return Mapping().LastFrameAt(x);
-}
-
-int64_t ChannelContainerView::FrameAt(float x) const
-{
-    return Mapping().FrameAt(x);
+    display_.SetWidth(Width());
+    return display_;
 }
 
 int64_t ChannelContainerView::MaxFrameCount() const
@@ -158,50 +144,22 @@ int32_t ChannelContainerView::CountChannelViews()
 
 void ChannelContainerView::SetDisplayRange(int64_t first, int64_t last)
 {
-    firstFrame_ = first;
-    lastFrame_ = last;
-    const int64_t count = MaxFrameCount();
-    int64_t columns = int64_t(std::trunc(Width())) - 1;
-    if (columns >= count - 1)
-        columns = count - 1;
-    // Never more than one column per frame.
-    if (first + columns - 1 > last) {
-        lastFrame_ = first + columns - 1;
+    if (Display().SetWidened(first, last, MaxFrameCount()))
         CheckZoomSlider(false);
-    }
     for (SampleView* view : sampleViews_)
         view->Update();
     if (window_ != nullptr && zoomSlider_ != nullptr) {
         Message message(kMsgDisplayRangeChanged);
-        message.AddInt64("low value", firstFrame_);
-        message.AddInt64("high value", lastFrame_);
+        message.AddInt64("low value", display_.First());
+        message.AddInt64("high value", display_.Last());
         zoomSlider_->PostMessage(message);
     }
 }
 
-// The range, centred and widened to one frame per column; shifted left
-// rather than reaching past the end of the document.
 void ChannelContainerView::ZoomRange()
 {
-    const int64_t count = MaxFrameCount();
-    int64_t first = RangeStart();
-    int64_t last = RangeEnd();
-    if (first < -1 || last < -1 || first > count || last > count)
+    if (!Display().ZoomTo(RangeStart(), RangeEnd(), MaxFrameCount()))
         return;
-    const int64_t columns = int64_t(std::trunc(Width())) - 1;
-    if (last - first < columns) {
-        const int64_t widening = (columns - (last - first)) / 2;
-        const int64_t shortfall = first - widening < 0 ? widening - first : 0;
-        first = std::max<int64_t>(first - widening, 0);
-        last = last + widening + shortfall;
-    }
-    if (last > count) {
-        const int64_t excess = last - count;
-        first -= excess;
-        last -= excess;
-    }
-    firstFrame_ = first;
-    lastFrame_ = last;
     for (SampleView* view : sampleViews_)
         view->Update();
     UpdateZoomSlider();
@@ -211,7 +169,7 @@ void ChannelContainerView::ZoomRange()
 // through the window sets the display range.
 void ChannelContainerView::ShowAll()
 {
-    lastFrame_ = MaxFrameCount() - 1;
+    display_.SetLast(MaxFrameCount() - 1);
     if (zoomSlider_ != nullptr)
         zoomSlider_->SetBoth(0.0f, 1.0f);
 }
@@ -223,24 +181,17 @@ void ChannelContainerView::CheckZoomSlider(bool notify)
         return;
     zoomSlider_->SetLowValue(0, notify);
     zoomSlider_->SetHighValue(count - 1, notify);
-    zoomSlider_->SetMinRange(std::min(int64_t(std::trunc(Width())) - 1, count - 1));
+    zoomSlider_->SetMinRange(Display().SliderMinRange(count));
 }
 
-// These expressions are based on the width and not on the displayed span;
-// they place the handles exactly as the original does.
 void ChannelContainerView::UpdateZoomSlider()
 {
     const int64_t count = MaxFrameCount();
     if (zoomSlider_ == nullptr || count <= 0)
         return;
-    const int64_t n = int64_t(std::trunc(Width())) - 2;
-    if (lastFrame_ < count - 1) {
-        zoomSlider_->SetLeft(float(firstFrame_) / float(count - n), false);
-        zoomSlider_->SetRight(float(lastFrame_ - n) / float(count - n), false);
-    } else {
-        zoomSlider_->SetLeft(float(firstFrame_) / float(lastFrame_ - n), false);
-        zoomSlider_->SetRight(float(lastFrame_ - n) / float(lastFrame_ - n), false);
-    }
+    const DisplayRange::SliderFractions fractions = Display().SliderFractionsFor(count);
+    zoomSlider_->SetLeft(fractions.left, false);
+    zoomSlider_->SetRight(fractions.right, false);
 }
 
 void ChannelContainerView::RedrawColumns(SampleView* view, float left, float right)
@@ -278,9 +229,9 @@ void ChannelContainerView::SetPlaymarkFrame(int64_t frame)
         float oldX = PosAt(playmarkFrame_);
         if (oldX == -1)
             oldX = 0;
-        const bool oldVisible = firstFrame_ <= playmarkFrame_ && playmarkFrame_ <= lastFrame_;
+        const bool oldVisible = display_.Contains(playmarkFrame_);
         playmarkFrame_ = frame;
-        const bool newVisible = firstFrame_ <= frame && frame <= lastFrame_;
+        const bool newVisible = display_.Contains(frame);
         if (oldVisible)
             RedrawColumnInAll(oldX);
         if (newVisible)
@@ -385,8 +336,8 @@ void ChannelContainerView::InsertSampleView(SampleView* view, int32_t index)
     const size_t position = (index < 0 || size_t(index) > sampleViews_.size()) ? sampleViews_.size() : size_t(index);
     sampleViews_.insert(sampleViews_.begin() + std::ptrdiff_t(position), view);
     view->show();
-    if (lastFrame_ <= 0)
-        lastFrame_ = MaxFrameCount() - 1;
+    if (display_.Last() <= 0)
+        display_.SetLast(MaxFrameCount() - 1);
     CheckZoomSlider(true);
     UpdateSizeLimits();
     LayoutChildren();
@@ -412,37 +363,33 @@ void ChannelContainerView::UpdateAll()
     CheckZoomSlider(true);
 }
 
-Channel* ChannelContainerView::ContextChannelPointer() const
-{
-    return manager_ != nullptr ? manager_->ChannelAt(contextChannel_) : nullptr;
-}
-
 void ChannelContainerView::MessageReceived(const Message& message)
 {
     if (message.what == kMsgSampleMoved) {
         // A sample view finished drawing: a move may ask for the next redraw.
-        moveRedrawPermission_ = 1;
+        interaction_.AllowMoveRedraw();
         return;
     }
-    Channel* channel = ContextChannelPointer();
-    if (channel == nullptr)
-        return;
-    switch (message.what) {
-    case kMsgToggleMute:
-        channel->SetMuted(!channel->IsMuted());
-        break;
-    case kMsgPanLeft:
-        channel->SetPanPosition(Channel::kPanLeft);
-        break;
-    case kMsgPanMiddle:
-        channel->SetPanPosition(Channel::kPanMiddle);
-        break;
-    case kMsgPanRight:
-        channel->SetPanPosition(Channel::kPanRight);
-        break;
-    default:
-        break;
+    contextMenu_.Apply(message.what);
+}
+
+SampleView* ChannelContainerView::DragTargetAt(QPointF point) const
+{
+    if (SampleView* view = SampleViewAt(point))
+        return view;
+    if (sampleViews_.empty())
+        return nullptr;
+    const float y = float(point.y());
+    if (y < 0)
+        return sampleViews_.front();
+    if (y > Bounds().bottom - zoomSliderHeight_)
+        return sampleViews_.back();
+    for (SampleView* view : sampleViews_) {
+        const ViewRect frame = view->Frame();
+        if (frame.top - 1 <= y && y <= frame.bottom + 1)
+            return view;
     }
+    return nullptr;
 }
 
 // Layout
@@ -476,21 +423,10 @@ void ChannelContainerView::resizeEvent(QResizeEvent* event)
     update();
 }
 
-// A view wider than the display range shows one frame per column; the
-// range is shifted left rather than past the end of the document.
+// A view wider than the display range shows one frame per column.
 void ChannelContainerView::WidenToOneFramePerColumn()
 {
-    const int64_t count = MaxFrameCount();
-    if (count > 0) {
-        const int64_t n = int64_t(std::trunc(Width())) - 2;
-        if (lastFrame_ - firstFrame_ < n)
-            lastFrame_ = firstFrame_ + n - 1;
-        const int64_t excess = lastFrame_ - count + 1;
-        if (excess > 0) {
-            firstFrame_ -= excess;
-            lastFrame_ -= excess;
-        }
-    }
+    Display().WidenToOneFramePerColumn(MaxFrameCount());
     UpdateZoomSlider();
 }
 

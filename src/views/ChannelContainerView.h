@@ -4,12 +4,14 @@
 #include <vector>
 
 #include <QPointF>
-#include <QPointer>
 #include <QMenu>
 #include <QWidget>
 
 #include "edit/EditContext.h"
 #include "sound/Observer.h"
+#include "views/ChannelContextMenu.h"
+#include "views/ContainerMouseInteraction.h"
+#include "views/DisplayRange.h"
 #include "views/MessageView.h"
 #include "views/FrameMapping.h"
 #include "views/SampleView.h"
@@ -25,11 +27,11 @@ class DocumentWindow;
 class ZoomSlider;
 
 /// The editing surface of a document window: one SampleView per channel,
-/// stacked, with the zoom slider along the bottom edge. It owns the mapping
-/// between frames and pixel columns, the display range, the edit cursor and
-/// the play mark, and the mouse interaction: range drags across channels,
-/// Shift-extend, double-click, moving a channel in time and the channel
-/// context menu.
+/// stacked, with the zoom slider along the bottom edge. It lays out its
+/// children and keeps the edit cursor and the play mark; the display range
+/// and the frame mapping are a DisplayRange, the mouse a
+/// ContainerMouseInteraction and the channel menu a ChannelContextMenu, to
+/// which the operations below hand over.
 ///
 /// Everything it tells the window is posted as a Message to the
 /// DocumentWindow: 'rsch'/'rech' at the end of a range drag, 'smmd' at the
@@ -51,11 +53,11 @@ public:
     ~ChannelContainerView() override;
 
     // Frame/pixel mapping over the current display range and width.
-    float PosAt(int64_t frame) const;
-    int64_t FirstFrameAt(float x) const;
-    int64_t LastFrameAt(float x) const;
-    int64_t FrameAt(float x) const;
-    FrameMapping Mapping() const;
+    float PosAt(int64_t frame) const { return Display().PosAt(frame); }
+    int64_t FirstFrameAt(float x) const { return Display().FirstFrameAt(x); }
+    int64_t LastFrameAt(float x) const { return Display().LastFrameAt(x); }
+    int64_t FrameAt(float x) const { return Display().FrameAt(x); }
+    FrameMapping Mapping() const { return Display().Mapping(); }
     int64_t MaxFrameCount() const;
     /// The first sample view whose frame holds the point (container
     /// coordinates), or null.
@@ -72,8 +74,8 @@ public:
     DocumentWindow* Window() const { return window_; }
 
     // Display range and zoom.
-    int64_t FirstDisplayedFrame() const { return firstFrame_; }
-    int64_t LastDisplayedFrame() const { return lastFrame_; }
+    int64_t FirstDisplayedFrame() const { return display_.First(); }
+    int64_t LastDisplayedFrame() const { return display_.Last(); }
     /// Shows [first, last], widened to at least one frame per column, and
     /// tells the zoom slider.
     void SetDisplayRange(int64_t first, int64_t last);
@@ -101,6 +103,12 @@ public:
     void DeselectAll();
     /// Redraws the view of every selected channel.
     void RangeChanged();
+    /// Re-renders the columns left .. right of view; null is ignored.
+    void RedrawColumns(SampleView* view, float left, float right);
+    /// The channel a range drag at point (container coordinates) reaches:
+    /// above the first view the first, below the last (into the zoom
+    /// slider) the last, in the gap around a view that view; else null.
+    SampleView* DragTargetAt(QPointF point) const;
 
     /// Redraws every channel view.
     void UpdateAll();
@@ -109,30 +117,36 @@ public:
 
     // Mouse interaction; points are in the coordinates named.
     /// A mouse-down in a sample view (view coordinates).
-    void Clicked(SampleView* view, QPointF point, Qt::MouseButton button, Qt::KeyboardModifiers modifiers);
-    void DoubleClicked(SampleView* view, QPointF point, Qt::MouseButton button, Qt::KeyboardModifiers modifiers);
+    void Clicked(SampleView* view, QPointF point, Qt::MouseButton button, Qt::KeyboardModifiers modifiers)
+    {
+        interaction_.Clicked(view, point, button, modifiers);
+    }
+    void DoubleClicked(SampleView* view, QPointF point, Qt::MouseButton button, Qt::KeyboardModifiers)
+    {
+        interaction_.DoubleClicked(view, point, button);
+    }
     /// Pointer motion while a button is held (container coordinates).
-    void MouseMoved(QPointF point);
-    void MouseUp(QPointF point);
-    void StartDragging(SampleView* view, int64_t anchor);
-    void Dragging(SampleView* view, float x);
-    void StopDragging();
-    bool IsDragging() const { return dragChannel_ >= 0; }
-    void StartMoving(SampleView* view, int64_t frame);
-    void Moving(float x);
-    void StopMoving();
-    bool IsMoving() const { return movingChannel_ >= 0; }
+    void MouseMoved(QPointF point) { interaction_.MouseMoved(point); }
+    void MouseUp(QPointF) { interaction_.MouseUp(); }
+    void StartDragging(SampleView* view, int64_t anchor) { interaction_.StartDragging(view, anchor); }
+    void Dragging(SampleView* view, float x) { interaction_.Dragging(view, x); }
+    void StopDragging() { interaction_.StopDragging(); }
+    bool IsDragging() const { return interaction_.IsDragging(); }
+    void StartMoving(SampleView* view, int64_t frame) { interaction_.StartMoving(view, frame); }
+    void Moving(float x) { interaction_.Moving(x); }
+    void StopMoving() { interaction_.StopMoving(); }
+    bool IsMoving() const { return interaction_.IsMoving(); }
     /// Moves channel index by frames in one go, ending like a finished drag:
     /// the window records the move as an undoable action.
-    void MoveChannel(int32_t index, int64_t frames);
+    void MoveChannel(int32_t index, int64_t frames) { interaction_.MoveChannel(index, frames); }
     /// The channel's context menu; it deletes itself when closed.
-    QMenu* ContextMenuFor(Channel* channel);
-    int32_t ContextChannel() const { return contextChannel_; }
+    QMenu* ContextMenuFor(Channel* channel) { return contextMenu_.MenuFor(channel); }
+    int32_t ContextChannel() const { return contextMenu_.ContextChannel(); }
     /// The context menu of channel index as a secondary click would build
     /// it, without showing it; null when there is no such channel.
-    QMenu* ContextMenuForChannel(int32_t index);
+    QMenu* ContextMenuForChannel(int32_t index) { return contextMenu_.MenuForChannel(index); }
     /// The menu opened by the last secondary click, while it exists.
-    QMenu* OpenContextMenu() const;
+    QMenu* OpenContextMenu() const { return contextMenu_.OpenMenu(); }
 
     /// 'much', 'stcl', 'stcm', 'stcr' for the context channel; a bare
     /// 'smmd' (a sample view has drawn) re-allows a move redraw.
@@ -147,6 +161,11 @@ protected:
 
 private:
     float Width() const;
+    /// The display range over the current width. The widget's width changes
+    /// before its resize event arrives (a hidden widget gets it only when
+    /// shown), so the width is taken afresh at every use.
+    const DisplayRange& Display() const;
+    DisplayRange& Display();
     void LayoutChildren();
     void DrawEmptyState(QPainter& painter);
     void WidenToOneFramePerColumn();
@@ -154,30 +173,18 @@ private:
     void AddChannelAt(Channel* channel, int32_t index);
     void RemoveSampleViewAt(int32_t index);
     void InsertSampleView(SampleView* view, int32_t index);
-    void RedrawColumns(SampleView* view, float left, float right);
     void RedrawColumnInAll(float x);
-    void ShowContextMenu(SampleView* view, QPointF point);
-    SampleView* DragTargetAt(QPointF point) const;
-    void RedrawDragEdge(SampleView* view, bool endSide, int64_t oldStart, int64_t oldEnd);
-    Channel* ContextChannelPointer() const;
 
     std::vector<SampleView*> sampleViews_;  // children of this widget
     ZoomSlider* zoomSlider_;
     ChannelManager* manager_;
     DocumentWindow* window_;
     float zoomSliderHeight_ = 0;
-    int32_t dragChannel_ = -1;
-    int64_t dragAnchor_ = -1;
-    int64_t firstFrame_ = 0;
-    int64_t lastFrame_ = -1;
+    mutable DisplayRange display_;
     int64_t cursorFrame_ = 0;
     int64_t playmarkFrame_ = -1;
-    int32_t contextChannel_ = -1;
-    int64_t grabOffset_ = 0;
-    int64_t moveStartFrame_ = 0;
-    int32_t movingChannel_ = -1;
-    int32_t moveRedrawPermission_ = 1;
-    QPointer<QMenu> openMenu_;  // deletes itself when closed
+    ChannelContextMenu contextMenu_{*this};
+    ContainerMouseInteraction interaction_{*this, contextMenu_};
 };
 
 }  // namespace glimmet

@@ -1,14 +1,72 @@
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <chrono>
+#include <cstdlib>
 #include <cstring>
+#include <new>
 #include <thread>
 #include <vector>
 
 #include "sound/SampleAllocator.h"
 
+// This test program frees arrays through these, so that a test can see
+// whether the heap was given back an array it made with new[].
+namespace {
+
+std::atomic<const void*> gWatchedArray{nullptr};
+std::atomic<int> gWatchedArrayDeletes{0};
+
+}  // namespace
+
+void* operator new[](std::size_t size)
+{
+    if (void* memory = std::malloc(size == 0 ? 1 : size))
+        return memory;
+    throw std::bad_alloc();
+}
+
+void operator delete[](void* memory) noexcept
+{
+    if (memory != nullptr && memory == gWatchedArray.load())
+        gWatchedArrayDeletes++;
+    std::free(memory);
+}
+
+void operator delete[](void* memory, std::size_t) noexcept
+{
+    operator delete[](memory);
+}
+
+// The nothrow pair too, so that every array form meets its own kind of
+// free (AddressSanitizer checks that they match).
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept
+{
+    return std::malloc(size == 0 ? 1 : size);
+}
+
+void operator delete[](void* memory, const std::nothrow_t&) noexcept
+{
+    operator delete[](memory);
+}
+
 namespace glimmet {
 namespace {
+
+/// Counts the delete[] calls that free one address while it lives.
+class ArrayDeleteWatch {
+public:
+    explicit ArrayDeleteWatch(const void* address)
+    {
+        gWatchedArrayDeletes = 0;
+        gWatchedArray = address;
+    }
+    ~ArrayDeleteWatch() { gWatchedArray = nullptr; }
+    ArrayDeleteWatch(const ArrayDeleteWatch&) = delete;
+    ArrayDeleteWatch& operator=(const ArrayDeleteWatch&) = delete;
+
+    int Count() const { return gWatchedArrayDeletes.load(); }
+};
 
 using namespace std::chrono_literals;
 
@@ -231,10 +289,25 @@ TEST(SampleAllocatorTest, ReusedBlockHoldsWhatIsWrittenNext)
 TEST(SampleAllocatorTest, HeapDeleterFreesAnArrayFromNew)
 {
     // The deleter without an allocator is what adopted new[] arrays get.
-    SampleAllocator::Array adopted(new int16_t[10], SampleAllocator::Deleter());
+    int16_t* const raw = new int16_t[10];
+    ArrayDeleteWatch watch(raw);
+    SampleAllocator::Array adopted(raw, SampleAllocator::Deleter());
+    EXPECT_EQ(adopted.get_deleter().owner, nullptr);
     adopted[9] = 1;
+    EXPECT_EQ(watch.Count(), 0);
     adopted.reset();
-    SUCCEED();
+    EXPECT_EQ(watch.Count(), 1);
+}
+
+TEST(SampleAllocatorTest, MappedArrayIsNotFreedWithDelete)
+{
+    SampleAllocator allocator(TestLimits());
+    auto array = allocator.Allocate(Samples(8 * kMiB));
+    ASSERT_NE(array, nullptr);
+    ArrayDeleteWatch watch(array.get());
+    array.reset();
+    EXPECT_EQ(watch.Count(), 0);
+    EXPECT_EQ(allocator.CachedBlocks(), 1u);
 }
 
 #if defined(__SANITIZE_ADDRESS__)

@@ -72,3 +72,102 @@ TEST(MessageCodesTest, CodesAreTheirFourCharactersBigEndian)
 
 }  // namespace
 }  // namespace glimmet
+
+namespace glimmet {
+namespace {
+
+TEST(MessageInfoTest, FieldsByIndexInTheOrderTheyWereAdded)
+{
+    Message message(kMsgSimpleData);
+    message.AddString("name", "a");
+    message.AddInt64("frame", 5);
+    message.AddString("name", "b");
+    message.AddPath("file", "/tmp/x.wav");
+
+    std::string name;
+    Message::FieldType type{};
+    int32_t count = 0;
+    ASSERT_EQ(message.GetInfo(0, &name, &type, &count), B_OK);
+    EXPECT_EQ(name, "name");
+    EXPECT_EQ(type, Message::FieldType::kString);
+    EXPECT_EQ(count, 2);
+    ASSERT_EQ(message.GetInfo(1, &name, &type, &count), B_OK);
+    EXPECT_EQ(name, "frame");
+    EXPECT_EQ(type, Message::FieldType::kInt64);
+    EXPECT_EQ(count, 1);
+    ASSERT_EQ(message.GetInfo(2, &name, &type, nullptr), B_OK);
+    EXPECT_EQ(name, "file");
+    EXPECT_EQ(type, Message::FieldType::kPath);
+    EXPECT_EQ(message.GetInfo(3, &name, &type, &count), B_BAD_INDEX);
+    EXPECT_EQ(message.GetInfo(-1, nullptr, nullptr, nullptr), B_BAD_INDEX);
+    EXPECT_EQ(name, "file");
+}
+
+TEST(MessageInfoTest, EveryKindReportsItsType)
+{
+    Message message;
+    message.AddInt32("i32", 1);
+    message.AddInt64("i64", 1);
+    message.AddBool("bool", true);
+    message.AddFloat("float", 1.0f);
+    message.AddPointer("pointer", &message);
+    message.AddString("string", "s");
+    message.AddPath("path", "/");
+    const Message::FieldType expected[] = {
+        Message::FieldType::kInt32,   Message::FieldType::kInt64,  Message::FieldType::kBool,
+        Message::FieldType::kFloat,   Message::FieldType::kPointer, Message::FieldType::kString,
+        Message::FieldType::kPath,
+    };
+    for (int32_t i = 0; i < 7; i++) {
+        Message::FieldType type{};
+        ASSERT_EQ(message.GetInfo(i, nullptr, &type, nullptr), B_OK);
+        EXPECT_EQ(type, expected[i]) << i;
+    }
+}
+
+TEST(MessageInfoTest, InfoByName)
+{
+    Message message;
+    message.AddBool("flag", true);
+    message.AddBool("flag", false);
+    Message::FieldType type{};
+    int32_t count = 0;
+    EXPECT_EQ(message.GetInfo("flag", &type, &count), B_OK);
+    EXPECT_EQ(type, Message::FieldType::kBool);
+    EXPECT_EQ(count, 2);
+    EXPECT_EQ(message.GetInfo("missing", &type, &count), B_NAME_NOT_FOUND);
+    EXPECT_EQ(count, 2);
+}
+
+TEST(MessageInfoTest, CopyValueAppendsOneValueOfAnyType)
+{
+    Message from;
+    from.AddFloat("gain", 0.25f);
+    from.AddFloat("gain", 0.75f);
+    Message to;
+    to.AddFloat("gain", 1.0f);
+    EXPECT_EQ(to.CopyValue(from, "gain", 1), B_OK);
+    float gain = 0;
+    ASSERT_EQ(to.FindFloat("gain", &gain, 1), B_OK);
+    EXPECT_EQ(gain, 0.75f);
+    EXPECT_EQ(to.CopyValue(from, "gain", 2), B_BAD_INDEX);
+    EXPECT_EQ(to.CopyValue(from, "loss", 0), B_NAME_NOT_FOUND);
+    to.AddInt32("count", 1);
+    from.AddString("count", "one");
+    EXPECT_EQ(to.CopyValue(from, "count", 0), B_BAD_TYPE);
+    EXPECT_EQ(to.CountValues("gain"), 2);
+    EXPECT_EQ(to.CountValues("count"), 1);
+}
+
+TEST(MessageInfoTest, CopyValueFromItself)
+{
+    Message message;
+    message.AddString("word", "again");
+    EXPECT_EQ(message.CopyValue(message, "word", 0), B_OK);
+    std::string word;
+    ASSERT_EQ(message.FindString("word", &word, 1), B_OK);
+    EXPECT_EQ(word, "again");
+}
+
+}  // namespace
+}  // namespace glimmet

@@ -43,16 +43,60 @@ TEST_F(ZoomSliderTest, StartsWithBothHandlesAtTheEnds)
     EXPECT_EQ(slider.Track(), kTrack);
 }
 
+// Worked by hand for frames 0 .. 9999 and a minimum range of 100: the
+// handles travel over 9999 - 0 - 100 + 1 = 9900 frames, the first frame is
+// 0 + trunc(9900 * left) and the last 0 + 100 + trunc(9900 * right) - 1.
 TEST_F(ZoomSliderTest, FramesFromFractions)
 {
-    const int64_t travel = 9999 - 0 - 100 + 1;
+    // 9900 * 0.25 = 2475; 9900 * 0.5 = 4950, 100 + 4950 - 1 = 5049.
     slider.SetLeft(0.25f, false);
     slider.SetRight(0.5f, false);
-    EXPECT_EQ(slider.FirstFrame(), int64_t(std::trunc(float(travel) * 0.25f)));
-    EXPECT_EQ(slider.LastFrame(), 100 + int64_t(std::trunc(float(travel) * 0.5f)) - 1);
-    // Equal handles select exactly the minimum range.
+    EXPECT_EQ(slider.FirstFrame(), 2475);
+    EXPECT_EQ(slider.LastFrame(), 5049);
+    // Equal handles select exactly the minimum range: 100 + 2475 - 1 = 2574.
     slider.SetRight(0.25f, false);
+    EXPECT_EQ(slider.LastFrame(), 2574);
     EXPECT_EQ(slider.LastFrame() - slider.FirstFrame() + 1, 100);
+}
+
+TEST_F(ZoomSliderTest, FramesAtTheEnds)
+{
+    // Both handles at 0: frames 0 .. 0 + 100 + 0 - 1 = 99.
+    slider.SetBoth(0.0f, 0.0f);
+    EXPECT_EQ(slider.FirstFrame(), 0);
+    EXPECT_EQ(slider.LastFrame(), 99);
+    // Both at 1: 9900 .. 100 + 9900 - 1 = 9999, the last hundred frames.
+    slider.SetBoth(1.0f, 1.0f);
+    EXPECT_EQ(slider.FirstFrame(), 9900);
+    EXPECT_EQ(slider.LastFrame(), 9999);
+    // The whole: 0 .. 9999.
+    slider.SetBoth(0.0f, 1.0f);
+    EXPECT_EQ(slider.FirstFrame(), 0);
+    EXPECT_EQ(slider.LastFrame(), 9999);
+}
+
+TEST_F(ZoomSliderTest, FramesAreTruncatedNotRounded)
+{
+    // 0.3333f is 0.33329999..., 9900 * 0.3333 = 3299.67, truncated to 3299.
+    // 0.99999f is 0.99998998..., 9900 * 0.99999 = 9899.90, truncated to
+    // 9899, so the last frame is 100 + 9899 - 1 = 9998, one short of the end.
+    slider.SetBoth(0.3333f, 0.99999f);
+    EXPECT_EQ(slider.FirstFrame(), 3299);
+    EXPECT_EQ(slider.LastFrame(), 9998);
+}
+
+TEST_F(ZoomSliderTest, FramesCountFromTheLowValue)
+{
+    // Low 1000: travel 9999 - 1000 - 100 + 1 = 8900; 8900 * 0.5 = 4450, so
+    // the first frame is 1000 + 4450 = 5450 and the last 1000 + 100 + 4450
+    // - 1 = 5549; at 0 .. 1 the frames are 1000 .. 1000 + 100 + 8900 - 1.
+    slider.SetLowValue(1000, false);
+    slider.SetBoth(0.5f, 0.5f);
+    EXPECT_EQ(slider.FirstFrame(), 5450);
+    EXPECT_EQ(slider.LastFrame(), 5549);
+    slider.SetBoth(0.0f, 1.0f);
+    EXPECT_EQ(slider.FirstFrame(), 1000);
+    EXPECT_EQ(slider.LastFrame(), 9999);
 }
 
 TEST_F(ZoomSliderTest, NotificationCarriesTheFramesAndDisarms)
