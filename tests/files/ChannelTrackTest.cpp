@@ -180,6 +180,33 @@ TEST_F(ChannelTrackTest, ReloadingReplacesTheOldData)
     EXPECT_EQ(ChannelSamples(channel), SoundFixtures::Pattern(200, 1, 9));
 }
 
+TEST_F(ChannelTrackTest, FailedReloadOfAnotherLengthLetsTheOldSamplesGo)
+{
+    // The count of the failed load is kept; samples of another length would
+    // be read past their end.
+    MediaFile longer(fixtures.Encode("long.wav", SoundFixtures::Pattern(300, 1), 8000, 1));
+    MediaFile shorter(fixtures.Encode("short.wav", SoundFixtures::Pattern(100, 1), 8000, 1));
+    Channel channel;
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, longer.TrackAt(0), 0));
+    EXPECT_FALSE(ChannelTrackLoader::Load(channel, shorter.TrackAt(0), 2));
+    EXPECT_EQ(channel.FrameCount(), 100);
+    EXPECT_EQ(channel.Data(), nullptr);
+    std::vector<int16_t> buffer(50, 7);
+    ASSERT_TRUE(channel.FillBuffer(buffer.data(), 0, 50));
+    EXPECT_EQ(buffer, std::vector<int16_t>(50, 0));
+}
+
+TEST_F(ChannelTrackTest, FailedReloadOfTheSameLengthKeepsTheOldSamples)
+{
+    MediaFile first(fixtures.Encode("first.wav", SoundFixtures::Pattern(200, 1), 8000, 1));
+    MediaFile second(fixtures.Encode("second.wav", SoundFixtures::Pattern(200, 1, 9), 8000, 1));
+    Channel channel;
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, first.TrackAt(0), 0));
+    EXPECT_FALSE(ChannelTrackLoader::Load(channel, second.TrackAt(0), 2));
+    EXPECT_EQ(channel.FrameCount(), 200);
+    EXPECT_EQ(ChannelSamples(channel), SoundFixtures::Pattern(200, 1));
+}
+
 }  // namespace
 }  // namespace glimmet
 
