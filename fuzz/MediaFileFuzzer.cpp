@@ -14,6 +14,7 @@ extern "C" {
 }
 
 #include "RecordingTarget.h"
+#include "files/ChannelTrackLoader.h"
 #include "files/DocumentLoader.h"
 #include "files/MediaFile.h"
 #include "files/MediaFormat.h"
@@ -66,7 +67,7 @@ bool ExerciseTrack(MediaTrack* track)
     if (frames * int64_t(decoded.raw_audio.channel_count) > kMaxLoadedSamples)
         return false;
     Channel channel;
-    channel.SetTo(track, 0);
+    ChannelTrackLoader::Load(channel, track, 0);
     DocumentLoader::LoadChannels(track, decoded);
     return true;
 }

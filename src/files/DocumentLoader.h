@@ -46,7 +46,7 @@ public:
 
     /// The channels of an audio track from one decoding pass, in track order;
     /// a channel that could not be had (no frames, no memory) is null. The
-    /// result is what Channel::SetTo(track, k) gives for each k, without
+    /// result is what ChannelTrackLoader::Load gives for each channel k, without
     /// decoding the track once per channel. decoded is the format the track
     /// agreed to.
     static std::vector<std::unique_ptr<Channel>> LoadChannels(MediaTrack* track, const media_format& decoded);

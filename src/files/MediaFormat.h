@@ -5,14 +5,20 @@
 
 namespace glimmet {
 
-/// What kind of data a track holds.
+// The vocabulary of media formats, shared by the file readers and the
+// playback graph. The numbers are those of the media framework the program
+// was first written against, so that diagnostics and format negotiation read
+// the same as there; plain enumerations, since the graph carries them in
+// int32_t and uint32_t fields.
+
+/// What kind of data a track or a connection holds.
 enum media_type : int32_t {
     B_MEDIA_NO_TYPE = -1,
     B_MEDIA_UNKNOWN_TYPE = 0,
     B_MEDIA_RAW_AUDIO = 1,
     B_MEDIA_RAW_VIDEO = 2,
-    B_MEDIA_ENCODED_AUDIO = 4,
-    B_MEDIA_ENCODED_VIDEO = 5,
+    B_MEDIA_ENCODED_AUDIO = 10,
+    B_MEDIA_ENCODED_VIDEO = 11,
 };
 
 /// Sample formats of raw audio; 0 is the wildcard ("any").

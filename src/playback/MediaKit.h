@@ -2,30 +2,16 @@
 
 #include <cstdint>
 
+// Media types, sample formats and byte orders are the files layer's, so that
+// a track's format and a connection's format use the same numbers.
+#include "files/MediaFormat.h"
+
 namespace glimmet {
 
-// The vocabulary of the playback graph: media types, sample formats, run
-// modes, event types and the endpoints of a connection. The numbers are those
-// of the media framework the producer was first written against, so that the
-// diagnostics and the negotiation read the same.
-
-// Media types.
-inline constexpr int32_t B_MEDIA_UNKNOWN_TYPE = 0;
-inline constexpr int32_t B_MEDIA_RAW_AUDIO = 1;
-inline constexpr int32_t B_MEDIA_RAW_VIDEO = 2;
-inline constexpr int32_t B_MEDIA_ENCODED_AUDIO = 10;
-inline constexpr int32_t B_MEDIA_ENCODED_VIDEO = 11;
-
-// Raw audio sample formats.
-inline constexpr uint32_t B_AUDIO_UCHAR = 0x11;
-inline constexpr uint32_t B_AUDIO_CHAR = 0x1;
-inline constexpr uint32_t B_AUDIO_SHORT = 0x2;
-inline constexpr uint32_t B_AUDIO_INT = 0x4;
-inline constexpr uint32_t B_AUDIO_FLOAT = 0x24;
-
-// Byte orders.
-inline constexpr uint32_t B_MEDIA_BIG_ENDIAN = 1;
-inline constexpr uint32_t B_MEDIA_LITTLE_ENDIAN = 2;
+// The vocabulary of the playback graph: run modes, event types and the
+// endpoints of a connection. The numbers are those of the media framework
+// the producer was first written against, so that the diagnostics and the
+// negotiation read the same.
 
 // Run modes of a node.
 inline constexpr int32_t B_OFFLINE = 1;

@@ -4,10 +4,6 @@
 #include <cstdio>
 #include <cstring>
 #include <new>
-#include <vector>
-
-#include "files/MediaFormat.h"
-#include "files/MediaTrack.h"
 
 namespace glimmet {
 
@@ -41,68 +37,6 @@ void Channel::Install(SampleArray samples, int64_t count)
 {
     samples_ = std::move(samples);
     count_ = count;
-}
-
-bool Channel::SetTo(MediaTrack* track, uint32_t index)
-{
-    std::lock_guard guard(lock_);
-    if (track == nullptr || track->InitCheck() != B_OK)
-        return false;
-    count_ = track->CountFrames();
-    if (count_ <= 0)
-        return false;
-    int32_t channels = 0;
-    size_t bufferSize = 0;
-    if (!AcceptTrackFormat(track, index, &channels, &bufferSize))
-        return false;
-    samples_.reset();
-    pan_ = index % 2 == 1 ? kPanRight : kPanLeft;
-    samples_ = Allocate(count_);
-    // The lock is released on this failure too: the caller deletes the
-    // channel, and a lock must not be destroyed while held.
-    if (samples_ == nullptr)
-        return false;
-    ReadTrackChannel(track, index, channels, bufferSize);
-    return true;
-}
-
-bool Channel::AcceptTrackFormat(MediaTrack* track, uint32_t index, int32_t* channels, size_t* bufferSize)
-{
-    media_format encoded;
-    if (track->EncodedFormat(&encoded) != B_OK
-        || (encoded.type != B_MEDIA_RAW_AUDIO && encoded.type != B_MEDIA_ENCODED_AUDIO))
-        return false;
-    media_format decoded;
-    decoded.type = B_MEDIA_RAW_AUDIO;
-    decoded.raw_audio = media_raw_audio_format::wildcard;
-    decoded.raw_audio.format = B_AUDIO_SHORT;
-    if (track->DecodedFormat(&decoded) != B_OK)
-        return false;
-    frameRate_ = decoded.raw_audio.frame_rate;
-    // Strictly smaller, so an index equal to the channel count passes; it
-    // then picks up the samples one position further along.
-    if (decoded.raw_audio.channel_count < index || decoded.raw_audio.channel_count == 0)
-        return false;
-    *channels = int32_t(decoded.raw_audio.channel_count);
-    *bufferSize = decoded.raw_audio.buffer_size;
-    return true;
-}
-
-void Channel::ReadTrackChannel(MediaTrack* track, uint32_t index, int32_t channels, size_t bufferSize)
-{
-    std::vector<int16_t> buffer(2 * bufferSize / sizeof(int16_t) + 1);
-    int64_t seekTo = 0;
-    track->SeekToFrame(&seekTo, 0);
-    int64_t stored = 0;
-    int64_t framesRead = 0;
-    while (track->ReadFrames(buffer.data(), &framesRead) == B_OK) {
-        const int64_t available = std::min<int64_t>(framesRead * channels, int64_t(buffer.size()));
-        // Frames beyond the counted length have no place in the array.
-        for (int64_t position = index; position < available && stored < count_; position += channels)
-            samples_[size_t(stored++)] = buffer[size_t(position)];
-    }
-    // A decode that came up short leaves silence, not stale memory.
-    FillZeros(samples_.get() + stored, count_ - stored);
 }
 
 bool Channel::SetTo(int16_t* samples, int64_t count)
@@ -401,6 +335,14 @@ void Channel::SetFrameRate(float rate)
 {
     std::lock_guard guard(lock_);
     frameRate_ = rate;
+}
+
+void Channel::SetFrameCount(int64_t count)
+{
+    std::lock_guard guard(lock_);
+    if (count != count_)
+        samples_.reset();
+    count_ = count;
 }
 
 int64_t Channel::FrameCount()

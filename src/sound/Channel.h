@@ -10,8 +10,6 @@
 
 namespace glimmet {
 
-class MediaTrack;
-
 /// One mono track of the document: signed 16-bit samples placed on the
 /// timeline at a first frame, with its own mute flag, selection flag and pan.
 ///
@@ -28,16 +26,6 @@ public:
     ~Channel();
     Channel(const Channel&) = delete;
     Channel& operator=(const Channel&) = delete;
-
-    /// Loads channel index of an audio track: the track's frame count, its
-    /// decoded rate, its samples (signed 16-bit), and the pan of a stereo
-    /// pair (odd index right, even index left). False when the track is
-    /// missing or not audio, cannot be decoded to 16-bit, has no frames, or
-    /// the array cannot be had; the frame count (and from the decoded format
-    /// on, the rate) stay stored even then. A decode that yields fewer frames
-    /// than counted leaves the rest silent; frames beyond the count are
-    /// dropped. Decodes the whole track from its start.
-    bool SetTo(MediaTrack* track, uint32_t index);
 
     /// Adopts samples (allocated with new[]) as this channel's data; false,
     /// changing nothing, for a null pointer or a count below 1. Meant for a
@@ -121,6 +109,11 @@ public:
 
     /// Loading from a track stores the decoded rate here.
     void SetFrameRate(float rate);
+    /// Loading from a track stores the counted length here before it knows
+    /// whether the samples can be had, and keeps it when they cannot.
+    /// Samples held already stay only when they have that length, so the
+    /// count never promises more samples than the array holds.
+    void SetFrameCount(int64_t count);
 
 private:
     /// Frees through the deleter that knows where the memory came from: the
@@ -134,9 +127,6 @@ private:
     /// The lock is held.
     bool FindSamples(int64_t start, int64_t count, const int16_t** samples, int64_t* offset, int64_t* length) const;
     void Install(SampleArray samples, int64_t count);
-    /// Steps of loading from a track; each false ends the load.
-    bool AcceptTrackFormat(MediaTrack* track, uint32_t index, int32_t* channels, size_t* bufferSize);
-    void ReadTrackChannel(MediaTrack* track, uint32_t index, int32_t channels, size_t bufferSize);
     status_t InsertIntoData(const int16_t* frames, int64_t count, int64_t at);
     status_t ReplaceInData(const int16_t* frames, int64_t count, int64_t from, int64_t to);
     status_t ReplaceAll(const int16_t* frames, int64_t count, int64_t first);

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "SoundFixtures.h"
+#include "files/ChannelTrackLoader.h"
 #include "files/DocumentLoader.h"
 #include "files/MediaFile.h"
 #include "files/MediaFormat.h"
@@ -37,8 +38,8 @@ TEST_F(ChannelTrackTest, LoadsEachChannelWithItsPan)
     MediaTrack* track = file.TrackAt(0);
     Channel left;
     Channel right;
-    ASSERT_TRUE(left.SetTo(track, 0));
-    ASSERT_TRUE(right.SetTo(track, 1));
+    ASSERT_TRUE(ChannelTrackLoader::Load(left, track, 0));
+    ASSERT_TRUE(ChannelTrackLoader::Load(right, track, 1));
     EXPECT_EQ(left.PanPosition(), Channel::kPanLeft);
     EXPECT_EQ(right.PanPosition(), Channel::kPanRight);
     EXPECT_EQ(left.FrameCount(), 5000);
@@ -55,7 +56,7 @@ TEST_F(ChannelTrackTest, PansAlternateOverManyChannels)
     MediaFile file(fixtures.Encode("five.wav", SoundFixtures::Pattern(100, 5), 8000, 5));
     for (uint32_t k = 0; k < 5; ++k) {
         Channel channel;
-        ASSERT_TRUE(channel.SetTo(file.TrackAt(0), k));
+        ASSERT_TRUE(ChannelTrackLoader::Load(channel, file.TrackAt(0), k));
         EXPECT_EQ(channel.PanPosition(), k % 2 == 0 ? Channel::kPanLeft : Channel::kPanRight) << k;
     }
 }
@@ -63,12 +64,12 @@ TEST_F(ChannelTrackTest, PansAlternateOverManyChannels)
 TEST_F(ChannelTrackTest, FailsForMissingTrackAndNonAudio)
 {
     Channel channel;
-    EXPECT_FALSE(channel.SetTo(static_cast<MediaTrack*>(nullptr), 0));
+    EXPECT_FALSE(ChannelTrackLoader::Load(channel, static_cast<MediaTrack*>(nullptr), 0));
     const auto video = fixtures.PathOf("video.mkv");
     ASSERT_TRUE(SoundFixtures::Run("ffmpeg -nostdin -v error -y -f lavfi -i testsrc=size=32x32:rate=5:duration=1 "
                                    "-c:v ffv1 " + SoundFixtures::Quote(video)));
     MediaFile file(video);
-    EXPECT_FALSE(channel.SetTo(file.TrackAt(0), 0));
+    EXPECT_FALSE(ChannelTrackLoader::Load(channel, file.TrackAt(0), 0));
     EXPECT_EQ(channel.FrameCount(), 0);
     EXPECT_EQ(channel.Data(), nullptr);
 }
@@ -77,7 +78,7 @@ TEST_F(ChannelTrackTest, IndexBeyondTheChannelsFails)
 {
     MediaFile file(fixtures.Encode("mono.wav", SoundFixtures::Pattern(100, 1), 8000, 1));
     Channel channel;
-    EXPECT_FALSE(channel.SetTo(file.TrackAt(0), 2));
+    EXPECT_FALSE(ChannelTrackLoader::Load(channel, file.TrackAt(0), 2));
     // The count was stored before the failure, and so was the rate.
     EXPECT_EQ(channel.FrameCount(), 100);
     EXPECT_EQ(channel.FrameRate(), 8000.0f);
@@ -90,7 +91,7 @@ TEST_F(ChannelTrackTest, IndexEqualToTheChannelCountPassesTheCheck)
     const std::vector<int16_t> source = SoundFixtures::Pattern(100, 1);
     MediaFile file(fixtures.Encode("mono.wav", source, 8000, 1));
     Channel channel;
-    ASSERT_TRUE(channel.SetTo(file.TrackAt(0), 1));
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, file.TrackAt(0), 1));
     EXPECT_EQ(channel.PanPosition(), Channel::kPanRight);
     const std::vector<int16_t> samples = ChannelSamples(channel);
     ASSERT_EQ(samples.size(), 100u);
@@ -105,7 +106,7 @@ TEST_F(ChannelTrackTest, EmptyTrackFails)
     if (file.InitCheck() != B_OK)
         GTEST_SKIP() << "ffmpeg made no file for zero frames";
     Channel channel;
-    EXPECT_FALSE(channel.SetTo(file.TrackAt(0), 0));
+    EXPECT_FALSE(ChannelTrackLoader::Load(channel, file.TrackAt(0), 0));
     EXPECT_EQ(channel.FrameCount(), 0);
 }
 
@@ -119,7 +120,7 @@ TEST_F(ChannelTrackTest, ShorterDecodeThanCountedLeavesZeros)
     const std::vector<int16_t> shorter = SoundFixtures::Pattern(1500, 1, 3);
     ASSERT_FALSE(fixtures.Encode("changing.wav", shorter, 8000, 1).empty());
     Channel channel;
-    ASSERT_TRUE(channel.SetTo(track, 0));
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, track, 0));
     std::vector<int16_t> expected = shorter;
     expected.resize(4000, 0);
     EXPECT_EQ(ChannelSamples(channel), expected);
@@ -134,7 +135,7 @@ TEST_F(ChannelTrackTest, LongerDecodeThanCountedIsCut)
     const std::vector<int16_t> longer = SoundFixtures::Pattern(9000, 2, 5);
     ASSERT_FALSE(fixtures.Encode("growing.wav", longer, 8000, 2).empty());
     Channel channel;
-    ASSERT_TRUE(channel.SetTo(track, 1));
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, track, 1));
     const std::vector<int16_t> column = Column(longer, 2, 1);
     EXPECT_EQ(ChannelSamples(channel), std::vector<int16_t>(column.begin(), column.begin() + 1000));
 
@@ -159,7 +160,7 @@ TEST_F(ChannelTrackTest, OnePassLoadingEqualsLoadingEachChannel)
         ASSERT_EQ(together.size(), size_t(channels));
         for (uint32_t k = 0; k < uint32_t(channels); ++k) {
             Channel single;
-            ASSERT_TRUE(single.SetTo(track, k));
+            ASSERT_TRUE(ChannelTrackLoader::Load(single, track, k));
             ASSERT_NE(together[k], nullptr);
             EXPECT_EQ(ChannelSamples(*together[k]), ChannelSamples(single)) << name << " channel " << k;
             EXPECT_EQ(together[k]->PanPosition(), single.PanPosition());
@@ -174,9 +175,36 @@ TEST_F(ChannelTrackTest, ReloadingReplacesTheOldData)
     MediaFile first(fixtures.Encode("a.wav", SoundFixtures::Pattern(300, 1), 8000, 1));
     MediaFile second(fixtures.Encode("b.wav", SoundFixtures::Pattern(200, 1, 9), 8000, 1));
     Channel channel;
-    ASSERT_TRUE(channel.SetTo(first.TrackAt(0), 0));
-    ASSERT_TRUE(channel.SetTo(second.TrackAt(0), 0));
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, first.TrackAt(0), 0));
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, second.TrackAt(0), 0));
     EXPECT_EQ(ChannelSamples(channel), SoundFixtures::Pattern(200, 1, 9));
+}
+
+TEST_F(ChannelTrackTest, FailedReloadOfAnotherLengthLetsTheOldSamplesGo)
+{
+    // The count of the failed load is kept; samples of another length would
+    // be read past their end.
+    MediaFile longer(fixtures.Encode("long.wav", SoundFixtures::Pattern(300, 1), 8000, 1));
+    MediaFile shorter(fixtures.Encode("short.wav", SoundFixtures::Pattern(100, 1), 8000, 1));
+    Channel channel;
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, longer.TrackAt(0), 0));
+    EXPECT_FALSE(ChannelTrackLoader::Load(channel, shorter.TrackAt(0), 2));
+    EXPECT_EQ(channel.FrameCount(), 100);
+    EXPECT_EQ(channel.Data(), nullptr);
+    std::vector<int16_t> buffer(50, 7);
+    ASSERT_TRUE(channel.FillBuffer(buffer.data(), 0, 50));
+    EXPECT_EQ(buffer, std::vector<int16_t>(50, 0));
+}
+
+TEST_F(ChannelTrackTest, FailedReloadOfTheSameLengthKeepsTheOldSamples)
+{
+    MediaFile first(fixtures.Encode("first.wav", SoundFixtures::Pattern(200, 1), 8000, 1));
+    MediaFile second(fixtures.Encode("second.wav", SoundFixtures::Pattern(200, 1, 9), 8000, 1));
+    Channel channel;
+    ASSERT_TRUE(ChannelTrackLoader::Load(channel, first.TrackAt(0), 0));
+    EXPECT_FALSE(ChannelTrackLoader::Load(channel, second.TrackAt(0), 2));
+    EXPECT_EQ(channel.FrameCount(), 200);
+    EXPECT_EQ(ChannelSamples(channel), SoundFixtures::Pattern(200, 1));
 }
 
 }  // namespace

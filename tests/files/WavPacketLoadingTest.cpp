@@ -8,6 +8,7 @@
 #include "RecordingTarget.h"
 #include "SoundFixtures.h"
 #include "WavBytes.h"
+#include "files/ChannelTrackLoader.h"
 #include "files/DocumentLoader.h"
 #include "files/MediaFile.h"
 #include "files/MediaTrack.h"
@@ -117,7 +118,7 @@ TEST_P(WavPacketLoadingTest, EachChannelAloneEqualsTheOnePassLoad)
     ASSERT_NE(track, nullptr);
     for (int32_t k = 0; k < c.channels; ++k) {
         Channel alone;
-        ASSERT_TRUE(alone.SetTo(track, uint32_t(k)));
+        ASSERT_TRUE(ChannelTrackLoader::Load(alone, track, uint32_t(k)));
         Channel* loaded = window.manager.ChannelAt(k);
         ASSERT_EQ(alone.FrameCount(), loaded->FrameCount());
         for (int64_t i = 0; i < alone.FrameCount(); ++i)
