@@ -44,7 +44,7 @@ void CopyName(char* to, const char* from)
 }  // namespace
 
 AudioProducer::AudioProducer(ChannelManager* manager, MessageTarget* looper)
-    : manager_(manager), relay_(looper)
+    : manager_(manager), mixer_(manager), relay_(looper)
 {
     preferredFormat_.type = B_MEDIA_RAW_AUDIO;
     preferredFormat_.frameRate = 44100;
@@ -140,6 +140,7 @@ status_t AudioProducer::FormatChangeRequested(const MediaSource& source, const M
     if (format == nullptr)
         return B_BAD_VALUE;
     output_.format = *format;
+    PrepareMixer(output_.format);
     AllocateBuffers(output_.format);
     return B_OK;
 }
@@ -228,13 +229,14 @@ void AudioProducer::Connect(status_t error, const MediaSource&, const MediaDesti
     downstreamLatency_.store(downstreamLatency, std::memory_order_relaxed);
 
     // The trial mix is a real one: it moves the document's play position on
-    // by one buffer, which the window resets before playing anyway.
+    // by one buffer, which the window resets before playing anyway. It runs
+    // on the prepared mixer, so it measures what playback will cost.
+    PrepareMixer(format);
     const uint32_t bufferSize = std::min(format.bufferSize, kLargestBufferSize);
     const int64_t frames = MixFramesPerBuffer(bufferSize, format.channelCount);
     std::vector<float> trial(std::max<size_t>(bufferSize / 4, size_t(frames) * 2));
     const int64_t before = system_time();
-    if (manager_ != nullptr)
-        manager_->FillBuffer(trial.data(), frames);
+    Mix(trial.data(), frames);
     const int64_t internal = system_time() - before;
     internalLatency_.store(internal, std::memory_order_relaxed);
     std::printf("\tbuffer-filling took %" PRId64 " usec on this machine\n", internal);
@@ -244,6 +246,27 @@ void AudioProducer::Connect(status_t error, const MediaSource&, const MediaDesti
     SetBufferDuration(samplesPerSecond > 0 ? int64_t(format.bufferSize / 4) * 1000000 / samplesPerSecond : 0);
     if (bufferGroup_ == nullptr)
         AllocateBuffers(output_.format);
+}
+
+void AudioProducer::PrepareMixer(const MediaFormat& format)
+{
+    // Buffers beyond the largest size get no buffers at all (see
+    // AllocateBuffers), so the mixer need not hold them either.
+    const uint32_t bufferSize = std::min(format.bufferSize, kLargestBufferSize);
+    mixer_.Prepare(MixFramesPerBuffer(bufferSize, format.channelCount));
+}
+
+bool AudioProducer::Mix(float* out, int64_t frames)
+{
+    if (manager_ == nullptr)
+        return false;
+    bool reachedEnd = false;
+    const bool mixed = mixer_.FillBuffer(out, frames, &reachedEnd);
+    // Queued before this buffer's update, as the mix reaches the end before
+    // the update reports where it left the play position.
+    if (reachedEnd)
+        relay_.PostStop();
+    return mixed;
 }
 
 void AudioProducer::AllocateBuffers(const MediaFormat& format, bool requirePositiveDuration)
@@ -428,7 +451,7 @@ BufferGroup::Buffer* AudioProducer::FillNextBuffer(int64_t eventTime)
     }
     const size_t floats = bufferSize / 4;
     const int64_t frames = MixFramesPerBuffer(bufferSize, output_.format.channelCount);
-    if (manager_ == nullptr || !manager_->FillBuffer(buffer->data.data(), frames))
+    if (!Mix(buffer->data.data(), frames))
         std::fill_n(buffer->data.begin(), floats, 0.0f);
     buffer->sizeUsed = floats * 4;
 

@@ -8,6 +8,7 @@
 #include "playback/BufferGroup.h"
 #include "playback/MediaKit.h"
 #include "playback/PlaymarkRelay.h"
+#include "sound/Mixer.h"
 #include "support/Status.h"
 
 namespace glimmet {
@@ -18,7 +19,8 @@ class MessageTarget;
 
 /// The node that plays a document: it mixes one buffer of stereo float at a
 /// time from the ChannelManager, stamps it with a performance time, hands it
-/// to the sound device and tells the window where playback is ('udpm').
+/// to the sound device and tells the window where playback is ('udpm') and,
+/// at the end of a range that does not loop, that it has stopped ('stop').
 ///
 /// Negotiation and connection (the Format*, PrepareToConnect, Connect,
 /// Disconnect, SetBufferGroup hooks) run on the window thread while the
@@ -26,7 +28,8 @@ class MessageTarget;
 /// the window thread; the device's audio thread runs them, and every buffer,
 /// in ServeDevice. Run mode, output enable and the latencies are atomics that
 /// either thread may set. Everything the audio thread touches per buffer is
-/// allocated at connection.
+/// allocated at connection, the mixer's scratch included; both messages go
+/// through the relay, never through Qt's queue from the audio thread.
 class AudioProducer {
 public:
     static constexpr const char* kNodeName = "Glimmet";
@@ -142,6 +145,11 @@ private:
     bool IsOurSource(const MediaSource& source) const { return source == output_.source; }
     bool IsConnected() const { return !(output_.destination == MediaDestination::Null()); }
     void AllocateBuffers(const MediaFormat& format, bool requirePositiveDuration = true);
+    /// Sizes the mixer for the buffers of the format (window thread).
+    void PrepareMixer(const MediaFormat& format);
+    /// One buffer of frames from the document; false when the mixer gave
+    /// none. Relays the stop at the end of a range that does not loop.
+    bool Mix(float* out, int64_t frames);
     int64_t MixFramesPerBuffer(uint32_t bufferSize, uint32_t channelCount) const;
     int64_t TimeOfFramesSent(int64_t frames) const;
     void QueueNextBuffer();
@@ -159,7 +167,8 @@ private:
     MediaOutput output_;
     MediaFormat preferredFormat_;
     ChannelManager* manager_;  // not owned
-    PlaymarkRelay relay_;      // carries 'udpm' to the looper (the window)
+    Mixer mixer_;              // sized at connection; the audio thread's own
+    PlaymarkRelay relay_;      // carries 'udpm' and 'stop' to the looper (the window)
     DeviceTimeSource* timeSource_ = nullptr;  // not owned
     int32_t nodeId_ = -1;
     int32_t priority_ = 0;

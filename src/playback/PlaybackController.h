@@ -19,8 +19,8 @@ class PlaybackWindow;
 /// The window owns one, forwards 'play', 'pfcr', 'cnpl', 'stop', 'udpm',
 /// 'pmup', 'plmd' and 'loop' to MessageReceived, calls SetUp when it has
 /// been built and TearDown when it closes. The controller owns the window's
-/// playback graph; its producer posts 'udpm' to the window, and the channel
-/// manager posts 'stop' there at the end of a range that does not loop.
+/// playback graph; its producer relays 'udpm' to the window, and 'stop' at
+/// the end of a range that does not loop.
 ///
 /// Thread use: window thread only, with the document lock not held.
 class PlaybackController {

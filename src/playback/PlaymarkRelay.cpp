@@ -27,17 +27,30 @@ PlaymarkRelay::~PlaymarkRelay()
         close(wakeFd_);
 }
 
+// An update leaves the last slot free, so that a stop (which the window
+// must hear, or playback would go round again) still fits when updates
+// have filled the rest.
 void PlaymarkRelay::Post(int64_t currentFrame, int64_t time)
+{
+    Store(Update{false, currentFrame, time}, kCapacity - 1);
+}
+
+void PlaymarkRelay::PostStop()
+{
+    Store(Update{true, 0, 0}, kCapacity);
+}
+
+void PlaymarkRelay::Store(const Update& update, size_t limit)
 {
     const size_t head = head_.load(std::memory_order_relaxed);
     const size_t tail = tail_.load(std::memory_order_acquire);
-    if (head - tail >= kCapacity) {
+    if (head - tail >= limit) {
         dropped_.fetch_add(1, std::memory_order_relaxed);
         return;
     }
-    ring_[head % kCapacity] = Update{currentFrame, time};
+    ring_[head % kCapacity] = update;
     head_.store(head + 1);
-    // Only the first update after a drain needs to wake the window.
+    // Only the first entry after a drain needs to wake the window.
     if (!wakePending_.exchange(true))
         Wake();
 }
@@ -68,13 +81,22 @@ void PlaymarkRelay::Drain()
         const Update update = ring_[tail % kCapacity];
         ++tail;
         tail_.store(tail, std::memory_order_release);
-        if (window_ != nullptr) {
-            Message message(kMsgUpdatePlaymark);
-            message.AddInt64("current frame", update.currentFrame);
-            message.AddInt64("time", update.time);
-            window_->PostMessage(message);
-        }
+        Deliver(update);
     }
+}
+
+void PlaymarkRelay::Deliver(const Update& update)
+{
+    if (window_ == nullptr)
+        return;
+    if (update.stop) {
+        window_->PostMessage(kMsgStop);
+        return;
+    }
+    Message message(kMsgUpdatePlaymark);
+    message.AddInt64("current frame", update.currentFrame);
+    message.AddInt64("time", update.time);
+    window_->PostMessage(message);
 }
 
 }  // namespace glimmet

@@ -11,21 +11,23 @@ namespace glimmet {
 
 class MessageTarget;
 
-/// Carries the producer's play-position updates from the audio thread to the
-/// window without allocating on the audio thread.
+/// Carries the producer's messages from the audio thread to the window
+/// without allocating or locking on the audio thread: the play-position
+/// updates and the stop at the end of a range that does not loop.
 ///
-/// The audio thread stores each update in a fixed ring and, when the ring
-/// was empty, wakes the thread that made the relay through an eventfd. That
-/// thread then turns every stored update, in order, into an 'udpm' message
-/// with "current frame" and "time" and posts it to the window.
+/// The audio thread stores each one in a fixed ring and, when the ring was
+/// empty, wakes the thread that made the relay through an eventfd. That
+/// thread then turns every stored entry, in order, into an 'udpm' message
+/// with "current frame" and "time", or a bare 'stop', and posts it to the
+/// window. Sharing one ring keeps the stop in its place among the updates.
 ///
 /// Thread use: constructed, destroyed and drained on one thread with a Qt
 /// event loop (the window's); Post is called by one other thread at a time
 /// (the audio thread).
 class PlaymarkRelay {
 public:
-    /// Updates that may wait for the window (about 24 seconds of buffers);
-    /// more are dropped, and counted.
+    /// Entries that may wait for the window (about 24 seconds of buffers);
+    /// more are dropped, and counted. The last slot is kept for a stop.
     static constexpr size_t kCapacity = 4096;
 
     explicit PlaymarkRelay(MessageTarget* window);
@@ -35,20 +37,27 @@ public:
 
     /// Audio thread: queues one update. Never blocks, never allocates.
     void Post(int64_t currentFrame, int64_t time);
+    /// Audio thread: queues a stop behind the updates posted so far. Never
+    /// blocks, never allocates.
+    void PostStop();
 
     /// Window thread: posts every queued update now. Also run by the wake-up.
     void Drain();
 
-    /// Updates lost because the window did not drain in time.
+    /// Entries lost because the window did not drain in time.
     int64_t DroppedUpdates() const { return dropped_.load(std::memory_order_relaxed); }
 
 private:
     struct Update {
+        bool stop;
         int64_t currentFrame;
         int64_t time;
     };
 
+    /// Stores the entry if fewer than limit entries wait.
+    void Store(const Update& update, size_t limit);
     void Wake();
+    void Deliver(const Update& update);
 
     MessageTarget* window_;
     int wakeFd_ = -1;

@@ -12,10 +12,12 @@ namespace glimmet {
 
 class Channel;
 class DocumentWindow;
+class Mixer;
 
 /// The document's sound: its ordered channels, frame rate, range, play mode,
-/// loop flag and play position, and the mixer that turns the channels into
-/// stereo for playback (float) and for saving (16-bit).
+/// loop flag and play position. The Mixer turns it into stereo for playback
+/// (float) and for saving (16-bit); the manager keeps a mixer of its own for
+/// the callers that are not the audio thread.
 ///
 /// The document tells its listeners what changed (DocumentChange masks):
 /// loading, actions and views change the document only, and the views follow
@@ -30,9 +32,6 @@ public:
     static constexpr int32_t kPlayAll = 0;
     static constexpr int32_t kPlayRange = 1;
     static constexpr int32_t kPlayVisible = 2;
-
-    /// How long the mixer tries the window's lock in the visible mode.
-    static constexpr int64_t kWindowLockTimeoutMicros = 100;
 
     explicit ChannelManager(DocumentWindow* window);
     ~ChannelManager();
@@ -91,58 +90,32 @@ public:
     /// The same for every channel at once.
     void ChannelsChanged();
 
-    /// Playback mix: frames interleaved stereo float frames from the current
-    /// frame within the play range, looping or posting a stop at its end.
-    /// False, writing nothing, when the play range is shorter than the buffer.
+    /// For the Mixer, which holds the document lock for a whole buffer and
+    /// reads the list once per channel: the count, and the channel at index
+    /// (0 <= index < CountChannelsLocked()), without taking the lock again.
+    /// The caller holds the document lock.
+    int32_t CountChannelsLocked() const { return int32_t(channels_.size()); }
+    Channel* ChannelAtLocked(int32_t index) const { return channels_[size_t(index)].get(); }
+
+    /// Playback mix (see Mixer) for callers off the audio thread: the
+    /// scratch grows as needed, and 'stop' is posted to the window straight
+    /// away at the end of a range that does not loop. Playback itself mixes
+    /// with the producer's own prepared Mixer.
     bool FillBuffer(float* out, int64_t frames);
 
-    /// Save mix: up to *frames interleaved stereo 16-bit frames from the
-    /// current frame to the end of the document; *frames becomes the number
-    /// produced. False when the current frame has reached the end.
+    /// Save mix (see Mixer): up to *frames interleaved stereo 16-bit frames
+    /// from the current frame to the end of the document; *frames becomes
+    /// the number produced. False when the current frame has reached the end.
     bool FillBuffer(int16_t* out, int64_t* frames);
 
 private:
-    /// count frames of the timeline from frame from, mixed into the buffer
-    /// from index offset on.
-    struct Part {
-        int64_t from;
-        int64_t offset;
-        int64_t count;
-    };
-
     int64_t FrameCountLocked();
-    void PlayRange(int64_t total, int64_t* start, int64_t* end);
-    /// Mixes the parts (which cover the buffer from its start; the rest is
-    /// silence) into interleaved stereo frames.
-    template <typename Sample>
-    void Mix(int32_t channelCount, int64_t frames, const Part* parts, int32_t partCount, Sample* out);
-    void ReserveSums(int32_t channelCount, int64_t frames);
-    /// Adds each heard channel's samples for the part straight from the
-    /// channel into the integer sums of its sides, under the channel's lock.
-    /// The first part of a buffer also notes the sides each channel is heard
-    /// on in sides_.
-    void AddChannels(int32_t channelCount, const Part& part, bool firstPart);
-    void ReserveScratch(int32_t channelCount, int64_t frames);
-    void FillScratch(int32_t channelCount, int64_t frames, int64_t from, int64_t offset, int64_t count);
-    void ZeroScratch(int32_t channelCount, int64_t frames, int64_t offset, int64_t count);
-    /// Sums the scratch arrays of the heard channels into the float sums of
-    /// each side, frame by frame in channel order, and counts the channels
-    /// heard on each.
-    void SumChannelsInFloat(int32_t channelCount, int64_t frames, int32_t* leftCount, int32_t* rightCount);
-    /// Mixes the scratch arrays into interleaved stereo frames.
-    template <typename Sample>
-    void MixScratch(int32_t channelCount, int64_t frames, Sample* out);
     void NotifyChannel(uint32_t change, int32_t index);
     void PostToWindow(uint32_t what, const char* field = nullptr, int64_t value = 0);
 
     // Guarded by lock_.
     std::vector<std::unique_ptr<Channel>> channels_;
-    std::vector<int16_t> scratch_;
-    std::vector<float> leftSum_;
-    std::vector<float> rightSum_;
-    std::vector<int32_t> integerLeft_;
-    std::vector<int32_t> integerRight_;
-    std::vector<uint8_t> sides_;
+    std::unique_ptr<Mixer> mixer_;
 
     DocumentWindow* window_;
     Observable listeners_;

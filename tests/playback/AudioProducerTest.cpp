@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
 #include <random>
 
@@ -418,6 +419,25 @@ TEST_F(ProducerTest, WhenTheMixHasNothingSilenceIsSentAndTimeGoesOn)
     EXPECT_EQ(window.playmarkUpdates, (std::vector<int64_t>{100, 100, 100, 100}));
 }
 
+TEST_F(ProducerTest, AFormatChangePreparesTheMixerForTheNewBuffers)
+{
+    const auto channels = SmallDocument(3000);
+    test::AddChannels(manager.get(), channels);
+    Connect();
+    MediaFormat bigger = RawFloat(4096);
+    ASSERT_EQ(producer->FormatChangeRequested(kOurSource, kDevice, &bigger, nullptr), B_OK);
+    manager->ResetCurrentFrame();
+    ASSERT_EQ(producer->Start(0), B_OK);
+    // The device takes the first 256 of the buffer's 512 frames.
+    const std::vector<float> out = Serve(0);
+    const ReferencePlayback reference(channels, 0, true, -1, -1, 0, 0);
+    const std::vector<float> expected = reference.Play(0, 1, 512);
+    EXPECT_TRUE(std::equal(out.begin(), out.end(), expected.begin()));
+    producer->Relay().Drain();
+    window.ProcessPending();
+    EXPECT_EQ(window.playmarkUpdates, (std::vector<int64_t>{512}));
+}
+
 TEST_F(ProducerTest, DisabledOutputSendsNothingButKeepsTime)
 {
     test::AddChannels(manager.get(), SmallDocument(3000));
@@ -523,6 +543,65 @@ TEST_F(ProducerTest, ServingPeriodsAllocatesNothing)
     producer->Relay().Drain();
     window.ProcessPending();
     EXPECT_EQ(window.playmarkUpdates.size(), 200u);
+}
+
+}  // namespace
+}  // namespace glimmet
+
+namespace glimmet {
+namespace {
+
+// A range that does not loop, played on past its end by the audio thread:
+// the stop travels with the play-mark updates, in the order the mix made
+// them, and nothing on the way allocates.
+TEST_F(ProducerTest, PlayingPastTheEndOfARangeAllocatesNothingAndRelaysOneStopInOrder)
+{
+    const auto channels = SmallDocument(6000);
+    test::AddChannels(manager.get(), channels);
+    Connect();
+    manager->SetPlayMode(ChannelManager::kPlayRange);
+    manager->SetLoop(false);
+    // 1500 frames: five whole buffers and a sixth that ends in silence.
+    manager->SetRangeStart(1000);
+    manager->SetRangeEnd(2499);
+    manager->ResetCurrentFrame();
+    window.ProcessPending();
+    window.received.clear();
+    ASSERT_EQ(producer->Start(0), B_OK);
+
+    constexpr int64_t kPeriods = 8;
+    std::vector<std::vector<float>> periods(kPeriods, std::vector<float>(test::kBufferFrames * 2));
+    int64_t allocations = 0;
+    {
+        test::AllocationCounter counter;
+        for (int64_t period = 0; period < kPeriods; period++) {
+            producer->ServeDevice(
+                periods[size_t(period)].data(), int32_t(test::kBufferFrames), period * test::kBufferFrames);
+        }
+        allocations = counter.Count();
+    }
+    EXPECT_EQ(allocations, 0);
+
+    producer->Relay().Drain();
+    window.ProcessPending();
+    // The sixth buffer reaches the end: its mix asks for the stop before its
+    // update reports the position beyond the range. The two buffers after it
+    // start the range again, without another stop.
+    const uint32_t update = kMsgUpdatePlaymark;
+    EXPECT_EQ(window.received, (std::vector<uint32_t>{update, update, update, update, update, kMsgStop, update,
+                                  update, update}));
+    EXPECT_EQ(window.stopMessages, 1);
+    EXPECT_EQ(window.playmarkUpdates, (std::vector<int64_t>{1256, 1512, 1768, 2024, 2280, 2500, 1256, 1512}));
+
+    const ReferencePlayback reference(channels, ChannelManager::kPlayRange, false, 1000, 2499, 0, 0);
+    const std::vector<float> expected = reference.Play(0, 6);
+    for (int64_t period = 0; period < 6; period++) {
+        EXPECT_TRUE(std::equal(periods[size_t(period)].begin(), periods[size_t(period)].end(),
+            expected.begin() + period * test::kBufferFrames * 2))
+            << period;
+    }
+    // The sixth buffer: 220 frames of the range, then silence.
+    EXPECT_TRUE(std::all_of(periods[5].begin() + 2 * 220, periods[5].end(), [](float v) { return v == 0.0f; }));
 }
 
 }  // namespace

@@ -283,6 +283,7 @@ void FakePlaybackWindow::SetPlayModeButtonMode(int32_t mode)
 
 void FakePlaybackWindow::Receive(const Message& message)
 {
+    received.push_back(message.what);
     if (message.what == kMsgUpdatePlaymark) {
         int64_t frame = 0;
         int64_t time = 0;

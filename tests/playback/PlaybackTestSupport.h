@@ -126,6 +126,8 @@ public:
     /// Runs the event loop until nothing is posted any more.
     void ProcessPending();
 
+    /// The code of every message received, in order.
+    std::vector<uint32_t> received;
     /// Frames of every 'udpm' received, in order.
     std::vector<int64_t> playmarkUpdates;
     std::vector<int64_t> playmarkUpdateTimes;

@@ -524,30 +524,161 @@ TEST_F(ManagerFixture, RemovedChannelsAreNotMixedAndDeletedOnesFreed)
     ExpectMonoFrames(Mix(1), {100});
 }
 
-// Edits on one thread while another mixes, as the window and the audio
-// thread do; run under ThreadSanitizer in CI.
-TEST(ChannelManagerStress, MixingWhileEditing)
+// One edit of the stress document: the numbers that next gives choose it,
+// so the same numbers make the same edit on another document.
+template <typename Next>
+void EditStressDocument(ChannelManager& manager, Next& next, const Samples& block)
 {
-    FakeDocumentWindow window;
-    ChannelManager manager(&window);
+    const int32_t count = manager.CountChannels();
+    Channel* channel = count > 0 ? manager.ChannelAt(int32_t(next() % uint32_t(count))) : nullptr;
+    switch (next() % 6) {
+        case 0:
+            if (channel != nullptr) {
+                const int64_t length = 1 + next() % 700;
+                channel->InsertFrames(block.data(), length, next() % 20000);
+            }
+            break;
+        case 1:
+            if (channel != nullptr) {
+                const int64_t from = next() % 20000;
+                const int64_t length = 1 + next() % 700;
+                channel->ReplaceFrames(block.data(), length, from, from + next() % 900);
+            }
+            break;
+        case 2:
+            if (channel != nullptr) {
+                const int64_t from = next() % 20000;
+                channel->RemoveFrames(from, from + next() % 900);
+            }
+            break;
+        case 3:
+            if (count < 8) {
+                const int64_t length = 1 + next() % 5000;
+                manager.AddChannel(MakeChannel(Counting(length), next() % 3000));
+            }
+            break;
+        case 4:
+            if (count > 1)
+                manager.RemoveChannelAt(int32_t(next() % uint32_t(count)));
+            break;
+        default:
+            if (channel != nullptr) {
+                channel->SetMuted(next() % 2 == 0);
+                channel->SetPanPosition(int8_t(next() % 3 == 0 ? -128 : 0));
+            }
+            manager.SetPlayMode(int32_t(next() % 3));
+            manager.SetRangeStart(next() % 10000);
+            manager.SetRangeEnd(10000 + next() % 10000);
+            manager.SetLoop(next() % 4 != 0);
+            break;
+    }
+}
+
+void SetUpStressDocument(ChannelManager& manager, FakeDocumentWindow& window)
+{
     manager.AddChannel(MakeChannel(Counting(20000)));
     manager.AddChannel(MakeChannel(Counting(15000), 300, Channel::kPanLeft));
     manager.SetPlayMode(ChannelManager::kPlayVisible);
     window.visibleFirst = 0;
     window.visibleLast = 30000;
+}
 
-    std::atomic<bool> stop{false};
+uint64_t HashOf(const std::vector<float>& values)
+{
+    uint64_t hash = 14695981039346656037ull;
+    for (float value : values) {
+        hash ^= std::bit_cast<uint32_t>(value);
+        hash *= 1099511628211ull;
+    }
+    return hash;
+}
+
+// One buffer mixed during the edits: the edits done before it began and
+// after it ended (it saw the document as it was after some count of edits
+// in between), the play position before and after, and what it gave.
+struct MixedBuffer {
+    int64_t editsBefore;
+    int64_t editsAfter;
+    int64_t from;
+    int64_t to;
+    bool filled;
+    uint64_t hash;
+};
+
+constexpr int64_t kStressFrames = 256;
+
+// Whether the model, as it is now, mixes the buffer exactly as recorded.
+bool MixesAlike(ChannelManager& model, const MixedBuffer& buffer, std::vector<float>& out)
+{
+    model.SetCurrentFrame(buffer.from);
+    const bool filled = model.FillBuffer(out.data(), kStressFrames);
+    return filled == buffer.filled && model.CurrentFrame() == buffer.to && (!filled || HashOf(out) == buffer.hash);
+}
+
+void ExpectSameDocument(ChannelManager& document, ChannelManager& model)
+{
+    ASSERT_EQ(document.CountChannels(), model.CountChannels());
+    for (int32_t c = 0; c < document.CountChannels(); ++c) {
+        Channel* mine = document.ChannelAt(c);
+        Channel* theirs = model.ChannelAt(c);
+        ASSERT_EQ(mine->FirstFrame(), theirs->FirstFrame()) << c;
+        ASSERT_EQ(mine->FrameCount(), theirs->FrameCount()) << c;
+        EXPECT_EQ(mine->IsMuted(), theirs->IsMuted()) << c;
+        EXPECT_EQ(mine->PanPosition(), theirs->PanPosition()) << c;
+        Samples a(size_t(mine->FrameCount()));
+        Samples b(a.size());
+        mine->FillBuffer(a.data(), mine->FirstFrame(), mine->FrameCount());
+        theirs->FillBuffer(b.data(), theirs->FirstFrame(), theirs->FrameCount());
+        EXPECT_EQ(a, b) << c;
+    }
+    EXPECT_EQ(document.PlayMode(), model.PlayMode());
+    EXPECT_EQ(document.Loop(), model.Loop());
+    EXPECT_EQ(document.RangeStart(), model.RangeStart());
+    EXPECT_EQ(document.RangeEnd(), model.RangeEnd());
+}
+
+// Edits on one thread while another mixes, as the window and the audio
+// thread do; run under ThreadSanitizer in CI. The same edits are then made
+// again on a model without any mixing: the document must end up equal to
+// it, and every buffer mixed during the edits must be exactly the buffer
+// the model mixes, from the same play position, in one of the states the
+// document went through while that buffer was mixed. A mix that saw an
+// edit half done, or an edit disturbed by a mix, fails.
+TEST(ChannelManagerStress, MixingWhileEditing)
+{
+    constexpr uint32_t kSeed = 12345;
+    FakeDocumentWindow window;
+    ChannelManager manager(&window);
+    SetUpStressDocument(manager, window);
+    // Edits and mixes print the refused requests they meet; not of interest.
+    testing::internal::CaptureStdout();
+
+    std::atomic<int64_t> editsDone{0};
+    std::atomic<bool> editing{true};
     std::atomic<int64_t> buffers{0};
+    std::vector<MixedBuffer> mixed;
     std::thread mixer([&] {
-        std::vector<float> out(512);
-        while (!stop) {
-            manager.FillBuffer(out.data(), 256);
+        std::vector<float> out(size_t(kStressFrames) * 2);
+        for (bool last = false; !last;) {
+            // One more buffer after the edits end, so the last state is mixed.
+            last = !editing;
+            MixedBuffer buffer{};
+            buffer.editsBefore = editsDone;
+            buffer.from = manager.CurrentFrame();
+            buffer.filled = manager.FillBuffer(out.data(), kStressFrames);
+            buffer.to = manager.CurrentFrame();
+            buffer.editsAfter = editsDone;
+            buffer.hash = buffer.filled ? HashOf(out) : 0;
+            mixed.push_back(buffer);
             ++buffers;
         }
     });
+    // The first buffer sees the document before any edit.
+    while (buffers == 0)
+        std::this_thread::yield();
 
     const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(2);
-    uint32_t seed = 12345;
+    uint32_t seed = kSeed;
     auto next = [&seed] {
         seed = seed * 1664525u + 1013904223u;
         return seed >> 8;
@@ -556,50 +687,48 @@ TEST(ChannelManagerStress, MixingWhileEditing)
     int64_t edits = 0;
     while (std::chrono::steady_clock::now() < deadline) {
         manager.Lock();
-        const int32_t count = manager.CountChannels();
-        Channel* channel = count > 0 ? manager.ChannelAt(int32_t(next() % uint32_t(count))) : nullptr;
-        switch (next() % 6) {
-            case 0:
-                if (channel != nullptr)
-                    channel->InsertFrames(block.data(), 1 + next() % 700, next() % 20000);
-                break;
-            case 1:
-                if (channel != nullptr) {
-                    const int64_t from = next() % 20000;
-                    channel->ReplaceFrames(block.data(), 1 + next() % 700, from, from + next() % 900);
-                }
-                break;
-            case 2:
-                if (channel != nullptr) {
-                    const int64_t from = next() % 20000;
-                    channel->RemoveFrames(from, from + next() % 900);
-                }
-                break;
-            case 3:
-                if (count < 8)
-                    manager.AddChannel(MakeChannel(Counting(1 + next() % 5000), next() % 3000));
-                break;
-            case 4:
-                if (count > 1)
-                    manager.RemoveChannelAt(int32_t(next() % uint32_t(count)));
-                break;
-            default:
-                if (channel != nullptr) {
-                    channel->SetMuted(next() % 2 == 0);
-                    channel->SetPanPosition(int8_t(next() % 3 == 0 ? -128 : 0));
-                }
-                manager.SetPlayMode(int32_t(next() % 3));
-                manager.SetRangeStart(next() % 10000);
-                manager.SetRangeEnd(10000 + next() % 10000);
-                break;
-        }
+        EditStressDocument(manager, next, block);
+        // Counted before the lock goes, so a mix that takes it next knows.
+        ++editsDone;
         manager.Unlock();
         ++edits;
     }
-    stop = true;
+    editing = false;
     mixer.join();
     EXPECT_GT(buffers.load(), 0);
     EXPECT_GT(edits, 0);
+
+    FakeDocumentWindow modelWindow;
+    ChannelManager model(&modelWindow);
+    SetUpStressDocument(model, modelWindow);
+    seed = kSeed;
+    std::vector<bool> matched(mixed.size(), false);
+    std::vector<float> out(size_t(kStressFrames) * 2);
+    size_t first = 0;
+    for (int64_t state = 0; state <= edits; ++state) {
+        if (state > 0)
+            EditStressDocument(model, next, block);
+        while (first < mixed.size() && mixed[first].editsAfter < state)
+            ++first;
+        for (size_t i = first; i < mixed.size() && mixed[i].editsBefore <= state; ++i) {
+            if (!matched[i])
+                matched[i] = MixesAlike(model, mixed[i], out);
+        }
+    }
+    testing::internal::GetCapturedStdout();
+
+    ExpectSameDocument(manager, model);
+    const auto unmatched = std::find(matched.begin(), matched.end(), false);
+    EXPECT_EQ(unmatched, matched.end()) << "buffer " << (unmatched - matched.begin()) << " of " << mixed.size()
+                                        << " matches no state the document was in while it was mixed";
+    // Buffers were mixed before the first edit and after the last, and the
+    // mixes were not all silence or refusals.
+    EXPECT_EQ(mixed.front().editsBefore, 0);
+    EXPECT_EQ(mixed.back().editsBefore, edits);
+    const uint64_t silence = HashOf(std::vector<float>(size_t(kStressFrames) * 2, 0.0f));
+    EXPECT_GT(std::count_if(mixed.begin(), mixed.end(),
+                  [silence](const MixedBuffer& buffer) { return buffer.filled && buffer.hash != silence; }),
+        0);
 }
 
 }  // namespace
