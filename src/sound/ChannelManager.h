@@ -96,6 +96,8 @@ public:
     /// The caller holds the document lock.
     int32_t CountChannelsLocked() const { return int32_t(channels_.size()); }
     Channel* ChannelAtLocked(int32_t index) const { return channels_[size_t(index)].get(); }
+    /// FrameCount for a caller that holds the document lock.
+    int64_t FrameCountLocked();
 
     /// Playback mix (see Mixer) for callers off the audio thread: the
     /// scratch grows as needed, and 'stop' is posted to the window straight
@@ -109,7 +111,6 @@ public:
     bool FillBuffer(int16_t* out, int64_t* frames);
 
 private:
-    int64_t FrameCountLocked();
     void NotifyChannel(uint32_t change, int32_t index);
     void PostToWindow(uint32_t what, const char* field = nullptr, int64_t value = 0);
 

@@ -83,7 +83,7 @@ bool Mixer::FillBuffer(float* out, int64_t frames, bool* reachedEnd)
     if (manager_ == nullptr)
         return false;
     std::lock_guard guard(manager_->DocumentLock());
-    const int64_t total = manager_->FrameCount();
+    const int64_t total = manager_->FrameCountLocked();
     int64_t start = 0;
     int64_t end = 0;
     PlayRange(total, &start, &end);
@@ -133,7 +133,7 @@ bool Mixer::FillBuffer(int16_t* out, int64_t* frames)
     if (manager_ == nullptr)
         return false;
     std::lock_guard guard(manager_->DocumentLock());
-    const int64_t total = manager_->FrameCount();
+    const int64_t total = manager_->FrameCountLocked();
     const int64_t current = manager_->CurrentFrame();
     if (current >= total || *frames <= 0)
         return false;
