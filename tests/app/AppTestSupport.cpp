@@ -99,7 +99,8 @@ std::vector<std::vector<int16_t>> ReadWav(const std::filesystem::path& path)
 
 void MakeUnsaved(QuillexWindow* window)
 {
-    ASSERT_EQ(window->History()->AddAction(new MarkAction), B_OK);
+    std::unique_ptr<Action> mark = std::make_unique<MarkAction>();
+    ASSERT_EQ(window->History()->AddAction(mark), B_OK);
     ASSERT_FALSE(window->History()->IsSaved());
 }
 

@@ -582,7 +582,7 @@ TEST(QuillexWindow, AConfiguredActionWaitsForItsDialog)
     QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("pending.wav", 1, 100));
     int runs = 0;
     auto* action = new ConfiguredAction(&runs);
-    window->SetupAction(action);
+    window->SetupAction(std::unique_ptr<Action>(action));
     Drain();
     EXPECT_EQ(window->PendingAction(), action);
     EXPECT_EQ(runs, 0);
@@ -598,7 +598,7 @@ TEST(QuillexWindow, ActionCancelDropsThePendingAction)
     AppFixture fixture;
     QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("cancel.wav", 1, 100));
     int runs = 0;
-    window->SetupAction(new ConfiguredAction(&runs));
+    window->SetupAction(std::make_unique<ConfiguredAction>(&runs));
     window->PostMessage(kMsgActionCancel);
     window->PostMessage(kMsgActionGo);
     Drain();
@@ -611,7 +611,7 @@ TEST(QuillexWindow, AnActionThatFailsItsCheckIsDroppedAtOnce)
 {
     AppFixture fixture;
     QuillexWindow* window = OpenWindow(fixture);
-    window->SetupAction(new UnreadyAction);
+    window->SetupAction(std::make_unique<UnreadyAction>());
     EXPECT_EQ(window->PendingAction(), nullptr);
     window->PostMessage(kMsgActionGo);
     Drain();
@@ -626,9 +626,9 @@ TEST(QuillexWindow, ANewActionReplacesOneStillWaitingForItsDialog)
     QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("replace.wav", 1, 100));
     int firstRuns = 0;
     int secondRuns = 0;
-    window->SetupAction(new ConfiguredAction(&firstRuns));
+    window->SetupAction(std::make_unique<ConfiguredAction>(&firstRuns));
     auto* second = new ConfiguredAction(&secondRuns);
-    window->SetupAction(second);
+    window->SetupAction(std::unique_ptr<Action>(second));
     EXPECT_EQ(window->PendingAction(), second);
     window->PostMessage(kMsgActionGo);
     Drain();
