@@ -137,4 +137,25 @@ std::filesystem::path AppFixture::MakeSound(const std::string& name, int channel
     return path;
 }
 
+QuillexWindow* OpenWindow(AppFixture& fixture, const std::filesystem::path& file)
+{
+    QuillexWindow* window = fixture.App().NewWindow();
+    if (!file.empty()) {
+        window->LockWindow();
+        window->SetTo(file);
+        window->UnlockWindow();
+    }
+    Drain();
+    return window;
+}
+
+bool IsListed(AppFixture& fixture, QuillexWindow* window)
+{
+    for (int32_t i = 0; i < fixture.App().CountWindows(); ++i) {
+        if (fixture.App().WindowAt(i) == window)
+            return true;
+    }
+    return false;
+}
+
 }  // namespace glimmet::test
