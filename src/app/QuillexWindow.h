@@ -4,10 +4,8 @@
 
 #include <cstdint>
 #include <filesystem>
-#include <functional>
 #include <memory>
 #include <optional>
-#include <vector>
 
 #include "app/CommandTable.h"
 #include "app/SaveFlow.h"
@@ -157,7 +155,6 @@ private:
     void FillCommandTable();
 
     // Rows of the command table that stay with the window.
-    bool HandleViewCommand(const Message& message);
     void HandleSetDisplayRange(const Message& message);
     void HandleRangeStartChanged(const Message& message);
     void HandleRangeEndChanged(const Message& message);
