@@ -126,16 +126,14 @@ void BM_PasteOneMinute(benchmark::State& state)
         std::memset(minute.back().get(), 0x11, size_t(60 * kRate) * sizeof(int16_t));
     }
     copyBuffer.SetCopyBuffer(std::move(minute), 60 * kRate);
-    CopyBuffer::SetApplicationBuffer(&copyBuffer);
     // No range and no selection: the minute is inserted at the cursor in
     // the middle of the focused channel and the one after it.
     Document& document = SharedDocument();
     const int64_t middle = kFrames / 2;
-    RunEdit(state, document, -1, -1, false, [&document, middle] {
+    RunEdit(state, document, -1, -1, false, [&document, &copyBuffer, middle] {
         document.position.SetCursorFrame(middle);
-        return std::make_unique<PasteAction>(nullptr);
+        return std::make_unique<PasteAction>(nullptr, &copyBuffer);
     });
-    CopyBuffer::SetApplicationBuffer(nullptr);
 }
 
 BENCHMARK(BM_RemoveOneSecond)->UseManualTime()->Unit(benchmark::kMillisecond)->Iterations(3);

@@ -13,13 +13,13 @@ extern "C" {
 #include <libavutil/log.h>
 }
 
-#include "RecordingTarget.h"
 #include "files/ChannelTrackLoader.h"
 #include "files/DocumentLoader.h"
 #include "files/MediaFile.h"
 #include "files/MediaFormat.h"
 #include "files/MediaTrack.h"
 #include "sound/Channel.h"
+#include "sound/ChannelManager.h"
 
 namespace {
 
@@ -92,8 +92,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
         }
     }
     if (withinBudget) {
-        test::RecordingTarget window;
-        DocumentLoader::Load(InputPath(), window);
+        ChannelManager document(nullptr);
+        DocumentLoader::Load(InputPath(), &document, false);
     }
     return 0;
 }

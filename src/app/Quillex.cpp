@@ -37,7 +37,6 @@ Quillex::Quillex() : quitHook_([] { QCoreApplication::exit(0); })
 {
     windows_.reserve(10);
     gApplication = this;
-    CopyBuffer::SetApplicationBuffer(&copyBuffer_);
 }
 
 Quillex::~Quillex()
@@ -51,7 +50,6 @@ Quillex::~Quillex()
     }
     for (QuillexWindow* window : remaining)
         delete window;
-    CopyBuffer::SetApplicationBuffer(nullptr);
     gApplication = nullptr;
 }
 
@@ -120,7 +118,7 @@ void Quillex::ReadyToRun()
 QuillexWindow* Quillex::NewWindow()
 {
     std::lock_guard guard(windowLock_);
-    auto* window = new QuillexWindow();
+    auto* window = new QuillexWindow(&copyBuffer_);
     windows_.push_back(window);
     return window;
 }

@@ -10,36 +10,22 @@
 #include <QHBoxLayout>
 #include <QLabel>
 #include <QMenuBar>
-#include <QMessageBox>
 #include <QMimeData>
-#include <QPushButton>
 #include <QShortcut>
 #include <QUrl>
 #include <QVBoxLayout>
 
-#include <cstdio>
 #include <cstdlib>
-#include <vector>
 
+#include "app/ActionRunner.h"
+#include "app/EditCommands.h"
+#include "app/MenuBuilder.h"
 #include "app/MenuTable.h"
 #include "app/Quillex.h"
 #include "app/TextControl.h"
 #include "edit/Action.h"
-#include "edit/AddChannelAction.h"
-#include "edit/CopyBuffer.h"
-#include "edit/FadeInAction.h"
-#include "edit/FadeOutAction.h"
 #include "edit/HistoryManager.h"
-#include "edit/MaximizeAction.h"
-#include "edit/MoveSampleAction.h"
-#include "edit/PasteAction.h"
-#include "edit/RemoveAction.h"
-#include "edit/RemoveChannelAction.h"
-#include "edit/RevertAction.h"
-#include "edit/RevertPhasesAction.h"
-#include "edit/TruncateAction.h"
 #include "files/DocumentLoader.h"
-#include "files/DocumentSaver.h"
 #include "playback/PlaybackController.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
@@ -52,12 +38,6 @@ namespace glimmet {
 
 namespace {
 
-QuillexWindow::SaveQuestion& SaveQuestionHook()
-{
-    static QuillexWindow::SaveQuestion question;
-    return question;
-}
-
 /// A range field's text as the number it stands for: read like strtol in
 /// base 10, kept to 32 bits and widened again.
 int64_t RangeFieldValue(const TextControl* field)
@@ -66,14 +46,9 @@ int64_t RangeFieldValue(const TextControl* field)
     return int64_t(int32_t(std::strtol(text.c_str(), nullptr, 10)));
 }
 
-QString TitleFor(const std::string& name)
-{
-    return QStringLiteral("Glimmet - ") + QString::fromStdString(name);
-}
-
 }  // namespace
 
-QuillexWindow::QuillexWindow()
+QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
     : QMainWindow(nullptr),
       ownedManager_(std::make_unique<ChannelManager>(this)),
       ownedHistory_(std::make_unique<HistoryManager>()),
@@ -88,7 +63,13 @@ QuillexWindow::QuillexWindow()
     zoomSlider_ = new ZoomSlider(this, 0, 0, 0);
     containerView_ = new ChannelContainerView(manager_, zoomSlider_, this);
 
-    setMenuBar(CreateMenu());
+    menus_ = std::make_unique<MenuBuilder>([this](const Message& message) { PostMessage(message); },
+        [this](const Message& message) { PostToApplication(message); });
+    setMenuBar(menus_->Build(this));
+    actions_ = std::make_unique<ActionRunner>(*this, *manager_, *containerView_, *history_, *menus_);
+    edits_ = std::make_unique<EditCommands>(*this, *manager_, *actions_, copyBuffer);
+    saving_ = std::make_unique<SaveFlow>(*this, *this, *manager_, *history_, *menus_->Item(KeptMenuItem::Save));
+    FillCommandTable();
 
     auto* background = new QFrame(this);
     background->setObjectName(QStringLiteral("Background"));
@@ -117,90 +98,15 @@ QuillexWindow::~QuillexWindow()
     playback_.reset();
     // The views point into the document; they go before it does.
     delete takeCentralWidget();
-    pendingAction_.reset();
-    supersededActions_.clear();
+    actions_.reset();
 }
 
 // ---------------------------------------------------------------------------
 // Building
 
-QMenuBar* QuillexWindow::CreateMenu()
-{
-    auto* bar = new QMenuBar(this);
-    QMenu* menu = nullptr;
-    for (const MenuEntry& entry : DocumentMenuTable()) {
-        const QString title = QString::fromUtf8(entry.menu);
-        if (menu == nullptr || menu->title() != title)
-            menu = bar->addMenu(title);
-        if (entry.label == nullptr) {
-            menu->addSeparator();
-            continue;
-        }
-        QAction* item = menu->addAction(QString::fromUtf8(entry.label));
-        if (entry.key != 0) {
-            const Qt::KeyboardModifiers modifiers =
-                entry.shift ? (Qt::ControlModifier | Qt::ShiftModifier) : Qt::ControlModifier;
-            item->setShortcut(QKeySequence(QKeyCombination(modifiers, Qt::Key(entry.key))));
-        }
-        const Message message(entry.code);
-        if (entry.toApplication)
-            connect(item, &QAction::triggered, this, [this, message] { PostToApplication(message); });
-        else
-            connect(item, &QAction::triggered, this, [this, message] { PostMessage(message); });
-        KeepMenuItem(entry.kept, item);
-    }
-    return bar;
-}
-
-void QuillexWindow::KeepMenuItem(KeptMenuItem which, QAction* item)
-{
-    switch (which) {
-    case KeptMenuItem::None:
-        break;
-    case KeptMenuItem::Save:
-        saveItem_ = item;
-        break;
-    case KeptMenuItem::Undo:
-        undoItem_ = item;
-        break;
-    case KeptMenuItem::Redo:
-        redoItem_ = item;
-        break;
-    case KeptMenuItem::DeleteHistory:
-        deleteHistoryItem_ = item;
-        break;
-    case KeptMenuItem::ZoomRange:
-        zoomRangeItem_ = item;
-        break;
-    case KeptMenuItem::BubbleHelp:
-        bubbleHelpItem_ = item;
-        // Only the application's broadcast marks the item; a click must
-        // not toggle the mark by itself.
-        item->setCheckable(true);
-        connect(item, &QAction::triggered, item, [item](bool checked) { item->setChecked(!checked); });
-        break;
-    }
-}
-
 QAction* QuillexWindow::MenuItem(KeptMenuItem which) const
 {
-    switch (which) {
-    case KeptMenuItem::Save:
-        return saveItem_;
-    case KeptMenuItem::Undo:
-        return undoItem_;
-    case KeptMenuItem::Redo:
-        return redoItem_;
-    case KeptMenuItem::DeleteHistory:
-        return deleteHistoryItem_;
-    case KeptMenuItem::ZoomRange:
-        return zoomRangeItem_;
-    case KeptMenuItem::BubbleHelp:
-        return bubbleHelpItem_;
-    case KeptMenuItem::None:
-        break;
-    }
-    return nullptr;
+    return menus_->Item(which);
 }
 
 QWidget* QuillexWindow::CreateControlRow()
@@ -293,71 +199,33 @@ void QuillexWindow::PostToApplication(const Message& message)
         application->PostMessage(message);
 }
 
+void QuillexWindow::FillCommandTable()
+{
+    edits_->AddTo(commands_);
+    commands_.Add(kMsgSelectAll, [this] { containerView_->SelectAll(); });
+    commands_.Add(kMsgSelectNone, [this] { containerView_->DeselectAll(); });
+    commands_.Add(kMsgZoomRange, [this] { containerView_->ZoomRange(); });
+    commands_.Add(kMsgShowAll, [this] { containerView_->ShowAll(); });
+    commands_.Add(kMsgSetDisplayRange, [this](const Message& message) { HandleSetDisplayRange(message); });
+    commands_.Add(kMsgRangeStartChanged, [this](const Message& message) { HandleRangeStartChanged(message); });
+    commands_.Add(kMsgRangeEndChanged, [this](const Message& message) { HandleRangeEndChanged(message); });
+    commands_.Add(kMsgSetRangeStart, [this] { HandleSetRangeStart(); });
+    commands_.Add(kMsgSetRangeEnd, [this] { HandleSetRangeEnd(); });
+    commands_.Add(kMsgToggleBubbleHelp, [this](const Message& message) { HandleBubbleHelpMark(message); });
+    commands_.Add(kMsgOpen, [this](const Message& message) { HandleOpen(message); });
+    commands_.Add(kMsgAppend, [this] { HandleAppend(); });
+    commands_.Add(kMsgSave, [this] { saving_->Save(); });
+    commands_.Add(kMsgSaveAs, [this] { saving_->ShowSavePanel(); });
+    commands_.Add(kMsgSavePanelChoice, [this](const Message& message) { saving_->HandlePanelChoice(message); });
+    commands_.Add(kMsgSimpleData, [this](const Message& message) { HandleDrop(message); });
+    commands_.Add(kMsgQuitRequested, [this] { QuitRequested(); });
+}
+
 void QuillexWindow::MessageReceived(const Message& message)
 {
-    if (playback_->MessageReceived(message) || HandleViewCommand(message) || HandleEditCommand(message.what))
-        return;
-    switch (message.what) {
-    case kMsgRangeStartChanged:
-        HandleRangeStartChanged(message);
-        break;
-    case kMsgRangeEndChanged:
-        HandleRangeEndChanged(message);
-        break;
-    case kMsgSetRangeStart:
-        HandleSetRangeStart();
-        break;
-    case kMsgSetRangeEnd:
-        HandleSetRangeEnd();
-        break;
-    case kMsgActionGo:
-        HandleActionGo();
-        break;
-    case kMsgActionCancel:
-        HandleActionCancel();
-        break;
-    case kMsgUndo:
-        HandleUndo();
-        break;
-    case kMsgRedo:
-        HandleRedo();
-        break;
-    case kMsgClearHistory:
-        HandleClearHistory();
-        break;
-    case kMsgCopy:
-        Copy();
-        break;
-    case kMsgSampleMoved:
-        HandleSampleMoved(message);
-        break;
-    case kMsgToggleBubbleHelp:
-        HandleBubbleHelpMark(message);
-        break;
-    case kMsgOpen:
-        HandleOpen(message);
-        break;
-    case kMsgAppend:
-        HandleAppend();
-        break;
-    case kMsgSave:
-        HandleSave();
-        break;
-    case kMsgSaveAs:
-        ShowSavePanel();
-        break;
-    case kMsgSavePanelChoice:
-        HandleSavePanelChoice(message);
-        break;
-    case kMsgSimpleData:
-        HandleDrop(message);
-        break;
-    case kMsgQuitRequested:
-        QuitRequested();
-        break;
-    default:
-        break;
-    }
+    // The playback commands come first; a code nobody handles is dropped.
+    if (!playback_->MessageReceived(message))
+        commands_.Dispatch(message);
 }
 
 // ---------------------------------------------------------------------------
@@ -393,31 +261,12 @@ bool QuillexWindow::IsLoopChecked()
     return loopBox_->isChecked();
 }
 
-bool QuillexWindow::HandleViewCommand(const Message& message)
+void QuillexWindow::HandleSetDisplayRange(const Message& message)
 {
-    switch (message.what) {
-    case kMsgSelectAll:
-        containerView_->SelectAll();
-        return true;
-    case kMsgSelectNone:
-        containerView_->DeselectAll();
-        return true;
-    case kMsgZoomRange:
-        containerView_->ZoomRange();
-        return true;
-    case kMsgShowAll:
-        containerView_->ShowAll();
-        return true;
-    case kMsgSetDisplayRange: {
-        int64_t first = 0;
-        int64_t last = 0;
-        if (message.FindInt64("first frame", &first) == B_OK && message.FindInt64("last frame", &last) == B_OK)
-            containerView_->SetDisplayRange(first, last);
-        return true;
-    }
-    default:
-        return false;
-    }
+    int64_t first = 0;
+    int64_t last = 0;
+    if (message.FindInt64("first frame", &first) == B_OK && message.FindInt64("last frame", &last) == B_OK)
+        containerView_->SetDisplayRange(first, last);
 }
 
 void QuillexWindow::HandleRangeStartChanged(const Message& message)
@@ -455,192 +304,35 @@ void QuillexWindow::HandleSetRangeEnd()
 void QuillexWindow::UpdateZoomRangeItem()
 {
     const bool noRange = RangeFieldValue(rangeStartField_) == -1 && RangeFieldValue(rangeEndField_) == -1;
-    zoomRangeItem_->setEnabled(!noRange);
+    menus_->Item(KeptMenuItem::ZoomRange)->setEnabled(!noRange);
 }
 
 // ---------------------------------------------------------------------------
-// Actions and history
+// Edits
 
-void QuillexWindow::SetupAction(Action* action)
+void QuillexWindow::SetupAction(std::unique_ptr<Action> action)
 {
-    // An action still waiting for its dialog stays alive (its dialog may yet
-    // answer), but is no longer the one that runs.
-    if (pendingAction_)
-        supersededActions_.push_back(std::move(pendingAction_));
-    pendingAction_.reset(action);
-    if (action == nullptr)
-        return;
-    action->SetTo(manager_, containerView_);
-    if (action->InitCheck() != B_OK) {
-        pendingAction_.reset();
-        return;
-    }
-    if (!action->SupportsConfiguration())
-        PostMessage(kMsgActionGo);
+    actions_->SetupAction(std::move(action));
 }
 
-void QuillexWindow::HandleActionGo()
+Action* QuillexWindow::PendingAction() const
 {
-    if (!pendingAction_ || pendingAction_->InitCheck() != B_OK)
-        return;
-    Action* action = pendingAction_.release();
-    if (history_->AddAction(action) != B_OK) {
-        // Not recorded: the window keeps it so that it is freed with it.
-        supersededActions_.emplace_back(action);
-    }
-    action->Go();
-    containerView_->UpdateAll();
-    UpdateUndoMenu();
-}
-
-void QuillexWindow::HandleSampleMoved(const Message& message)
-{
-    Channel* channel = nullptr;
-    void* view = nullptr;
-    int64_t offset = 0;
-    if (message.FindPointer("channel", &channel) != B_OK || message.FindPointer("sample view", &view) != B_OK
-        || message.FindInt64("offset", &offset) != B_OK)
-        return;
-    auto action = std::make_unique<MoveSampleAction>(this);
-    action->SetTo(manager_, channel, offset);
-    // A move is bound to its channel rather than to the range, so it skips
-    // the common setup and runs at once.
-    if (action->InitCheck() != B_OK || action->SupportsConfiguration())
-        return;
-    if (pendingAction_)
-        supersededActions_.push_back(std::move(pendingAction_));
-    pendingAction_ = std::move(action);
-    PostMessage(kMsgActionGo);
-}
-
-void QuillexWindow::HandleActionCancel()
-{
-    pendingAction_.reset();
-}
-
-void QuillexWindow::HandleUndo()
-{
-    const status_t status = history_->Undo();
-    if (status != B_OK) {
-        std::printf("Error doing undo: %s\n", StatusText(status));
-        std::fflush(stdout);
-        return;
-    }
-    containerView_->UpdateAll();
-    UpdateUndoMenu();
-}
-
-void QuillexWindow::HandleRedo()
-{
-    const status_t status = history_->Redo();
-    if (status != B_OK) {
-        std::printf("Error doing redo: %s\n", StatusText(status));
-        std::fflush(stdout);
-        return;
-    }
-    containerView_->UpdateAll();
-    UpdateUndoMenu();
-}
-
-void QuillexWindow::HandleClearHistory()
-{
-    history_->Clear();
-    UpdateUndoMenu();
+    return actions_->PendingAction();
 }
 
 void QuillexWindow::UpdateUndoMenu()
 {
-    const char* undoName = history_->UndoName();
-    const char* redoName = history_->RedoName();
-    deleteHistoryItem_->setEnabled(false);
-    if (undoName != nullptr) {
-        undoItem_->setEnabled(true);
-        deleteHistoryItem_->setEnabled(true);
-        undoItem_->setText(QStringLiteral("Undo ") + QString::fromUtf8(undoName));
-    } else {
-        undoItem_->setEnabled(false);
-        undoItem_->setText(QStringLiteral("Undo"));
-    }
-    if (redoName != nullptr) {
-        redoItem_->setEnabled(true);
-        deleteHistoryItem_->setEnabled(true);
-        redoItem_->setText(QStringLiteral("Redo ") + QString::fromUtf8(redoName));
-    } else {
-        redoItem_->setEnabled(false);
-        redoItem_->setText(QStringLiteral("Redo"));
-    }
-    saveItem_->setEnabled(!history_->IsSaved());
+    actions_->UpdateUndoMenu();
 }
 
 void QuillexWindow::Copy()
 {
-    manager_->Lock();
-    std::vector<Channel*> selected;
-    for (int32_t index = 0; Channel* channel = manager_->ChannelAt(index); ++index) {
-        if (channel->IsSelected())
-            selected.push_back(channel);
-    }
-    Quillex* application = Quillex::Instance();
-    if (!selected.empty() && application != nullptr) {
-        const int64_t start = manager_->RangeStart();
-        const int64_t frames = manager_->RangeEnd() - start + 1;
-        std::vector<CopyBuffer::Samples> channels;
-        for (Channel* channel : selected) {
-            CopyBuffer::Samples samples = Action::AllocateSamples(frames);
-            // A range no array can hold copies nothing; the buffer refuses
-            // an empty set of channels.
-            if (!samples) {
-                channels.clear();
-                break;
-            }
-            channel->FillBuffer(samples.get(), start, frames);
-            channels.push_back(std::move(samples));
-        }
-        application->SetCopyBuffer(std::move(channels), frames);
-    }
-    manager_->Unlock();
+    edits_->Copy();
 }
 
-bool QuillexWindow::HandleEditCommand(uint32_t what)
+const CopyBuffer* QuillexWindow::SharedCopyBuffer() const
 {
-    switch (what) {
-    case kMsgCut:
-        Copy();
-        SetupAction(new RemoveAction(this));
-        return true;
-    case kMsgRemove:
-        SetupAction(new RemoveAction(this));
-        return true;
-    case kMsgPaste:
-        SetupAction(new PasteAction(this));
-        return true;
-    case kMsgTruncate:
-        SetupAction(new TruncateAction(this));
-        return true;
-    case kMsgAddChannel:
-        SetupAction(new AddChannelAction(this));
-        return true;
-    case kMsgRemoveChannel:
-        SetupAction(new RemoveChannelAction(this));
-        return true;
-    case kMsgFadeIn:
-        SetupAction(new FadeInAction(this));
-        return true;
-    case kMsgFadeOut:
-        SetupAction(new FadeOutAction(this));
-        return true;
-    case kMsgMaximize:
-        SetupAction(new MaximizeAction(this));
-        return true;
-    case kMsgRevert:
-        SetupAction(new RevertAction(this));
-        return true;
-    case kMsgRevertPhases:
-        SetupAction(new RevertPhasesAction(this));
-        return true;
-    default:
-        return false;
-    }
+    return edits_->SharedCopyBuffer();
 }
 
 // ---------------------------------------------------------------------------
@@ -651,7 +343,7 @@ void QuillexWindow::HandleBubbleHelpMark(const Message& message)
     bool enable = false;
     if (message.FindBool("enable", &enable) != B_OK)
         return;
-    bubbleHelpItem_->setChecked(enable);
+    menus_->Item(KeptMenuItem::BubbleHelp)->setChecked(enable);
 }
 
 void QuillexWindow::HandleOpen(const Message& message)
@@ -702,64 +394,6 @@ void QuillexWindow::dropEvent(QDropEvent* event)
     PostMessage(message);
 }
 
-void QuillexWindow::HandleSave()
-{
-    if (!fileEntry_) {
-        ShowSavePanel();
-        return;
-    }
-    const status_t status = SaveFile(*fileEntry_);
-    if (status != B_OK) {
-        std::printf("error writing file. (%s)\n", StatusText(status));
-        std::fflush(stdout);
-    }
-}
-
-void QuillexWindow::ShowSavePanel()
-{
-    if (!savePanel_) {
-        savePanel_ = std::make_unique<QFileDialog>(this);
-        savePanel_->setOption(QFileDialog::DontUseNativeDialog);
-        savePanel_->setAcceptMode(QFileDialog::AcceptSave);
-        savePanel_->setFileMode(QFileDialog::AnyFile);
-        savePanel_->selectFile(QStringLiteral("sound.wav"));
-        connect(savePanel_.get(), &QFileDialog::fileSelected, this, &QuillexWindow::SavePanelChose);
-    } else {
-        // Re-reads the folder, which may have changed since the last save.
-        savePanel_->setDirectory(savePanel_->directory());
-    }
-    savePanel_->show();
-    savePanel_->raise();
-}
-
-void QuillexWindow::SavePanelChose(const QString& file)
-{
-    const std::filesystem::path chosen(file.toStdString());
-    Message message(kMsgSavePanelChoice);
-    message.AddPath("directory", chosen.parent_path());
-    message.AddString("name", chosen.filename().string());
-    PostMessage(message);
-}
-
-void QuillexWindow::HandleSavePanelChoice(const Message& message)
-{
-    std::filesystem::path directory;
-    std::string name;
-    if (message.FindPath("directory", &directory) != B_OK || message.FindString("name", &name) != B_OK)
-        return;
-    std::error_code error;
-    if (!std::filesystem::is_directory(directory, error))
-        return;
-    // A name that is a link saves into the file the link points to.
-    std::filesystem::path entry = directory / name;
-    const std::filesystem::path target = std::filesystem::weakly_canonical(entry, error);
-    if (!error)
-        entry = target;
-    fileEntry_ = entry;
-    setWindowTitle(TitleFor(name));
-    PostMessage(kMsgSave);
-}
-
 status_t QuillexWindow::SetTo(const std::filesystem::path& file)
 {
     return DocumentLoader::Load(file, *this);
@@ -767,7 +401,27 @@ status_t QuillexWindow::SetTo(const std::filesystem::path& file)
 
 status_t QuillexWindow::SaveFile(const std::filesystem::path& file)
 {
-    return DocumentSaver::SaveFile(file, *this);
+    return saving_->SaveFile(file);
+}
+
+QFileDialog* QuillexWindow::SavePanel() const
+{
+    return saving_->SavePanel();
+}
+
+const std::optional<std::filesystem::path>& QuillexWindow::FileEntry() const
+{
+    return saving_->FileEntry();
+}
+
+void QuillexWindow::SetFileEntry(std::optional<std::filesystem::path> entry)
+{
+    saving_->SetFileEntry(std::move(entry));
+}
+
+void QuillexWindow::ReplaceFileEntry(const std::filesystem::path& entry)
+{
+    saving_->SetFileEntry(entry);
 }
 
 void QuillexWindow::SetWindowTitle(const std::string& title)
@@ -775,56 +429,23 @@ void QuillexWindow::SetWindowTitle(const std::string& title)
     setWindowTitle(QString::fromStdString(title));
 }
 
-void QuillexWindow::SetSaveItemEnabled(bool enabled)
-{
-    saveItem_->setEnabled(enabled);
-}
-
 // ---------------------------------------------------------------------------
 // Closing
 
-bool QuillexWindow::IsDocumentSaved()
-{
-    // An untitled document closes without a question, however much it was
-    // edited.
-    return !fileEntry_ || history_->IsSaved();
-}
-
 void QuillexWindow::SetSaveQuestion(SaveQuestion question)
 {
-    SaveQuestionHook() = std::move(question);
+    SaveFlow::SetSaveQuestion(std::move(question));
 }
 
 int QuillexWindow::AskSaveChanges(QuillexWindow* window)
 {
-    QMessageBox alert(QMessageBox::Warning, QString(), QStringLiteral("Save changes?"), QMessageBox::NoButton,
-        window);
-    alert.setObjectName(QStringLiteral("alert"));
-    // One role for all three keeps them left to right in the order added.
-    QPushButton* dontSave = alert.addButton(QStringLiteral("Nope!"), QMessageBox::ActionRole);
-    QPushButton* save = alert.addButton(QStringLiteral("Yes, please."), QMessageBox::ActionRole);
-    QPushButton* dontQuit = alert.addButton(QStringLiteral("Don't quit!"), QMessageBox::ActionRole);
-    alert.setDefaultButton(dontQuit);
-    alert.setEscapeButton(dontQuit);
-    alert.exec();
-    const QAbstractButton* clicked = alert.clickedButton();
-    if (clicked == dontSave)
-        return kDontSave;
-    if (clicked == save)
-        return kSave;
-    return kDontQuit;
+    return SaveFlow::AskSaveChanges(window);
 }
 
 bool QuillexWindow::QuitRequested()
 {
-    if (!IsDocumentSaved()) {
-        const SaveQuestion& question = SaveQuestionHook();
-        const int answer = question ? question(this) : AskSaveChanges(this);
-        if (answer == kDontQuit)
-            return false;
-        if (answer == kSave && fileEntry_)
-            SaveFile(*fileEntry_);
-    }
+    if (!saving_->AgreeToClose(this))
+        return false;
     Message closing(kMsgDeleteWindow);
     closing.AddPointer("window", this);
     PostToApplication(closing);

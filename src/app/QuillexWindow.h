@@ -4,13 +4,12 @@
 
 #include <cstdint>
 #include <filesystem>
-#include <functional>
 #include <memory>
 #include <optional>
-#include <vector>
 
+#include "app/CommandTable.h"
+#include "app/SaveFlow.h"
 #include "files/LoadTarget.h"
-#include "files/SaveTarget.h"
 #include "playback/PlaybackWindow.h"
 #include "sound/DocumentWindow.h"
 #include "support/Locker.h"
@@ -20,14 +19,17 @@ class QAction;
 class QCheckBox;
 class QComboBox;
 class QFileDialog;
-class QMenuBar;
 
 namespace glimmet {
 
 class Action;
+class ActionRunner;
 class ChannelContainerView;
 class ChannelManager;
+class CopyBuffer;
+class EditCommands;
 class HistoryManager;
+class MenuBuilder;
 class PlaybackController;
 class ZoomSlider;
 class TextControl;
@@ -35,7 +37,10 @@ enum class KeptMenuItem;
 
 /// A document window: one open sound with its channels, history, views,
 /// menus and controls. Every command reaches it as a Message; MessageReceived
-/// is the program's main dispatch.
+/// is the program's main dispatch, through the window's command table.
+///
+/// The window only coordinates: the menus come from MenuBuilder, edits run
+/// through EditCommands and ActionRunner, saving is SaveFlow's.
 ///
 /// Widgets live in the GUI thread, so all dispatch runs there; the window
 /// lock is held around each dispatch so that the audio thread's timed try
@@ -43,17 +48,17 @@ enum class KeptMenuItem;
 class QuillexWindow : public QMainWindow,
                       public DocumentWindow,
                       public LoadTarget,
-                      public SaveTarget,
                       public PlaybackWindow {
     Q_OBJECT
 
 public:
-    /// Answers of the "Save changes?" question, numbered left to right.
-    enum SaveAnswer { kDontSave = 0, kSave = 1, kDontQuit = 2 };
-    /// Asks the question for a window; the default shows the alert.
-    using SaveQuestion = std::function<int(QuillexWindow*)>;
+    using SaveAnswer = SaveFlow::SaveAnswer;
+    using enum SaveFlow::SaveAnswer;
+    using SaveQuestion = SaveFlow::SaveQuestion;
 
-    QuillexWindow();
+    /// copyBuffer is the application's, shared by every window; null
+    /// (a window without an application) copies and pastes nothing.
+    explicit QuillexWindow(CopyBuffer* copyBuffer = nullptr);
     ~QuillexWindow() override;
 
     // DocumentWindow: may be called from any thread.
@@ -65,14 +70,12 @@ public:
 
     void LockWindow();
 
-    // LoadTarget and SaveTarget: the window's thread, while it loads or saves.
+    // LoadTarget: the window's thread, while it loads.
     ChannelManager* DocumentManager() override { return manager_; }
     bool IsAppendOnLoad() override { return appendOnLoad_; }
-    void ReplaceFileEntry(const std::filesystem::path& entry) override { fileEntry_ = entry; }
+    void ReplaceFileEntry(const std::filesystem::path& entry) override;
     void SetWindowTitle(const std::string& title) override;
     status_t PostToSelf(uint32_t what) override { return PostMessage(what); }
-    HistoryManager* DocumentHistory() override { return history_; }
-    void SetSaveItemEnabled(bool enabled) override;
 
     // PlaybackWindow: the window's thread, from the playback commands.
     void SetPlaymarkFrame(int64_t frame) override;
@@ -81,7 +84,7 @@ public:
     int32_t MarkedPlayModeIndex() override;
     bool IsLoopChecked() override;
 
-    /// Handles one command; see the window's message table.
+    /// Handles one command; see the window's command table.
     void MessageReceived(const Message& message);
 
     /// Asks about saving when needed and, when closing is agreed, asks the
@@ -97,7 +100,7 @@ public:
     void Copy();
     /// Makes action the pending one, binds it and, unless it asks for
     /// parameters first, posts the command that runs it.
-    void SetupAction(Action* action);
+    void SetupAction(std::unique_ptr<Action> action);
     /// Relabels and enables the undo, redo, delete history and save items
     /// from the history.
     void UpdateUndoMenu();
@@ -116,7 +119,9 @@ public:
 
     ChannelManager* Manager() const { return manager_; }
     HistoryManager* History() const { return history_; }
-    Action* PendingAction() const { return pendingAction_.get(); }
+    Action* PendingAction() const;
+    /// The copy buffer the window copies into and pastes from.
+    const CopyBuffer* SharedCopyBuffer() const;
     bool IsPlaying() const;
     /// 0 while playback runs, 1 while it is stopped.
     int32_t PlayModeButtonMode() const { return playModeButtonMode_; }
@@ -125,15 +130,15 @@ public:
     PlaybackController* Playback() const { return playback_.get(); }
     bool AppendOnLoad() const { return appendOnLoad_; }
     void SetAppendOnLoad(bool append) { appendOnLoad_ = append; }
-    const std::optional<std::filesystem::path>& FileEntry() const { return fileEntry_; }
-    void SetFileEntry(std::optional<std::filesystem::path> entry) { fileEntry_ = std::move(entry); }
+    const std::optional<std::filesystem::path>& FileEntry() const;
+    void SetFileEntry(std::optional<std::filesystem::path> entry);
     QAction* MenuItem(KeptMenuItem which) const;
     TextControl* RangeStartField() const { return rangeStartField_; }
     TextControl* RangeEndField() const { return rangeEndField_; }
     QComboBox* PlayModePopup() const { return playModePopup_; }
     QCheckBox* LoopBox() const { return loopBox_; }
     /// The save panel, made on first use; null before.
-    QFileDialog* SavePanel() const { return savePanel_.get(); }
+    QFileDialog* SavePanel() const;
 
 protected:
     void customEvent(QEvent* event) override;
@@ -142,36 +147,23 @@ protected:
     void dropEvent(QDropEvent* event) override;
 
 private:
-    QMenuBar* CreateMenu();
-    void KeepMenuItem(KeptMenuItem which, QAction* item);
     QWidget* CreateControlRow();
     QWidget* CreatePlayModePopup();
     void PostToApplication(const Message& message);
+    void FillCommandTable();
 
-    // Handlers of the message table.
-    bool HandleViewCommand(const Message& message);
+    // Rows of the command table that stay with the window.
+    void HandleSetDisplayRange(const Message& message);
     void HandleRangeStartChanged(const Message& message);
     void HandleRangeEndChanged(const Message& message);
     void HandleSetRangeStart();
     void HandleSetRangeEnd();
-    void HandleActionGo();
-    void HandleActionCancel();
-    void HandleSampleMoved(const Message& message);
-    void HandleUndo();
-    void HandleRedo();
-    void HandleClearHistory();
     void HandleBubbleHelpMark(const Message& message);
     void HandleOpen(const Message& message);
     void HandleAppend();
-    void HandleSave();
-    void HandleSavePanelChoice(const Message& message);
     void HandleDrop(const Message& message);
-    bool HandleEditCommand(uint32_t what);
 
     void UpdateZoomRangeItem();
-    void ShowSavePanel();
-    void SavePanelChose(const QString& file);
-    bool IsDocumentSaved();
 
     // Declared first so that they outlive everything that points into them.
     std::unique_ptr<ChannelManager> ownedManager_;
@@ -181,22 +173,15 @@ private:
     HistoryManager* history_;
     ZoomSlider* zoomSlider_ = nullptr;
     ChannelContainerView* containerView_ = nullptr;
-    QAction* bubbleHelpItem_ = nullptr;
-    QAction* zoomRangeItem_ = nullptr;
-    QAction* undoItem_ = nullptr;
-    QAction* redoItem_ = nullptr;
-    QAction* deleteHistoryItem_ = nullptr;
-    QAction* saveItem_ = nullptr;
+    std::unique_ptr<MenuBuilder> menus_;
+    std::unique_ptr<ActionRunner> actions_;
+    std::unique_ptr<EditCommands> edits_;
+    std::unique_ptr<SaveFlow> saving_;
+    CommandTable commands_;
     /// Playing state, the play mark throttle and the playback graph.
     std::unique_ptr<PlaybackController> playback_;
     int32_t playModeButtonMode_ = 1;
     bool appendOnLoad_ = false;
-    std::optional<std::filesystem::path> fileEntry_;
-    std::unique_ptr<QFileDialog> savePanel_;
-    std::unique_ptr<Action> pendingAction_;
-    /// Actions replaced while still pending: their dialogs may still be
-    /// open, so they live on until the window ends.
-    std::vector<std::unique_ptr<Action>> supersededActions_;
     TextControl* rangeStartField_ = nullptr;
     TextControl* rangeEndField_ = nullptr;
     QComboBox* playModePopup_ = nullptr;

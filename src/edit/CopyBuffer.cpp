@@ -1,14 +1,6 @@
 #include "edit/CopyBuffer.h"
 
-#include <atomic>
-
 namespace glimmet {
-
-namespace {
-
-std::atomic<CopyBuffer*> gApplicationBuffer{nullptr};
-
-}  // namespace
 
 bool CopyBuffer::SetCopyBuffer(std::vector<Samples> channels, int64_t frames)
 {
@@ -31,16 +23,6 @@ bool CopyBuffer::GetCopyBuffer(std::vector<const int16_t*>& channels, int32_t& c
     for (const Samples& samples : channels_)
         channels.push_back(samples.get());
     return true;
-}
-
-void CopyBuffer::SetApplicationBuffer(CopyBuffer* buffer)
-{
-    gApplicationBuffer.store(buffer);
-}
-
-CopyBuffer* CopyBuffer::ApplicationBuffer()
-{
-    return gApplicationBuffer.load();
 }
 
 }  // namespace glimmet

@@ -13,8 +13,8 @@ namespace glimmet {
 /// paste in one document can use what was copied in another: one sample
 /// array per copied channel, each of the same frame count.
 ///
-/// The application object owns one and registers it with
-/// SetApplicationBuffer; edits find it through ApplicationBuffer().
+/// The application object owns the one buffer of the process and hands it to
+/// whatever copies or pastes (SelectionCopier, PasteAction).
 class CopyBuffer {
 public:
     /// From the shared SampleAllocator, or adopted from new[] (the default
@@ -34,10 +34,6 @@ public:
     /// next accepted SetCopyBuffer. False, leaving the outputs untouched,
     /// when nothing has been copied.
     bool GetCopyBuffer(std::vector<const int16_t*>& channels, int32_t& count, int64_t& frames) const;
-
-    /// Registers the application's buffer (null: no application).
-    static void SetApplicationBuffer(CopyBuffer* buffer);
-    static CopyBuffer* ApplicationBuffer();
 
 private:
     // Copy and paste run in the GUI thread; the lock only makes a stray call

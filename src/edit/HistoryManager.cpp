@@ -13,15 +13,15 @@ HistoryManager::~HistoryManager()
     Clear();
 }
 
-status_t HistoryManager::AddAction(Action* action)
+status_t HistoryManager::AddAction(std::unique_ptr<Action>& action)
 {
     std::lock_guard guard(*this);
-    if (action == nullptr)
+    if (!action)
         return B_ERROR;
     const status_t status = action->InitCheck();
     if (status != B_OK)
         return status;
-    undoStack_.push_back(Entry{std::unique_ptr<Action>(action), nextSerial_++});
+    undoStack_.push_back(Entry{std::move(action), nextSerial_++});
     // Newest first, as popping the stack would delete them.
     while (!redoStack_.empty())
         redoStack_.pop_back();

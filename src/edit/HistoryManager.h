@@ -25,11 +25,14 @@ public:
     HistoryManager& operator=(const HistoryManager&) = delete;
 
     /// Records an action that is about to be performed and discards
-    /// everything that could have been redone. The history owns the action
-    /// only when this returns B_OK; an action that fails its InitCheck is
-    /// returned to the caller untouched (its status is the result). B_ERROR
-    /// for null.
-    status_t AddAction(Action* action);
+    /// everything that could have been redone.
+    ///
+    /// On B_OK the history has taken the action and action is null. A
+    /// refused action stays with the caller, untouched, in action: one that
+    /// fails its InitCheck (its status is the result), or null (B_ERROR).
+    /// The caller may keep a plain pointer to run the action after handing
+    /// it over, whichever way it went.
+    status_t AddAction(std::unique_ptr<Action>& action);
 
     /// Takes back the last action; B_ERROR with nothing to undo. An action
     /// whose Undo fails leaves the history for good.

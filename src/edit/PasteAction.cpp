@@ -10,6 +10,11 @@
 
 namespace glimmet {
 
+PasteAction::PasteAction(MessageTarget* window, const CopyBuffer* copyBuffer)
+    : Action(window), copyBuffer_(copyBuffer)
+{
+}
+
 int32_t PasteAction::FirstSelectedChannel()
 {
     for (int32_t i = 0; Channel* channel = Manager()->ChannelAt(i); i++) {
@@ -29,11 +34,10 @@ status_t PasteAction::Go()
     if (InitCheck() != B_OK)
         return B_ERROR;
     firstChannel_ = FirstSelectedChannel();
-    CopyBuffer* copyBuffer = CopyBuffer::ApplicationBuffer();
     std::vector<const int16_t*> buffers;
     int32_t count = 0;
     int64_t frames = 0;
-    if (copyBuffer != nullptr && copyBuffer->GetCopyBuffer(buffers, count, frames)) {
+    if (copyBuffer_ != nullptr && copyBuffer_->GetCopyBuffer(buffers, count, frames)) {
         pastedChannelCount_ = 0;
         if (ReplaceMode())
             PasteOverRange(buffers, frames);

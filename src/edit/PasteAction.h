@@ -4,7 +4,9 @@
 
 namespace glimmet {
 
-/// "Paste": puts the application's copy buffer into the document, over the
+class CopyBuffer;
+
+/// "Paste": puts a copy buffer (the application's) into the document, over the
 /// range of the selected channels when there is a valid range, otherwise in
 /// front of the cursor into the focused channel and those after it.
 ///
@@ -14,7 +16,11 @@ namespace glimmet {
 /// it. The redo is the base one: the buffer is pasted again as it is then.
 class PasteAction : public Action {
 public:
-    using Action::Action;
+    /// copyBuffer is what Go pastes; not owned, and null pastes nothing.
+    PasteAction(MessageTarget* window, const CopyBuffer* copyBuffer);
+
+    /// Replaces the buffer a later Go or Redo pastes from.
+    void SetCopyBuffer(const CopyBuffer* copyBuffer) { copyBuffer_ = copyBuffer; }
 
     /// B_ERROR when not bound; B_OK otherwise, also when there is nothing to
     /// paste (the empty paste is still recorded).
@@ -35,6 +41,7 @@ private:
     void InsertAtCursor(const std::vector<const int16_t*>& buffers, int64_t frames);
     void RemoveInsertedFrames();
 
+    const CopyBuffer* copyBuffer_;
     // Written by Go, read by Undo; all start at 0 except the first channel.
     int64_t pasteStart_ = 0;
     int64_t pasteEnd_ = 0;

@@ -99,7 +99,8 @@ std::vector<std::vector<int16_t>> ReadWav(const std::filesystem::path& path)
 
 void MakeUnsaved(QuillexWindow* window)
 {
-    ASSERT_EQ(window->History()->AddAction(new MarkAction), B_OK);
+    std::unique_ptr<Action> mark = std::make_unique<MarkAction>();
+    ASSERT_EQ(window->History()->AddAction(mark), B_OK);
     ASSERT_FALSE(window->History()->IsSaved());
 }
 
@@ -134,6 +135,27 @@ std::filesystem::path AppFixture::MakeSound(const std::string& name, int channel
     const std::filesystem::path path = Dir() / name;
     WriteWav(path, samples);
     return path;
+}
+
+QuillexWindow* OpenWindow(AppFixture& fixture, const std::filesystem::path& file)
+{
+    QuillexWindow* window = fixture.App().NewWindow();
+    if (!file.empty()) {
+        window->LockWindow();
+        window->SetTo(file);
+        window->UnlockWindow();
+    }
+    Drain();
+    return window;
+}
+
+bool IsListed(AppFixture& fixture, QuillexWindow* window)
+{
+    for (int32_t i = 0; i < fixture.App().CountWindows(); ++i) {
+        if (fixture.App().WindowAt(i) == window)
+            return true;
+    }
+    return false;
 }
 
 }  // namespace glimmet::test

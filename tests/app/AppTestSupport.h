@@ -30,6 +30,13 @@ inline void Drain()
 /// been saved since.
 void MakeUnsaved(QuillexWindow* window);
 
+class AppFixture;
+/// A window of the fixture's application, loaded with a file when one is
+/// given.
+QuillexWindow* OpenWindow(AppFixture& fixture, const std::filesystem::path& file = {});
+/// Whether the window is still in the application's list.
+bool IsListed(AppFixture& fixture, QuillexWindow* window);
+
 /// Writes a 16-bit PCM WAV file; channels[c][f] is frame f of channel c.
 void WriteWav(const std::filesystem::path& path, const std::vector<std::vector<int16_t>>& channels,
     uint32_t rate = 44100);

@@ -217,14 +217,15 @@ TEST(Quillex, TwoReadsOfTheCopyBufferShareTheSampleArrays)
 TEST(Quillex, TheApplicationBufferIsTheOneEditsFind)
 {
     AppFixture fixture;
-    ASSERT_NE(CopyBuffer::ApplicationBuffer(), nullptr);
+    const CopyBuffer* edits = fixture.App().NewWindow()->SharedCopyBuffer();
+    ASSERT_NE(edits, nullptr);
     std::vector<CopyBuffer::Samples> arrays;
     arrays.push_back(CopyBuffer::Samples(new int16_t[2]()));
     ASSERT_TRUE(fixture.App().SetCopyBuffer(std::move(arrays), 2));
     std::vector<const int16_t*> channels;
     int32_t count = 0;
     int64_t frames = 0;
-    EXPECT_TRUE(CopyBuffer::ApplicationBuffer()->GetCopyBuffer(channels, count, frames));
+    EXPECT_TRUE(edits->GetCopyBuffer(channels, count, frames));
     EXPECT_EQ(frames, 2);
 }
 

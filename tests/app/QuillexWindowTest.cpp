@@ -30,29 +30,6 @@
 namespace glimmet::test {
 namespace {
 
-/// A window of the fixture's application, loaded with a file when one is
-/// given.
-QuillexWindow* OpenWindow(AppFixture& fixture, const std::filesystem::path& file = {})
-{
-    QuillexWindow* window = fixture.App().NewWindow();
-    if (!file.empty()) {
-        window->LockWindow();
-        window->SetTo(file);
-        window->UnlockWindow();
-    }
-    Drain();
-    return window;
-}
-
-bool IsListed(AppFixture& fixture, QuillexWindow* window)
-{
-    for (int32_t i = 0; i < fixture.App().CountWindows(); ++i) {
-        if (fixture.App().WindowAt(i) == window)
-            return true;
-    }
-    return false;
-}
-
 void DropFiles(QuillexWindow* window, const std::vector<std::filesystem::path>& files, Qt::KeyboardModifiers modifiers)
 {
     QMimeData data;
@@ -318,197 +295,6 @@ TEST(QuillexWindow, DropMessageWithoutRefsIsIgnored)
     EXPECT_EQ(window->Manager()->CountChannels(), 1);
 }
 
-TEST(QuillexWindow, SaveOnAnUntitledDocumentAsksWhereWithSoundWav)
-{
-    AppFixture fixture;
-    QuillexWindow* window = OpenWindow(fixture);
-    EXPECT_EQ(window->SavePanel(), nullptr);
-    window->PostMessage(kMsgSave);
-    Drain();
-    QFileDialog* panel = window->SavePanel();
-    ASSERT_NE(panel, nullptr);
-    EXPECT_TRUE(panel->isVisible());
-    EXPECT_EQ(panel->acceptMode(), QFileDialog::AcceptSave);
-    auto* nameField = panel->findChild<QLineEdit*>("fileNameEdit");
-    ASSERT_NE(nameField, nullptr);
-    EXPECT_EQ(nameField->text(), "sound.wav");
-
-    // Loaded content, then the user picks a name in the panel.
-    const auto source = fixture.MakeSound("source.wav", 1, 2500);
-    window->SetAppendOnLoad(true);
-    window->SetTo(source);
-    window->SetFileEntry(std::nullopt);
-    const std::filesystem::path target = fixture.Dir() / "chosen.wav";
-    emit panel->fileSelected(QString::fromStdString(target.string()));
-    Drain();
-    EXPECT_EQ(window->windowTitle(), "Glimmet - chosen.wav");
-    EXPECT_EQ(window->FileEntry(), target);
-    const auto saved = ReadWav(target);
-    ASSERT_EQ(saved.size(), 2u);
-    EXPECT_EQ(saved[0].size(), 2500u);
-    EXPECT_FALSE(window->MenuItem(KeptMenuItem::Save)->isEnabled());
-}
-
-TEST(QuillexWindow, SaveAsShowsThePanelAgainAndSaveWithAFileWritesIt)
-{
-    AppFixture fixture;
-    const auto file = fixture.MakeSound("doc.wav", 1, 300);
-    QuillexWindow* window = OpenWindow(fixture, file);
-    window->PostMessage(kMsgSaveAs);
-    Drain();
-    ASSERT_NE(window->SavePanel(), nullptr);
-    QFileDialog* first = window->SavePanel();
-    first->hide();
-    window->PostMessage(kMsgSaveAs);
-    Drain();
-    EXPECT_EQ(window->SavePanel(), first);
-    EXPECT_TRUE(first->isVisible());
-    first->hide();
-
-    std::filesystem::remove(file);
-    window->PostMessage(kMsgSave);
-    Drain();
-    const auto saved = ReadWav(file);
-    ASSERT_EQ(saved.size(), 2u);
-    EXPECT_EQ(saved[0].size(), 300u);
-}
-
-TEST(QuillexWindow, SavePanelChoiceNeedsBothFieldsAndAnExistingFolder)
-{
-    AppFixture fixture;
-    QuillexWindow* window = OpenWindow(fixture);
-    Message noName(kMsgSavePanelChoice);
-    noName.AddPath("directory", fixture.Dir());
-    window->PostMessage(noName);
-    Message badFolder(kMsgSavePanelChoice);
-    badFolder.AddPath("directory", fixture.Dir() / "missing");
-    badFolder.AddString("name", "x.wav");
-    window->PostMessage(badFolder);
-    Drain();
-    EXPECT_FALSE(window->FileEntry().has_value());
-    EXPECT_EQ(window->windowTitle(), "Glimmet");
-    EXPECT_FALSE(std::filesystem::exists(fixture.Dir() / "missing"));
-}
-
-TEST(QuillexWindow, SaveFailurePrintsTheError)
-{
-    AppFixture fixture;
-    QuillexWindow* window = OpenWindow(fixture);
-    window->SetFileEntry(fixture.Dir() / "no-such-folder" / "x.wav");
-    testing::internal::CaptureStdout();
-    window->MessageReceived(Message(kMsgSave));
-    const std::string output = testing::internal::GetCapturedStdout();
-    EXPECT_NE(output.find("error writing file. ("), std::string::npos) << output;
-    EXPECT_EQ(output.back(), '\n');
-}
-
-TEST(QuillexWindow, ClosingAnEditedUntitledDocumentClosesWithoutAQuestion)
-{
-    AppFixture fixture;
-    fixture.App().ReadyToRun();
-    QuillexWindow* window = OpenWindow(fixture);
-    MakeUnsaved(window);
-    window->PostMessage(kMsgQuitRequested);
-    Drain();
-    EXPECT_FALSE(IsListed(fixture, window));
-    EXPECT_EQ(fixture.App().CountWindows(), 1);
-}
-
-TEST(QuillexWindow, TheCloseBoxAsksLikeClose)
-{
-    AppFixture fixture;
-    fixture.App().ReadyToRun();
-    QuillexWindow* window = OpenWindow(fixture);
-    EXPECT_FALSE(window->close());  // refused at once, handled by the application
-    Drain();
-    EXPECT_FALSE(IsListed(fixture, window));
-}
-
-class CloseLoadedDocument : public testing::TestWithParam<int> {};
-
-TEST_P(CloseLoadedDocument, AnswersDecideWhatHappens)
-{
-    AppFixture fixture;
-    fixture.App().ReadyToRun();
-    const auto file = fixture.MakeSound("loaded.wav", 1, 200);
-    QuillexWindow* window = OpenWindow(fixture, file);
-    window->ContainerView()->SelectAll();
-    window->PostMessage(kMsgMaximize);
-    Drain();
-    ASSERT_FALSE(window->History()->IsSaved());
-    const auto before = ReadWav(file);
-
-    int asked = 0;
-    QuillexWindow::SetSaveQuestion([&](QuillexWindow*) {
-        ++asked;
-        return GetParam();
-    });
-    window->PostMessage(kMsgQuitRequested);
-    Drain();
-    EXPECT_EQ(asked, 1);
-    const auto after = ReadWav(file);
-    switch (GetParam()) {
-    case QuillexWindow::kDontSave:
-        EXPECT_FALSE(IsListed(fixture, window));
-        EXPECT_EQ(after, before);
-        break;
-    case QuillexWindow::kSave:
-        EXPECT_FALSE(IsListed(fixture, window));
-        ASSERT_EQ(after.size(), 2u);  // written again, as the stereo mix
-        EXPECT_EQ(after[0].size(), 200u);
-        break;
-    case QuillexWindow::kDontQuit:
-        EXPECT_TRUE(IsListed(fixture, window));
-        EXPECT_TRUE(window->isVisible());
-        EXPECT_EQ(after, before);
-        break;
-    }
-}
-
-INSTANTIATE_TEST_SUITE_P(Answers, CloseLoadedDocument,
-    testing::Values(int(QuillexWindow::kDontSave), int(QuillexWindow::kSave), int(QuillexWindow::kDontQuit)));
-
-TEST(QuillexWindow, TheAlertShowsItsThreeButtonsLeftToRight)
-{
-    AppFixture fixture;
-    QuillexWindow* window = OpenWindow(fixture);
-    QStringList labels;
-    QString text;
-    QString name;
-    QMessageBox::Icon icon = QMessageBox::NoIcon;
-    QTimer::singleShot(0, [&] {
-        auto* alert = qobject_cast<QMessageBox*>(QApplication::activeModalWidget());
-        ASSERT_NE(alert, nullptr);
-        text = alert->text();
-        name = alert->objectName();
-        icon = alert->icon();
-        QList<QAbstractButton*> buttons = alert->buttons();
-        std::sort(buttons.begin(), buttons.end(), [alert](QAbstractButton* a, QAbstractButton* b) {
-            return a->mapTo(alert, QPoint(0, 0)).x() < b->mapTo(alert, QPoint(0, 0)).x();
-        });
-        for (QAbstractButton* button : buttons)
-            labels << button->text();
-        buttons.at(1)->click();
-    });
-    EXPECT_EQ(QuillexWindow::AskSaveChanges(window), QuillexWindow::kSave);
-    EXPECT_EQ(text, "Save changes?");
-    EXPECT_EQ(name, "alert");
-    EXPECT_EQ(icon, QMessageBox::Warning);
-    EXPECT_EQ(labels, (QStringList{"Nope!", "Yes, please.", "Don't quit!"}));
-}
-
-TEST(QuillexWindow, TheAlertsEscapeKeepsTheWindow)
-{
-    AppFixture fixture;
-    QuillexWindow* window = OpenWindow(fixture);
-    QTimer::singleShot(0, [] {
-        QWidget* alert = QApplication::activeModalWidget();
-        ASSERT_NE(alert, nullptr);
-        QTest::keyClick(alert, Qt::Key_Escape);
-    });
-    EXPECT_EQ(QuillexWindow::AskSaveChanges(window), QuillexWindow::kDontQuit);
-}
-
 TEST(QuillexWindow, VisibleFramesAreTheContainersDisplayRange)
 {
     AppFixture fixture;
@@ -582,7 +368,7 @@ TEST(QuillexWindow, AConfiguredActionWaitsForItsDialog)
     QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("pending.wav", 1, 100));
     int runs = 0;
     auto* action = new ConfiguredAction(&runs);
-    window->SetupAction(action);
+    window->SetupAction(std::unique_ptr<Action>(action));
     Drain();
     EXPECT_EQ(window->PendingAction(), action);
     EXPECT_EQ(runs, 0);
@@ -598,7 +384,7 @@ TEST(QuillexWindow, ActionCancelDropsThePendingAction)
     AppFixture fixture;
     QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("cancel.wav", 1, 100));
     int runs = 0;
-    window->SetupAction(new ConfiguredAction(&runs));
+    window->SetupAction(std::make_unique<ConfiguredAction>(&runs));
     window->PostMessage(kMsgActionCancel);
     window->PostMessage(kMsgActionGo);
     Drain();
@@ -611,7 +397,7 @@ TEST(QuillexWindow, AnActionThatFailsItsCheckIsDroppedAtOnce)
 {
     AppFixture fixture;
     QuillexWindow* window = OpenWindow(fixture);
-    window->SetupAction(new UnreadyAction);
+    window->SetupAction(std::make_unique<UnreadyAction>());
     EXPECT_EQ(window->PendingAction(), nullptr);
     window->PostMessage(kMsgActionGo);
     Drain();
@@ -626,9 +412,9 @@ TEST(QuillexWindow, ANewActionReplacesOneStillWaitingForItsDialog)
     QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("replace.wav", 1, 100));
     int firstRuns = 0;
     int secondRuns = 0;
-    window->SetupAction(new ConfiguredAction(&firstRuns));
+    window->SetupAction(std::make_unique<ConfiguredAction>(&firstRuns));
     auto* second = new ConfiguredAction(&secondRuns);
-    window->SetupAction(second);
+    window->SetupAction(std::unique_ptr<Action>(second));
     EXPECT_EQ(window->PendingAction(), second);
     window->PostMessage(kMsgActionGo);
     Drain();

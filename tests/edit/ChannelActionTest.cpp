@@ -57,7 +57,8 @@ TEST(AddChannelActionTest, AddUndoAndDeleteHistoryDeletesTheChannel)
     HistoryManager history;
     auto* action = new AddChannelAction(nullptr);
     ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
-    ASSERT_EQ(history.AddAction(action), B_OK);
+    std::unique_ptr<Action> owned(action);
+    ASSERT_EQ(history.AddAction(owned), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     ASSERT_EQ(history.Undo(), B_OK);
     history.Clear();
@@ -70,7 +71,8 @@ TEST(AddChannelActionTest, AddUndoRedoAndDeleteHistoryKeepsTheChannel)
     HistoryManager history;
     auto* action = new AddChannelAction(nullptr);
     ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
-    ASSERT_EQ(history.AddAction(action), B_OK);
+    std::unique_ptr<Action> owned(action);
+    ASSERT_EQ(history.AddAction(owned), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     Channel* added = action->AddedChannel();
     ASSERT_EQ(history.Undo(), B_OK);
@@ -90,12 +92,14 @@ TEST(AddChannelActionTest, AddThenUndoneAddDiscardedByANewActionFreesIt)
     HistoryManager history;
     auto* first = new AddChannelAction(nullptr);
     ASSERT_EQ(first->SetTo(&document.manager, &document.position), B_OK);
-    ASSERT_EQ(history.AddAction(first), B_OK);
+    std::unique_ptr<Action> ownedFirst(first);
+    ASSERT_EQ(history.AddAction(ownedFirst), B_OK);
     ASSERT_EQ(first->Go(), B_OK);
     ASSERT_EQ(history.Undo(), B_OK);
     auto* second = new AddChannelAction(nullptr);
     ASSERT_EQ(second->SetTo(&document.manager, &document.position), B_OK);
-    ASSERT_EQ(history.AddAction(second), B_OK);
+    std::unique_ptr<Action> ownedSecond(second);
+    ASSERT_EQ(history.AddAction(ownedSecond), B_OK);
     ASSERT_EQ(second->Go(), B_OK);
     EXPECT_EQ(document.manager.CountChannels(), 1);
     EXPECT_EQ(history.RedoName(), nullptr);
@@ -150,7 +154,8 @@ TEST(RemoveChannelActionTest, WithoutAFocusedViewNothingHappensAndUndoIsHarmless
     HistoryManager history;
     auto* action = new RemoveChannelAction(nullptr);
     ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
-    ASSERT_EQ(history.AddAction(action), B_OK);
+    std::unique_ptr<Action> owned(action);
+    ASSERT_EQ(history.AddAction(owned), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     EXPECT_EQ(document.State(), before);
     EXPECT_STREQ(history.UndoName(), "Remove Channel");
@@ -170,7 +175,8 @@ TEST(RemoveChannelActionTest, RemovedChannelIsFreedWithTheHistory)
     HistoryManager history;
     auto* action = new RemoveChannelAction(nullptr);
     ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
-    ASSERT_EQ(history.AddAction(action), B_OK);
+    std::unique_ptr<Action> owned(action);
+    ASSERT_EQ(history.AddAction(owned), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     history.Clear();
     EXPECT_EQ(document.manager.CountChannels(), 0);
@@ -203,7 +209,8 @@ TEST(MoveSampleActionTest, UndoThenRedoRestoresTheDraggedPosition)
     HistoryManager history;
     auto* action = new MoveSampleAction(nullptr);
     ASSERT_EQ(action->SetTo(&document.manager, channel, 0 - 40), B_OK);
-    ASSERT_EQ(history.AddAction(action), B_OK);
+    std::unique_ptr<Action> owned(action);
+    ASSERT_EQ(history.AddAction(owned), B_OK);
     ASSERT_EQ(action->Go(), B_OK);
     EXPECT_EQ(channel->FirstFrame(), 40);
 

@@ -75,15 +75,5 @@ TEST(CopyBufferTest, AcceptedSetReplacesTheOldBuffer)
     EXPECT_EQ(channels[2][1], 251);
 }
 
-TEST(CopyBufferTest, ApplicationRegistration)
-{
-    EXPECT_EQ(CopyBuffer::ApplicationBuffer(), nullptr);
-    CopyBuffer buffer;
-    CopyBuffer::SetApplicationBuffer(&buffer);
-    EXPECT_EQ(CopyBuffer::ApplicationBuffer(), &buffer);
-    CopyBuffer::SetApplicationBuffer(nullptr);
-    EXPECT_EQ(CopyBuffer::ApplicationBuffer(), nullptr);
-}
-
 }  // namespace
 }  // namespace glimmet

@@ -330,7 +330,7 @@ private:
     }
 };
 
-std::unique_ptr<Action> MakeAction(Kind kind)
+std::unique_ptr<Action> MakeAction(Kind kind, const CopyBuffer* copyBuffer)
 {
     switch (kind) {
     case Kind::FadeIn: return std::make_unique<FadeInAction>(nullptr);
@@ -339,7 +339,7 @@ std::unique_ptr<Action> MakeAction(Kind kind)
     case Kind::Revert: return std::make_unique<RevertAction>(nullptr);
     case Kind::RevertPhases: return std::make_unique<RevertPhasesAction>(nullptr);
     case Kind::Remove: return std::make_unique<RemoveAction>(nullptr);
-    case Kind::Paste: return std::make_unique<PasteAction>(nullptr);
+    case Kind::Paste: return std::make_unique<PasteAction>(nullptr, copyBuffer);
     case Kind::Truncate: return std::make_unique<TruncateAction>(nullptr);
     case Kind::Move: return std::make_unique<MoveSampleAction>(nullptr);
     }
@@ -348,9 +348,6 @@ std::unique_ptr<Action> MakeAction(Kind kind)
 
 class EditSequenceTest : public ::testing::TestWithParam<uint32_t> {
 protected:
-    void SetUp() override { CopyBuffer::SetApplicationBuffer(&copyBuffer); }
-    void TearDown() override { CopyBuffer::SetApplicationBuffer(nullptr); }
-
     CopyBuffer copyBuffer;
 };
 
@@ -401,7 +398,7 @@ TEST_P(EditSequenceTest, RandomEditsUndosAndRedosFollowTheModel)
             }
             document.position.SetCursorFrame(kind == Kind::Paste && pick(0, 1) == 0 ? model.s.rangeStart : pick(0, total));
             document.position.SetFocusIndex(int32_t(pick(0, 2)));
-            std::unique_ptr<Action> action = MakeAction(kind);
+            std::unique_ptr<Action> action = MakeAction(kind, &copyBuffer);
             Record record;
             if (kind == Kind::Move) {
                 // The drag already moved the channel; the action records it.
@@ -420,7 +417,7 @@ TEST_P(EditSequenceTest, RandomEditsUndosAndRedosFollowTheModel)
                 record = model.Bind(kind, document.position.CursorFrame(), document.position.FocusIndex());
             }
             Action* raw = action.get();
-            ASSERT_EQ(history.AddAction(action.release()), B_OK);
+            ASSERT_EQ(history.AddAction(action), B_OK);
             ASSERT_EQ(raw->Go(), B_OK);
             model.Go(record);
             undo.push_back(record);

@@ -35,7 +35,6 @@ std::pair<DocumentState, DocumentState> RunSequence(bool withPlayback, int64_t* 
         std::fill(arrays.back().get(), arrays.back().get() + 500, int16_t(100 * (c + 1)));
     }
     copyBuffer.SetCopyBuffer(std::move(arrays), 500);
-    CopyBuffer::SetApplicationBuffer(&copyBuffer);
 
     std::atomic<bool> stop{false};
     std::atomic<int64_t> buffers{0};
@@ -64,7 +63,7 @@ std::pair<DocumentState, DocumentState> RunSequence(bool withPlayback, int64_t* 
             document.position.SetFocusIndex(count > 0 && pick(0, 1) == 1 ? int32_t(pick(0, count - 1)) : -1);
             std::unique_ptr<Action> action;
             switch (pick(0, 4)) {
-            case 0: action = std::make_unique<PasteAction>(nullptr); break;
+            case 0: action = std::make_unique<PasteAction>(nullptr, &copyBuffer); break;
             case 1: action = std::make_unique<RemoveAction>(nullptr); break;
             case 2: action = std::make_unique<TruncateAction>(nullptr); break;
             case 3: action = std::make_unique<AddChannelAction>(nullptr); break;
@@ -72,7 +71,7 @@ std::pair<DocumentState, DocumentState> RunSequence(bool withPlayback, int64_t* 
             }
             action->SetTo(&document.manager, &document.position);
             Action* raw = action.get();
-            history.AddAction(action.release());
+            history.AddAction(action);
             raw->Go();
         } else if (choice < 8) {
             history.Undo();
@@ -91,7 +90,6 @@ std::pair<DocumentState, DocumentState> RunSequence(bool withPlayback, int64_t* 
         std::this_thread::yield();
     stop = true;
     playback.join();
-    CopyBuffer::SetApplicationBuffer(nullptr);
     *buffersMixed = buffers.load();
     return {edited, document.State()};
 }

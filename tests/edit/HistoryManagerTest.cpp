@@ -53,7 +53,8 @@ protected:
     ScriptedAction* Add(const char* name)
     {
         ScriptedAction* action = Make(name);
-        EXPECT_EQ(history.AddAction(action), B_OK);
+        std::unique_ptr<Action> owned(action);
+        EXPECT_EQ(history.AddAction(owned), B_OK);
         return action;
     }
 
@@ -78,14 +79,16 @@ TEST_F(HistoryManagerTest, UndoAndRedoOfAnEmptyHistoryFail)
 
 TEST_F(HistoryManagerTest, AddNullFails)
 {
-    EXPECT_EQ(history.AddAction(nullptr), B_ERROR);
+    std::unique_ptr<Action> none;
+    EXPECT_EQ(history.AddAction(none), B_ERROR);
 }
 
 TEST_F(HistoryManagerTest, ActionFailingItsCheckIsNotRecordedNorDeleted)
 {
-    std::unique_ptr<ScriptedAction> action(Make("bad"));
-    action->initStatus = B_NO_INIT;
-    EXPECT_EQ(history.AddAction(action.get()), B_NO_INIT);
+    ScriptedAction* bad = Make("bad");
+    std::unique_ptr<Action> action(bad);
+    bad->initStatus = B_NO_INIT;
+    EXPECT_EQ(history.AddAction(action), B_NO_INIT);
     EXPECT_EQ(history.UndoName(), nullptr);
     EXPECT_EQ(deaths, 0);
 }
@@ -94,10 +97,38 @@ TEST_F(HistoryManagerTest, ActionFailingItsCheckKeepsTheRedoStack)
 {
     Add("a");
     ASSERT_EQ(history.Undo(), B_OK);
-    std::unique_ptr<ScriptedAction> action(Make("bad"));
-    action->initStatus = B_ERROR;
-    EXPECT_EQ(history.AddAction(action.get()), B_ERROR);
+    ScriptedAction* bad = Make("bad");
+    std::unique_ptr<Action> action(bad);
+    bad->initStatus = B_ERROR;
+    EXPECT_EQ(history.AddAction(action), B_ERROR);
     EXPECT_STREQ(history.RedoName(), "a");
+}
+
+TEST_F(HistoryManagerTest, AnAcceptedActionLeavesTheCallersPointerEmpty)
+{
+    ScriptedAction* taken = Make("a");
+    std::unique_ptr<Action> action(taken);
+    ASSERT_EQ(history.AddAction(action), B_OK);
+    EXPECT_EQ(action, nullptr);
+    EXPECT_STREQ(history.UndoName(), "a");
+    EXPECT_EQ(deaths, 0);
+    history.Clear();
+    EXPECT_EQ(deaths, 1);
+}
+
+TEST_F(HistoryManagerTest, ARefusedActionIsHandedBackAlive)
+{
+    ScriptedAction* refused = Make("bad");
+    refused->initStatus = B_NO_INIT;
+    std::unique_ptr<Action> action(refused);
+    ASSERT_EQ(history.AddAction(action), B_NO_INIT);
+    EXPECT_EQ(action.get(), refused);
+    // Still the caller's: ready now, it is accepted on a second try.
+    refused->initStatus = B_OK;
+    EXPECT_EQ(history.AddAction(action), B_OK);
+    EXPECT_EQ(action, nullptr);
+    EXPECT_STREQ(history.UndoName(), "bad");
+    EXPECT_EQ(deaths, 0);
 }
 
 TEST_F(HistoryManagerTest, UndoMovesTheTopToTheRedoStack)
@@ -171,12 +202,15 @@ TEST_F(HistoryManagerTest, DestructorDeletesRecordedAndDroppedActions)
     int localDeaths = 0;
     {
         HistoryManager local;
-        local.AddAction(new ScriptedAction("a", &localDeaths));
+        std::unique_ptr<Action> a = std::make_unique<ScriptedAction>("a", &localDeaths);
+        local.AddAction(a);
         auto* failing = new ScriptedAction("b", &localDeaths);
         failing->undoStatus = B_ERROR;
-        local.AddAction(failing);
+        std::unique_ptr<Action> b(failing);
+        local.AddAction(b);
         local.Undo();
-        local.AddAction(new ScriptedAction("c", &localDeaths));
+        std::unique_ptr<Action> c = std::make_unique<ScriptedAction>("c", &localDeaths);
+        local.AddAction(c);
         local.Undo();
         EXPECT_EQ(localDeaths, 0);
     }

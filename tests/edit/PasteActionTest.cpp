@@ -7,6 +7,7 @@
 #include "TestDocument.h"
 #include "edit/CopyBuffer.h"
 #include "edit/HistoryManager.h"
+#include "edit/SelectionCopier.h"
 
 namespace glimmet {
 namespace {
@@ -15,12 +16,9 @@ using test::DocumentState;
 using test::Ramp;
 using test::TestDocument;
 
-/// Registers an application copy buffer for one test.
+/// One copy buffer per test, the one every action of the test pastes from.
 class PasteActionTest : public ::testing::Test {
 protected:
-    void SetUp() override { CopyBuffer::SetApplicationBuffer(&copyBuffer); }
-    void TearDown() override { CopyBuffer::SetApplicationBuffer(nullptr); }
-
     void Copy(const std::vector<std::vector<int16_t>>& channels)
     {
         std::vector<CopyBuffer::Samples> arrays;
@@ -31,25 +29,16 @@ protected:
         ASSERT_TRUE(copyBuffer.SetCopyBuffer(std::move(arrays), int64_t(channels[0].size())));
     }
 
-    /// What the window's copy command does: the range of every selected
-    /// channel into the application's buffer.
+    /// The window's copy command: the range of every selected channel into
+    /// the buffer.
     void CopyFrom(TestDocument& document)
     {
-        std::vector<std::vector<int16_t>> channels;
-        const int64_t start = document.manager.RangeStart();
-        const int64_t frames = document.manager.RangeEnd() - start + 1;
-        for (int32_t i = 0; Channel* channel = document.manager.ChannelAt(i); i++) {
-            if (!channel->IsSelected())
-                continue;
-            channels.emplace_back(size_t(frames));
-            channel->FillBuffer(channels.back().data(), start, frames);
-        }
-        Copy(channels);
+        ASSERT_TRUE(SelectionCopier::CopySelection(document.manager, copyBuffer));
     }
 
     std::unique_ptr<PasteAction> Bound(TestDocument& document)
     {
-        auto action = std::make_unique<PasteAction>(nullptr);
+        auto action = std::make_unique<PasteAction>(nullptr, &copyBuffer);
         EXPECT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
         return action;
     }
@@ -59,7 +48,7 @@ protected:
 
 TEST_F(PasteActionTest, NameAndMenu)
 {
-    PasteAction action(nullptr);
+    PasteAction action(nullptr, &copyBuffer);
     EXPECT_STREQ(action.Name(), "Paste");
     EXPECT_STREQ(action.PreferredMenu(), "Tools");
     EXPECT_FALSE(action.SupportsConfiguration());
@@ -202,10 +191,11 @@ TEST_F(PasteActionTest, MissingCopyBufferIsAnEmptyPasteThatIsRecorded)
     document.SetRange(2, 3);
     const DocumentState before = document.State();
     HistoryManager history;
-    auto* action = new PasteAction(nullptr);
+    auto* action = new PasteAction(nullptr, &copyBuffer);
+    std::unique_ptr<Action> owned(action);
     ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
-    ASSERT_EQ(history.AddAction(action), B_OK);
-    CopyBuffer::SetApplicationBuffer(nullptr);
+    ASSERT_EQ(history.AddAction(owned), B_OK);
+    action->SetCopyBuffer(nullptr);
     EXPECT_EQ(action->Go(), B_OK);
     EXPECT_EQ(document.State(), before);
     EXPECT_STREQ(history.UndoName(), "Paste");
@@ -213,7 +203,7 @@ TEST_F(PasteActionTest, MissingCopyBufferIsAnEmptyPasteThatIsRecorded)
     EXPECT_EQ(document.State(), before);
     // Nothing copied yet is the same as no buffer.
     CopyBuffer empty;
-    CopyBuffer::SetApplicationBuffer(&empty);
+    action->SetCopyBuffer(&empty);
     EXPECT_EQ(history.Redo(), B_OK);
     EXPECT_EQ(document.State(), before);
 }
@@ -277,6 +267,23 @@ TEST_F(PasteActionTest, BufferWithMoreChannelsThanRemainIsPastedAsFarAsChannelsG
     EXPECT_EQ(after.channels[2].samples, (std::vector<int16_t>{1}));
     EXPECT_EQ(after.channels[0].samples.size(), 10u);
     EXPECT_EQ(action->PastedChannelCount(), 1);
+}
+
+TEST_F(PasteActionTest, PastesFromTheBufferItWasHandedOnly)
+{
+    TestDocument document;
+    document.AddChannel(Ramp(0, 4), 0, false);
+    document.SetRange(-1, -1);
+    document.position.SetCursorFrame(0);
+    Copy({{7, 8}});
+    CopyBuffer other;
+    std::vector<CopyBuffer::Samples> arrays;
+    arrays.emplace_back(new int16_t[3]{-1, -2, -3});
+    ASSERT_TRUE(other.SetCopyBuffer(std::move(arrays), 3));
+    PasteAction action(nullptr, &other);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
+    ASSERT_EQ(action.Go(), B_OK);
+    EXPECT_EQ(document.State().channels[0].samples, (std::vector<int16_t>{-1, -2, -3, 0, 1, 2, 3}));
 }
 
 }  // namespace

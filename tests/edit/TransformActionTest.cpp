@@ -80,7 +80,7 @@ TEST_P(TransformActionTest, NoSelectedChannelChangesNothingButIsRecorded)
     HistoryManager history;
     std::unique_ptr<Action> action = Bound(document);
     Action* raw = action.get();
-    ASSERT_EQ(history.AddAction(action.release()), B_OK);
+    ASSERT_EQ(history.AddAction(action), B_OK);
     EXPECT_EQ(raw->Go(), B_OK);
     EXPECT_EQ(document.State(), before);
     EXPECT_EQ(history.UndoName(), GetParam().name);
@@ -99,7 +99,7 @@ TEST_P(TransformActionTest, UndoAndRedoThroughTheHistory)
     HistoryManager history;
     std::unique_ptr<Action> action = Bound(document);
     Action* raw = action.get();
-    ASSERT_EQ(history.AddAction(action.release()), B_OK);
+    ASSERT_EQ(history.AddAction(action), B_OK);
     ASSERT_EQ(raw->Go(), B_OK);
     const DocumentState after = document.State();
     // Select otherwise and move the range: undo and redo put them back.
@@ -206,8 +206,9 @@ TEST(TransformEdgeTest, MaximizeAtFullScaleChangesNothingButCanBeUndone)
         const DocumentState before = document.State();
         HistoryManager history;
         auto* action = new MaximizeAction(nullptr);
+        std::unique_ptr<Action> owned(action);
         ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
-        ASSERT_EQ(history.AddAction(action), B_OK);
+        ASSERT_EQ(history.AddAction(owned), B_OK);
         ASSERT_EQ(action->Go(), B_OK);
         EXPECT_EQ(document.State(), before);
         EXPECT_STREQ(history.UndoName(), "Maximize");

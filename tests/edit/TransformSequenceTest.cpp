@@ -120,7 +120,7 @@ TEST(TransformSequenceTest, RandomTransformsUndosAndRedosFollowTheModel)
             std::unique_ptr<Action> action = transforms[which].make();
             ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
             Action* raw = action.get();
-            ASSERT_EQ(history.AddAction(action.release()), B_OK);
+            ASSERT_EQ(history.AddAction(action), B_OK);
             ASSERT_EQ(raw->Go(), B_OK);
             undo.push_back(model.Record(which));
             redo.clear();

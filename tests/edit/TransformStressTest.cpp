@@ -57,7 +57,7 @@ TEST(TransformStressTest, TransformsAndUndosWhilePlaybackMixes)
             std::unique_ptr<Action> action = transforms[size_t(pick(0, 4))].make();
             ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
             Action* raw = action.get();
-            ASSERT_EQ(history.AddAction(action.release()), B_OK);
+            ASSERT_EQ(history.AddAction(action), B_OK);
             ASSERT_EQ(raw->Go(), B_OK);
             recorded++;
         } else if (choice == 2) {

@@ -99,7 +99,7 @@ protected:
     /// Gives the history an action, so that it is not saved.
     void MakeUnsaved()
     {
-        auto* action = new Action(nullptr);
+        auto action = std::make_unique<Action>(nullptr);
         ASSERT_EQ(action->SetTo(&window.manager, &position), B_OK);
         ASSERT_EQ(window.history.AddAction(action), B_OK);
         ASSERT_FALSE(window.history.IsSaved());

@@ -100,7 +100,7 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
             std::unique_ptr<Action> action = MakeTransform(pick(0, 4));
             ASSERT_EQ(action->SetTo(&manager, &position), B_OK);
             Action* raw = action.get();
-            ASSERT_EQ(history.AddAction(action.release()), B_OK);
+            ASSERT_EQ(history.AddAction(action), B_OK);
             ASSERT_EQ(raw->Go(), B_OK);
             recorded++;
         } else if (choice == 3 || choice == 4) {

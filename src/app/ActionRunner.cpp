@@ -1,0 +1,130 @@
+#include "app/ActionRunner.h"
+
+#include <QAction>
+#include <QString>
+
+#include <cstdio>
+
+#include "app/MenuBuilder.h"
+#include "edit/Action.h"
+#include "edit/EditContext.h"
+#include "edit/HistoryManager.h"
+#include "sound/ChannelManager.h"
+#include "support/MessageCodes.h"
+#include "support/MessageTarget.h"
+
+namespace glimmet {
+
+namespace {
+
+/// "Undo" or "Redo", with the action's name when there is one to take.
+void Relabel(QAction* item, const char* verb, const char* name)
+{
+    const QString label = QString::fromUtf8(verb);
+    item->setEnabled(name != nullptr);
+    item->setText(name != nullptr ? label + QLatin1Char(' ') + QString::fromUtf8(name) : label);
+}
+
+}  // namespace
+
+ActionRunner::ActionRunner(MessageTarget& window, ChannelManager& manager, EditContext& context,
+    HistoryManager& history, const MenuBuilder& menus)
+    : window_(window), manager_(manager), context_(context), history_(history), menus_(menus)
+{
+}
+
+ActionRunner::~ActionRunner() = default;
+
+void ActionRunner::MakePending(std::unique_ptr<Action> action)
+{
+    // An action still waiting for its dialog stays alive (its dialog may yet
+    // answer), but is no longer the one that runs.
+    if (pending_)
+        superseded_.push_back(std::move(pending_));
+    pending_ = std::move(action);
+}
+
+void ActionRunner::SetupAction(std::unique_ptr<Action> action)
+{
+    MakePending(std::move(action));
+    if (!pending_)
+        return;
+    pending_->SetTo(&manager_, &context_);
+    if (pending_->InitCheck() != B_OK) {
+        pending_.reset();
+        return;
+    }
+    if (!pending_->SupportsConfiguration())
+        window_.PostMessage(kMsgActionGo);
+}
+
+void ActionRunner::SetupBoundAction(std::unique_ptr<Action> action)
+{
+    if (!action || action->InitCheck() != B_OK || action->SupportsConfiguration())
+        return;
+    MakePending(std::move(action));
+    window_.PostMessage(kMsgActionGo);
+}
+
+void ActionRunner::Go()
+{
+    if (!pending_ || pending_->InitCheck() != B_OK)
+        return;
+    Action* action = pending_.get();
+    // Refused, it stays ours so that it is freed with the runner.
+    if (history_.AddAction(pending_) != B_OK)
+        superseded_.push_back(std::move(pending_));
+    action->Go();
+    Redraw();
+}
+
+void ActionRunner::Cancel()
+{
+    pending_.reset();
+}
+
+void ActionRunner::Undo()
+{
+    const status_t status = history_.Undo();
+    if (status != B_OK) {
+        std::printf("Error doing undo: %s\n", StatusText(status));
+        std::fflush(stdout);
+        return;
+    }
+    Redraw();
+}
+
+void ActionRunner::Redo()
+{
+    const status_t status = history_.Redo();
+    if (status != B_OK) {
+        std::printf("Error doing redo: %s\n", StatusText(status));
+        std::fflush(stdout);
+        return;
+    }
+    Redraw();
+}
+
+void ActionRunner::DeleteHistory()
+{
+    history_.Clear();
+    UpdateUndoMenu();
+}
+
+void ActionRunner::Redraw()
+{
+    manager_.ChannelsChanged();
+    UpdateUndoMenu();
+}
+
+void ActionRunner::UpdateUndoMenu()
+{
+    const char* undoName = history_.UndoName();
+    const char* redoName = history_.RedoName();
+    Relabel(menus_.Item(KeptMenuItem::Undo), "Undo", undoName);
+    Relabel(menus_.Item(KeptMenuItem::Redo), "Redo", redoName);
+    menus_.Item(KeptMenuItem::DeleteHistory)->setEnabled(undoName != nullptr || redoName != nullptr);
+    menus_.Item(KeptMenuItem::Save)->setEnabled(!history_.IsSaved());
+}
+
+}  // namespace glimmet

@@ -1,0 +1,120 @@
+#include "app/EditCommands.h"
+
+#include <functional>
+#include <memory>
+#include <utility>
+
+#include "app/ActionRunner.h"
+#include "app/CommandTable.h"
+#include "edit/AddChannelAction.h"
+#include "edit/CopyBuffer.h"
+#include "edit/FadeInAction.h"
+#include "edit/FadeOutAction.h"
+#include "edit/MaximizeAction.h"
+#include "edit/MoveSampleAction.h"
+#include "edit/PasteAction.h"
+#include "edit/RemoveAction.h"
+#include "edit/RemoveChannelAction.h"
+#include "edit/RevertAction.h"
+#include "edit/RevertPhasesAction.h"
+#include "edit/SelectionCopier.h"
+#include "edit/TruncateAction.h"
+#include "sound/Channel.h"
+#include "sound/ChannelManager.h"
+#include "support/MessageCodes.h"
+
+namespace glimmet {
+
+namespace {
+
+using MakeAction = std::function<std::unique_ptr<Action>(MessageTarget* window)>;
+
+template <typename T>
+MakeAction Maker()
+{
+    return [](MessageTarget* window) { return std::make_unique<T>(window); };
+}
+
+/// The commands that make an action of their own, with no other work.
+struct ActionCommand {
+    uint32_t what;
+    MakeAction make;
+};
+
+const std::vector<ActionCommand>& ActionCommands()
+{
+    static const std::vector<ActionCommand> commands{
+        {kMsgRemove, Maker<RemoveAction>()},
+        {kMsgTruncate, Maker<TruncateAction>()},
+        {kMsgAddChannel, Maker<AddChannelAction>()},
+        {kMsgRemoveChannel, Maker<RemoveChannelAction>()},
+        {kMsgFadeIn, Maker<FadeInAction>()},
+        {kMsgFadeOut, Maker<FadeOutAction>()},
+        {kMsgMaximize, Maker<MaximizeAction>()},
+        {kMsgRevert, Maker<RevertAction>()},
+        {kMsgRevertPhases, Maker<RevertPhasesAction>()},
+    };
+    return commands;
+}
+
+}  // namespace
+
+EditCommands::EditCommands(MessageTarget& window, ChannelManager& manager, ActionRunner& actions,
+    CopyBuffer* copyBuffer)
+    : window_(window), manager_(manager), actions_(actions), copyBuffer_(copyBuffer)
+{
+}
+
+void EditCommands::AddTo(CommandTable& table)
+{
+    table.Add(kMsgActionGo, [this] { actions_.Go(); });
+    table.Add(kMsgActionCancel, [this] { actions_.Cancel(); });
+    table.Add(kMsgUndo, [this] { actions_.Undo(); });
+    table.Add(kMsgRedo, [this] { actions_.Redo(); });
+    table.Add(kMsgClearHistory, [this] { actions_.DeleteHistory(); });
+    table.Add(kMsgCopy, [this] { Copy(); });
+    table.Add(kMsgCut, [this] { Cut(); });
+    table.Add(kMsgPaste, [this] { Paste(); });
+    table.Add(kMsgSampleMoved, [this](const Message& message) { SampleMoved(message); });
+    AddActionCommands(table);
+}
+
+void EditCommands::AddActionCommands(CommandTable& table)
+{
+    for (const ActionCommand& command : ActionCommands()) {
+        const MakeAction& make = command.make;
+        table.Add(command.what, [this, &make] { actions_.SetupAction(make(&window_)); });
+    }
+}
+
+void EditCommands::Copy()
+{
+    if (copyBuffer_ != nullptr)
+        SelectionCopier::CopySelection(manager_, *copyBuffer_);
+}
+
+void EditCommands::Cut()
+{
+    Copy();
+    actions_.SetupAction(std::make_unique<RemoveAction>(&window_));
+}
+
+void EditCommands::Paste()
+{
+    actions_.SetupAction(std::make_unique<PasteAction>(&window_, copyBuffer_));
+}
+
+void EditCommands::SampleMoved(const Message& message)
+{
+    Channel* channel = nullptr;
+    void* view = nullptr;
+    int64_t offset = 0;
+    if (message.FindPointer("channel", &channel) != B_OK || message.FindPointer("sample view", &view) != B_OK
+        || message.FindInt64("offset", &offset) != B_OK)
+        return;
+    auto action = std::make_unique<MoveSampleAction>(&window_);
+    action->SetTo(&manager_, channel, offset);
+    actions_.SetupBoundAction(std::move(action));
+}
+
+}  // namespace glimmet
