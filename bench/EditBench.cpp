@@ -53,7 +53,7 @@ struct Document {
                 samples[i] = int16_t(i * (c + 3));
             channel->SetTo(samples, kFrames);
             channel->SetSelected(true);
-            manager.AddChannel(channel);
+            manager.AddChannel(std::unique_ptr<Channel>(channel));
         }
     }
 

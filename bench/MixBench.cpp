@@ -34,7 +34,7 @@ void PlaybackMix(int32_t channels)
 {
     ChannelManager manager(nullptr);
     for (int32_t c = 0; c < channels; ++c)
-        manager.AddChannel(RandomChannel(10 * 44100, c % 2 == 0 ? -128 : 127, uint32_t(c + 1)));
+        manager.AddChannel(std::unique_ptr<Channel>(RandomChannel(10 * 44100, c % 2 == 0 ? -128 : 127, uint32_t(c + 1))));
     std::vector<float> out(size_t(kBufferFrames) * 2);
     const double mixNs = bench::BestNanoseconds(5, 2000, [&] {
         manager.FillBuffer(out.data(), kBufferFrames);
@@ -50,8 +50,8 @@ void PlaybackMix(int32_t channels)
 void SaveMix()
 {
     ChannelManager manager(nullptr);
-    manager.AddChannel(RandomChannel(kOneHourFrames, -128, 1));
-    manager.AddChannel(RandomChannel(kOneHourFrames, 127, 2));
+    manager.AddChannel(std::unique_ptr<Channel>(RandomChannel(kOneHourFrames, -128, 1)));
+    manager.AddChannel(std::unique_ptr<Channel>(RandomChannel(kOneHourFrames, 127, 2)));
     std::vector<int16_t> out(1024 * 2);
     const double saveNs = bench::BestNanoseconds(3, 1, [&] {
         manager.SetCurrentFrame(0);

@@ -73,7 +73,7 @@ void FillDocument(ChannelManager* manager, const std::vector<std::vector<int16_t
         auto* channel = new Channel();
         channel->SetTo(data, int64_t(samples[c].size()));
         channel->SetPanPosition(pans[c % 3]);
-        manager->AddChannel(channel);
+        manager->AddChannel(std::unique_ptr<Channel>(channel));
     }
 }
 

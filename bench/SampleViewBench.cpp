@@ -41,7 +41,7 @@ Channel* MakeOneHourChannel()
 struct Scene {
     Scene()
     {
-        manager.AddChannel(MakeOneHourChannel());
+        manager.AddChannel(std::unique_ptr<Channel>(MakeOneHourChannel()));
         // As in a document window: a zoom slider along the bottom.
         container = std::make_unique<ChannelContainerView>(&manager, new ZoomSlider(nullptr, 0, 0, 0), nullptr);
         container->resize(kContainerWidth, kContainerHeight);

@@ -109,7 +109,7 @@ void RunTransform(benchmark::State& state, const Check& check)
         FillSignal(samples, kFrames, c);
         channel->SetTo(samples, kFrames);
         channel->SetSelected(true);
-        manager.AddChannel(channel);
+        manager.AddChannel(std::unique_ptr<Channel>(channel));
     }
     manager.SetRangeStart(0);
     manager.SetRangeEnd(kFrames - 1);

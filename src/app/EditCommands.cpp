@@ -22,6 +22,7 @@
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 
 namespace glimmet {
 
@@ -109,8 +110,8 @@ void EditCommands::SampleMoved(const Message& message)
     Channel* channel = nullptr;
     void* view = nullptr;
     int64_t offset = 0;
-    if (message.FindPointer("channel", &channel) != B_OK || message.FindPointer("sample view", &view) != B_OK
-        || message.FindInt64("offset", &offset) != B_OK)
+    if (message.FindPointer(kFieldChannel, &channel) != B_OK || message.FindPointer(kFieldSampleView, &view) != B_OK
+        || message.FindInt64(kFieldOffset, &offset) != B_OK)
         return;
     auto action = std::make_unique<MoveSampleAction>(&window_);
     action->SetTo(&manager_, channel, offset);

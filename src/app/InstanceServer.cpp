@@ -8,6 +8,7 @@
 
 #include "support/Message.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "support/MessageTarget.h"
 
 namespace glimmet {
@@ -112,7 +113,7 @@ void InstanceServer::Deliver(QLocalSocket* socket)
     }
     Message refs(kMsgRefsReceived);
     for (const QString& path : paths)
-        refs.AddPath("refs", std::filesystem::path(path.toStdString()));
+        refs.AddPath(kFieldRefs, std::filesystem::path(path.toStdString()));
     target_->PostMessage(refs);
 }
 

@@ -11,6 +11,7 @@
 
 #include "app/QuillexWindow.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 
 namespace glimmet {
 
@@ -91,7 +92,7 @@ void Quillex::ArgvReceived(const QStringList& arguments)
 void Quillex::RefsReceived(const Message& message)
 {
     std::filesystem::path path;
-    for (int32_t index = 0; message.FindPath("refs", &path, index) == B_OK; ++index) {
+    for (int32_t index = 0; message.FindPath(kFieldRefs, &path, index) == B_OK; ++index) {
         if (QuillexWindow* requesting = openRequestingWindow_.data()) {
             LoadInto(requesting, path);
             openRequestingWindow_ = nullptr;
@@ -192,7 +193,7 @@ void Quillex::MessageReceived(const Message& message)
         break;
     case kMsgOpen: {
         QuillexWindow* window = nullptr;
-        if (message.FindPointer("window", &window) == B_OK && IsListed(window))
+        if (message.FindPointer(kFieldWindow, &window) == B_OK && IsListed(window))
             openRequestingWindow_ = window;
         ShowOpenPanel();
         break;
@@ -205,7 +206,7 @@ void Quillex::MessageReceived(const Message& message)
         break;
     case kMsgDeleteWindow: {
         QuillexWindow* window = nullptr;
-        if (message.FindPointer("window", &window) == B_OK)
+        if (message.FindPointer(kFieldWindow, &window) == B_OK)
             DeleteWindow(window);
         break;
     }
@@ -247,7 +248,7 @@ void Quillex::OpenPanelChose(const QStringList& files)
 {
     Message refs(kMsgRefsReceived);
     for (const QString& file : files)
-        refs.AddPath("refs", std::filesystem::path(file.toStdString()));
+        refs.AddPath(kFieldRefs, std::filesystem::path(file.toStdString()));
     PostMessage(refs);
 }
 
@@ -255,7 +256,7 @@ void Quillex::ToggleBubbleHelp()
 {
     bubbleHelpEnabled_ = !bubbleHelpEnabled_;
     Message mark(kMsgToggleBubbleHelp);
-    mark.AddBool("enable", bubbleHelpEnabled_);
+    mark.AddBool(kFieldEnable, bubbleHelpEnabled_);
     BroadcastMessage(mark);
 }
 

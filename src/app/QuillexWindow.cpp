@@ -31,6 +31,7 @@
 #include "sound/ChannelManager.h"
 #include "support/MessageCodes.h"
 #include "support/MessageEvent.h"
+#include "support/MessageFields.h"
 #include "views/ChannelContainerView.h"
 #include "views/ZoomSlider.h"
 
@@ -265,14 +266,14 @@ void QuillexWindow::HandleSetDisplayRange(const Message& message)
 {
     int64_t first = 0;
     int64_t last = 0;
-    if (message.FindInt64("first frame", &first) == B_OK && message.FindInt64("last frame", &last) == B_OK)
+    if (message.FindInt64(kFieldFirstFrame, &first) == B_OK && message.FindInt64(kFieldLastFrame, &last) == B_OK)
         containerView_->SetDisplayRange(first, last);
 }
 
 void QuillexWindow::HandleRangeStartChanged(const Message& message)
 {
     int64_t frame = 0;
-    if (message.FindInt64("range start", &frame) != B_OK)
+    if (message.FindInt64(kFieldRangeStart, &frame) != B_OK)
         return;
     rangeStartField_->SetText(QString::number(frame));
     UpdateZoomRangeItem();
@@ -281,7 +282,7 @@ void QuillexWindow::HandleRangeStartChanged(const Message& message)
 void QuillexWindow::HandleRangeEndChanged(const Message& message)
 {
     int64_t frame = 0;
-    if (message.FindInt64("range end", &frame) != B_OK)
+    if (message.FindInt64(kFieldRangeEnd, &frame) != B_OK)
         return;
     rangeEndField_->SetText(QString::number(frame));
     UpdateZoomRangeItem();
@@ -341,7 +342,7 @@ const CopyBuffer* QuillexWindow::SharedCopyBuffer() const
 void QuillexWindow::HandleBubbleHelpMark(const Message& message)
 {
     bool enable = false;
-    if (message.FindBool("enable", &enable) != B_OK)
+    if (message.FindBool(kFieldEnable, &enable) != B_OK)
         return;
     menus_->Item(KeptMenuItem::BubbleHelp)->setChecked(enable);
 }
@@ -350,7 +351,7 @@ void QuillexWindow::HandleOpen(const Message& message)
 {
     appendOnLoad_ = false;
     Message request(message);
-    request.AddPointer("window", this);
+    request.AddPointer(kFieldWindow, this);
     PostToApplication(request);
 }
 
@@ -358,17 +359,17 @@ void QuillexWindow::HandleAppend()
 {
     appendOnLoad_ = true;
     Message request(kMsgOpen);
-    request.AddPointer("window", this);
+    request.AddPointer(kFieldWindow, this);
     PostToApplication(request);
 }
 
 void QuillexWindow::HandleDrop(const Message& message)
 {
     std::filesystem::path first;
-    if (message.FindPath("refs", &first) != B_OK)
+    if (message.FindPath(kFieldRefs, &first) != B_OK)
         return;
     int32_t modifiers = 0;
-    if (message.FindInt32("modifiers", &modifiers) != B_OK)
+    if (message.FindInt32(kFieldModifiers, &modifiers) != B_OK)
         modifiers = int32_t(QGuiApplication::keyboardModifiers().toInt());
     appendOnLoad_ = (modifiers & Qt::ShiftModifier) != 0;
     SetTo(first);
@@ -385,11 +386,11 @@ void QuillexWindow::dropEvent(QDropEvent* event)
     Message message(kMsgSimpleData);
     for (const QUrl& url : event->mimeData()->urls()) {
         if (url.isLocalFile())
-            message.AddPath("refs", std::filesystem::path(url.toLocalFile().toStdString()));
+            message.AddPath(kFieldRefs, std::filesystem::path(url.toLocalFile().toStdString()));
     }
     // The modifiers of the drop itself, so that a Shift released right after
     // the drop still counts.
-    message.AddInt32("modifiers", int32_t(event->modifiers().toInt()));
+    message.AddInt32(kFieldModifiers, int32_t(event->modifiers().toInt()));
     event->acceptProposedAction();
     PostMessage(message);
 }
@@ -447,7 +448,7 @@ bool QuillexWindow::QuitRequested()
     if (!saving_->AgreeToClose(this))
         return false;
     Message closing(kMsgDeleteWindow);
-    closing.AddPointer("window", this);
+    closing.AddPointer(kFieldWindow, this);
     PostToApplication(closing);
     return false;
 }

@@ -12,6 +12,7 @@
 #include "files/DocumentSaver.h"
 #include "support/Message.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "support/MessageTarget.h"
 
 namespace glimmet {
@@ -74,8 +75,8 @@ void SaveFlow::PanelChose(const QString& file)
 {
     const std::filesystem::path chosen(file.toStdString());
     Message message(kMsgSavePanelChoice);
-    message.AddPath("directory", chosen.parent_path());
-    message.AddString("name", chosen.filename().string());
+    message.AddPath(kFieldDirectory, chosen.parent_path());
+    message.AddString(kFieldName, chosen.filename().string());
     target_.PostMessage(message);
 }
 
@@ -83,7 +84,7 @@ void SaveFlow::HandlePanelChoice(const Message& message)
 {
     std::filesystem::path directory;
     std::string name;
-    if (message.FindPath("directory", &directory) != B_OK || message.FindString("name", &name) != B_OK)
+    if (message.FindPath(kFieldDirectory, &directory) != B_OK || message.FindString(kFieldName, &name) != B_OK)
         return;
     std::error_code error;
     if (!std::filesystem::is_directory(directory, error))

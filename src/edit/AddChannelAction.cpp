@@ -19,8 +19,7 @@ status_t AddChannelAction::Go()
 {
     if (Manager() == nullptr || Context() == nullptr)
         return B_ERROR;
-    channel_ = new Channel();
-    Manager()->AddChannel(channel_);
+    channel_ = Manager()->AddChannel(std::make_unique<Channel>());
     return B_OK;
 }
 
@@ -38,7 +37,7 @@ status_t AddChannelAction::Redo()
         return B_ERROR;
     if (owned_ == nullptr)
         return B_OK;  // the channel never left the document
-    Manager()->AddChannel(owned_.release());
+    Manager()->AddChannel(std::move(owned_));
     return B_OK;
 }
 

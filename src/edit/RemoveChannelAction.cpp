@@ -41,7 +41,9 @@ status_t RemoveChannelAction::Undo()
     // A removal that found no focused view has nothing to put back.
     if (owned_ == nullptr)
         return B_OK;
-    Manager()->AddChannel(owned_.release(), index_);
+    // Refused (the document has fewer channels now), it stays with the
+    // action rather than being lost.
+    owned_ = Manager()->AddChannel(std::move(owned_), index_);
     return B_OK;
 }
 

@@ -145,7 +145,7 @@ bool DocumentLoader::LoadTrack(MediaTrack* track, ChannelManager* document, bool
         return false;
     for (std::unique_ptr<Channel>& channel : LoadChannels(track, decoded)) {
         if (channel != nullptr)
-            document->AddChannel(channel.release());
+            document->AddChannel(std::move(channel));
     }
     return true;
 }

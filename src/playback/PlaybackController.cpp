@@ -6,6 +6,7 @@
 #include "sound/ChannelManager.h"
 #include "support/Message.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "support/MessageTarget.h"
 
 namespace glimmet {
@@ -83,7 +84,7 @@ void PlaybackController::PlayFromCursor()
 void PlaybackController::TogglePlayback(const Message& message)
 {
     int32_t mode = 0;
-    if (message.FindInt32("mode", &mode) == B_OK) {
+    if (message.FindInt32(kFieldMode, &mode) == B_OK) {
         if (mode == 1)
             playing_ = true;
         else if (mode == 0)
@@ -112,7 +113,7 @@ void PlaybackController::Stop()
 void PlaybackController::UpdatePlaymark(const Message& message)
 {
     int64_t frame = 0;
-    if (message.FindInt64("current frame", &frame) != B_OK)
+    if (message.FindInt64(kFieldCurrentFrame, &frame) != B_OK)
         return;
     // One move at a time: the view acknowledges each with 'pmup'.
     if (!playmarkAcknowledged_)

@@ -7,6 +7,7 @@
 
 #include "support/Message.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "support/MessageTarget.h"
 
 namespace glimmet {
@@ -94,8 +95,8 @@ void PlaymarkRelay::Deliver(const Update& update)
         return;
     }
     Message message(kMsgUpdatePlaymark);
-    message.AddInt64("current frame", update.currentFrame);
-    message.AddInt64("time", update.time);
+    message.AddInt64(kFieldCurrentFrame, update.currentFrame);
+    message.AddInt64(kFieldTime, update.time);
     window_->PostMessage(message);
 }
 

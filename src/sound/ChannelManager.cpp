@@ -20,31 +20,33 @@ ChannelManager::ChannelManager(DocumentWindow* window)
 
 ChannelManager::~ChannelManager() = default;
 
-void ChannelManager::AddChannel(Channel* channel)
+Channel* ChannelManager::AddChannel(std::unique_ptr<Channel> channel)
 {
-    if (channel == nullptr)
-        return;
+    Channel* added = channel.get();
+    if (added == nullptr)
+        return nullptr;
     int32_t index;
     {
         std::lock_guard guard(lock_);
-        channels_.emplace_back(channel);
+        channels_.push_back(std::move(channel));
         index = int32_t(channels_.size()) - 1;
     }
     NotifyChannel(DocumentChange::kChannelAdded, index);
+    return added;
 }
 
-bool ChannelManager::AddChannel(Channel* channel, int32_t index)
+std::unique_ptr<Channel> ChannelManager::AddChannel(std::unique_ptr<Channel> channel, int32_t index)
 {
     if (channel == nullptr)
-        return false;
+        return channel;
     {
         std::lock_guard guard(lock_);
         if (index < 0 || size_t(index) > channels_.size())
-            return false;
-        channels_.emplace(channels_.begin() + index, channel);
+            return channel;
+        channels_.insert(channels_.begin() + index, std::move(channel));
     }
     NotifyChannel(DocumentChange::kChannelAdded, index);
-    return true;
+    return nullptr;
 }
 
 std::unique_ptr<Channel> ChannelManager::RemoveChannel(Channel* channel)
@@ -154,14 +156,14 @@ void ChannelManager::SetRangeStart(int64_t frame)
     const int64_t total = FrameCount();
     if (frame >= total) {
         rangeStart_ = total - 1;
-        PostToWindow(kMsgRangeStartChanged, "range start", total - 1);
+        PostToWindow(kMsgRangeStartChanged, kFieldRangeStart, total - 1);
     } else {
         rangeStart_ = frame;
     }
     // The end follows the argument as passed, not the clamped start.
     if (rangeStart_ > rangeEnd_) {
         rangeEnd_ = frame;
-        PostToWindow(kMsgRangeEndChanged, "range end", frame);
+        PostToWindow(kMsgRangeEndChanged, kFieldRangeEnd, frame);
     }
 }
 
@@ -170,13 +172,13 @@ void ChannelManager::SetRangeEnd(int64_t frame)
     const int64_t total = FrameCount();
     if (frame >= total) {
         rangeEnd_ = total - 1;
-        PostToWindow(kMsgRangeEndChanged, "range end", total - 1);
+        PostToWindow(kMsgRangeEndChanged, kFieldRangeEnd, total - 1);
     } else {
         rangeEnd_ = frame;
     }
     if (rangeStart_ > rangeEnd_) {
         rangeStart_ = frame;
-        PostToWindow(kMsgRangeStartChanged, "range start", frame);
+        PostToWindow(kMsgRangeStartChanged, kFieldRangeStart, frame);
     }
 }
 

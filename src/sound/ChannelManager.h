@@ -43,11 +43,13 @@ public:
     void Unlock() { lock_.Unlock(); }
     Locker& DocumentLock() { return lock_; }
 
-    /// Appends the channel; the manager owns it from now on. Null is ignored.
-    void AddChannel(Channel* channel);
-    /// Inserts the channel at index (0 to CountChannels()); the manager owns
-    /// it when this returns true. Out of range or null: false, nothing taken.
-    bool AddChannel(Channel* channel, int32_t index);
+    /// Appends the channel; the document owns it from now on. Returns it;
+    /// null for a null channel.
+    Channel* AddChannel(std::unique_ptr<Channel> channel);
+    /// Inserts the channel at index (0 to CountChannels()). Returns null when
+    /// the document took it; a null channel or an index out of range is
+    /// refused, and the channel comes back to the caller.
+    std::unique_ptr<Channel> AddChannel(std::unique_ptr<Channel> channel, int32_t index);
     /// Takes the channel out of the list without deleting it; ownership goes
     /// to the caller. Null when the channel is not in the list.
     std::unique_ptr<Channel> RemoveChannel(Channel* channel);

@@ -4,6 +4,7 @@
 
 #include "support/Handler.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "support/MessageTarget.h"
 
 namespace glimmet {
@@ -130,8 +131,8 @@ Message Observable::NotificationFor(const ObserverHandle& handle, uint32_t mask,
     Message message = handle.Template() != nullptr ? *handle.Template() : Message(kMsgObserverUpdate);
     if (data != nullptr)
         add_data_to_message(&message, data);
-    message.AddInt32("mask", int32_t(mask));
-    message.AddPointer("observable", this);
+    message.AddInt32(kFieldMask, int32_t(mask));
+    message.AddPointer(kFieldObservable, this);
     return message;
 }
 

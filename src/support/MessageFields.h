@@ -12,6 +12,9 @@ inline constexpr const char* kFieldCurrentFrame = "current frame";
 inline constexpr const char* kFieldFirstFrame = "first frame";
 inline constexpr const char* kFieldLastFrame = "last frame";
 inline constexpr const char* kFieldOffset = "offset";
+/// The zoom slider's handles, as frames ('dprs').
+inline constexpr const char* kFieldLowValue = "low value";
+inline constexpr const char* kFieldHighValue = "high value";
 
 // Objects of this process.
 inline constexpr const char* kFieldWindow = "window";
@@ -21,8 +24,21 @@ inline constexpr const char* kFieldSampleView = "sample view";
 // Controls.
 inline constexpr const char* kFieldWhen = "when";
 inline constexpr const char* kFieldSource = "source";
+inline constexpr const char* kFieldMode = "mode";
+inline constexpr const char* kFieldEnable = "enable";
+/// When a play position was reached, in microseconds of system time.
+inline constexpr const char* kFieldTime = "time";
 
-// Document notifications: the channel concerned.
+// Files.
+inline constexpr const char* kFieldRefs = "refs";
+inline constexpr const char* kFieldModifiers = "modifiers";
+inline constexpr const char* kFieldDirectory = "directory";
+inline constexpr const char* kFieldName = "name";
+
+// Notifications: the interest that matched, the notifier, and for a
+// document's notifications the channel concerned.
+inline constexpr const char* kFieldMask = "mask";
+inline constexpr const char* kFieldObservable = "observable";
 inline constexpr const char* kFieldIndex = "index";
 
 }  // namespace glimmet

@@ -150,8 +150,8 @@ void ChannelContainerView::SetDisplayRange(int64_t first, int64_t last)
         view->Update();
     if (window_ != nullptr && zoomSlider_ != nullptr) {
         Message message(kMsgDisplayRangeChanged);
-        message.AddInt64("low value", display_.First());
-        message.AddInt64("high value", display_.Last());
+        message.AddInt64(kFieldLowValue, display_.First());
+        message.AddInt64(kFieldHighValue, display_.Last());
         zoomSlider_->PostMessage(message);
     }
 }

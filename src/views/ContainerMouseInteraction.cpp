@@ -7,6 +7,7 @@
 #include "sound/ChannelManager.h"
 #include "sound/DocumentWindow.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "views/ChannelContainerView.h"
 #include "views/ChannelContextMenu.h"
 #include "views/SampleView.h"
@@ -186,10 +187,10 @@ void ContainerMouseInteraction::StopDragging()
     if (window == nullptr)
         return;
     Message start(kMsgRangeStartChanged);
-    start.AddInt64("range start", container_.RangeStart());
+    start.AddInt64(kFieldRangeStart, container_.RangeStart());
     window->PostMessage(start);
     Message end(kMsgRangeEndChanged);
-    end.AddInt64("range end", container_.RangeEnd());
+    end.AddInt64(kFieldRangeEnd, container_.RangeEnd());
     window->PostMessage(end);
 }
 
@@ -258,9 +259,9 @@ void ContainerMouseInteraction::StopMoving()
         // The window records the move as an undoable action; the offset is
         // the opposite of the distance moved.
         Message message(kMsgSampleMoved);
-        message.AddPointer("channel", channel);
-        message.AddPointer("sample view", container_.SampleViewAtIndex(movingChannel_));
-        message.AddInt64("offset", moveStartFrame_ - channel->FirstFrame());
+        message.AddPointer(kFieldChannel, channel);
+        message.AddPointer(kFieldSampleView, container_.SampleViewAtIndex(movingChannel_));
+        message.AddInt64(kFieldOffset, moveStartFrame_ - channel->FirstFrame());
         window->PostMessage(message);
     }
     movingChannel_ = -1;

@@ -9,6 +9,7 @@
 #include <QTimer>
 
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "support/SystemTime.h"
 #include "views/FrameMapping.h"
 #include "views/PixelCanvas.h"
@@ -122,10 +123,10 @@ void ZoomSlider::SendMessage()
     if (!armed_ || target_ == nullptr)
         return;
     Message message(kMsgSetDisplayRange);
-    message.AddInt64("when", system_time());
-    message.AddPointer("source", this);
-    message.AddInt64("first frame", FirstFrame());
-    message.AddInt64("last frame", LastFrame());
+    message.AddInt64(kFieldWhen, system_time());
+    message.AddPointer(kFieldSource, this);
+    message.AddInt64(kFieldFirstFrame, FirstFrame());
+    message.AddInt64(kFieldLastFrame, LastFrame());
     target_->PostMessage(message);
     armed_ = false;
 }
@@ -217,7 +218,7 @@ void ZoomSlider::MessageReceived(const Message& message)
         armed_ = true;
         int64_t low = 0;
         int64_t high = 0;
-        if (!enabled_ || message.FindInt64("low value", &low) != B_OK || message.FindInt64("high value", &high) != B_OK)
+        if (!enabled_ || message.FindInt64(kFieldLowValue, &low) != B_OK || message.FindInt64(kFieldHighValue, &high) != B_OK)
             break;
         // The display follows the slider: tell the window again when the
         // frames it applied are not the ones the handles stand for.

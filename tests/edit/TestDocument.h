@@ -71,7 +71,7 @@ public:
         }
         channel->SetStartFrameOffset(first);
         channel->SetSelected(selected);
-        manager.AddChannel(channel);
+        manager.AddChannel(std::unique_ptr<Channel>(channel));
         return channel;
     }
 

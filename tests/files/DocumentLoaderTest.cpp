@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <memory>
+
 #include "RecordingTarget.h"
 #include "SoundFixtures.h"
 #include "WavBytes.h"
@@ -21,7 +23,7 @@ protected:
     {
         auto* channel = new Channel();
         channel->SetTo(new int16_t[size_t(frames)](), frames);
-        window.manager.AddChannel(channel);
+        window.manager.AddChannel(std::unique_ptr<Channel>(channel));
         return channel;
     }
 

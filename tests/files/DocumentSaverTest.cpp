@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <memory>
+
 #include <sys/resource.h>
 #include <sys/stat.h>
 
@@ -84,7 +86,7 @@ protected:
         channel->SetTo(copy, int64_t(samples.size()));
         channel->SetPanPosition(pan);
         channel->SetMuted(muted);
-        window.manager.AddChannel(channel);
+        window.manager.AddChannel(std::unique_ptr<Channel>(channel));
         return channel;
     }
 

@@ -122,7 +122,7 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
             const int32_t index = int32_t(pick(0, manager.CountChannels() - 1));
             std::unique_ptr<Channel> channel = manager.RemoveChannel(manager.ChannelAt(index));
             window.ProcessPending();
-            ASSERT_TRUE(manager.AddChannel(channel.release(), index));
+            ASSERT_EQ(manager.AddChannel(std::move(channel), index), nullptr);
         } else if (choice == 8) {
             window.markedPlayMode = int32_t(pick(0, 2));
             window.loopChecked = pick(0, 3) != 0;

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <memory>
+
 #include <QCoreApplication>
 #include <QEventLoop>
 
@@ -201,7 +203,7 @@ void AddChannels(ChannelManager* manager, const std::vector<ChannelRecipe>& chan
         channel->SetStartFrameOffset(recipe.firstFrame);
         channel->SetPanPosition(recipe.pan);
         channel->SetMuted(recipe.muted);
-        manager->AddChannel(channel);
+        manager->AddChannel(std::unique_ptr<Channel>(channel));
     }
 }
 

@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <memory>
+
 #include <algorithm>
 #include <array>
 #include <atomic>
@@ -88,8 +90,8 @@ TEST_F(ManagerFixture, InitialState)
 
 TEST_F(ManagerFixture, FrameCountIsTheLatestEnd)
 {
-    manager.AddChannel(MakeChannel(Counting(10), 0));
-    manager.AddChannel(MakeChannel(Counting(5), 20));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(10), 0)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(5), 20)));
     EXPECT_EQ(manager.FrameCount(), 25);
 }
 
@@ -98,18 +100,21 @@ TEST_F(ManagerFixture, ChannelListOperations)
     Channel* a = MakeChannel(Counting(3));
     Channel* b = MakeChannel(Counting(3));
     Channel* c = MakeChannel(Counting(3));
-    manager.AddChannel(a);
-    manager.AddChannel(c);
-    EXPECT_TRUE(manager.AddChannel(b, 1));
+    manager.AddChannel(std::unique_ptr<Channel>(a));
+    manager.AddChannel(std::unique_ptr<Channel>(c));
+    EXPECT_EQ(manager.AddChannel(std::unique_ptr<Channel>(b), 1), nullptr);
     EXPECT_EQ(manager.ChannelAt(0), a);
     EXPECT_EQ(manager.ChannelAt(1), b);
     EXPECT_EQ(manager.ChannelAt(2), c);
     EXPECT_EQ(manager.ChannelAt(3), nullptr);
     EXPECT_EQ(manager.ChannelAt(-1), nullptr);
 
-    Channel stranger;
-    EXPECT_FALSE(manager.AddChannel(&stranger, 7));
-    EXPECT_EQ(manager.RemoveChannel(&stranger), nullptr);
+    // A channel refused is handed back, not freed.
+    auto* stranger = new Channel();
+    std::unique_ptr<Channel> refused = manager.AddChannel(std::unique_ptr<Channel>(stranger), 7);
+    EXPECT_EQ(refused.get(), stranger);
+    EXPECT_EQ(manager.CountChannels(), 3);
+    EXPECT_EQ(manager.RemoveChannel(stranger), nullptr);
     manager.AddChannel(nullptr);
     EXPECT_EQ(manager.CountChannels(), 3);
 
@@ -152,7 +157,7 @@ TEST_F(ManagerFixture, CurrentFrameIsStoredWithoutClamping)
 
 TEST_F(ManagerFixture, RangeValuesStoredAsAskedAreNotAnnounced)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetRangeEnd(500);
     manager.SetRangeStart(100);
     EXPECT_EQ(manager.RangeStart(), 100);
@@ -162,7 +167,7 @@ TEST_F(ManagerFixture, RangeValuesStoredAsAskedAreNotAnnounced)
 
 TEST_F(ManagerFixture, StartAboveTheEndPullsTheEndAlong)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetRangeStart(300);
     EXPECT_EQ(manager.RangeEnd(), 300);
     std::vector<Message> messages = window.TakeMessages();
@@ -175,7 +180,7 @@ TEST_F(ManagerFixture, StartAboveTheEndPullsTheEndAlong)
 
 TEST_F(ManagerFixture, RangeStartPastTheEndIsClampedAndEndFollowsTheArgument)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetRangeEnd(-1);
     window.TakeMessages();
     manager.SetRangeStart(1010);
@@ -194,7 +199,7 @@ TEST_F(ManagerFixture, RangeStartPastTheEndIsClampedAndEndFollowsTheArgument)
 
 TEST_F(ManagerFixture, RangeEndPastTheEndIsClampedAndStartFollowsTheArgument)
 {
-    manager.AddChannel(MakeChannel(Counting(100)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(100))));
     manager.SetRangeStart(50);
     window.TakeMessages();
     manager.SetRangeEnd(20);
@@ -216,7 +221,7 @@ TEST_F(ManagerFixture, RangeEndPastTheEndIsClampedAndStartFollowsTheArgument)
 
 TEST_F(ManagerFixture, ClearingTheRange)
 {
-    manager.AddChannel(MakeChannel(Counting(100)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(100))));
     manager.SetRangeStart(10);
     manager.SetRangeEnd(20);
     window.TakeMessages();
@@ -269,25 +274,25 @@ TEST_F(ManagerFixture, OneFrameBufferOfTheEmptyDocumentStops)
 
 TEST_F(ManagerFixture, PanPositions)
 {
-    manager.AddChannel(MakeChannel({1000, -2000}, 0, Channel::kPanLeft));
-    manager.AddChannel(MakeChannel({300, 400}, 0, Channel::kPanRight));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({1000, -2000}, 0, Channel::kPanLeft)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({300, 400}, 0, Channel::kPanRight)));
     std::vector<float> out = Mix(2);
     EXPECT_EQ(out, std::vector<float>({Level(1000), Level(300), Level(-2000), Level(400)}));
 }
 
 TEST_F(ManagerFixture, MiddleGoesToBothSidesAndMutedToNone)
 {
-    manager.AddChannel(MakeChannel({1000, -2000}, 0, Channel::kPanMiddle));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({1000, -2000}, 0, Channel::kPanMiddle)));
     Channel* muted = MakeChannel({5000, 5000}, 0, Channel::kPanMiddle);
     muted->SetMuted(true);
-    manager.AddChannel(muted);
+    manager.AddChannel(std::unique_ptr<Channel>(muted));
     std::vector<float> out = Mix(2);
     EXPECT_EQ(out, std::vector<float>({Level(1000), Level(1000), Level(-2000), Level(-2000)}));
 }
 
 TEST_F(ManagerFixture, OneFullScaleChannelIsNotBent)
 {
-    manager.AddChannel(MakeChannel({32767, 32767}));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({32767, 32767})));
     std::vector<float> out = Mix(2);
     for (float value : out)
         EXPECT_EQ(value, 32767.0f / 32768.0f);
@@ -295,8 +300,8 @@ TEST_F(ManagerFixture, OneFullScaleChannelIsNotBent)
 
 TEST_F(ManagerFixture, TwoContributorsGoThroughTheCurve)
 {
-    manager.AddChannel(MakeChannel({32767, 100}));
-    manager.AddChannel(MakeChannel({32767, 200}));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({32767, 100})));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({32767, 200})));
     std::vector<float> out = Mix(2);
     const float loud = soft_clip(32767.0f / 32768.0f + 32767.0f / 32768.0f);
     EXPECT_EQ(out[0], loud);
@@ -309,8 +314,8 @@ TEST_F(ManagerFixture, TwoContributorsGoThroughTheCurve)
 
 TEST_F(ManagerFixture, OneSideWithOneContributorTheOtherWithTwo)
 {
-    manager.AddChannel(MakeChannel({20000}, 0, Channel::kPanLeft));
-    manager.AddChannel(MakeChannel({20000}, 0, Channel::kPanMiddle));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({20000}, 0, Channel::kPanLeft)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({20000}, 0, Channel::kPanMiddle)));
     std::vector<float> out = Mix(1);
     EXPECT_EQ(out[0], soft_clip(Level(20000) + Level(20000)));
     EXPECT_EQ(out[1], Level(20000));
@@ -318,8 +323,8 @@ TEST_F(ManagerFixture, OneSideWithOneContributorTheOtherWithTwo)
 
 TEST_F(ManagerFixture, ChannelsStartingLateAreSilentBefore)
 {
-    manager.AddChannel(MakeChannel(Counting(4, 1), 2, Channel::kPanLeft));
-    manager.AddChannel(MakeChannel(Counting(6, 10), 0, Channel::kPanRight));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(4, 1), 2, Channel::kPanLeft)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(6, 10), 0, Channel::kPanRight)));
     std::vector<float> out = Mix(6);
     const std::vector<float> expected = {0, Level(10), 0, Level(11), Level(1), Level(12), Level(2), Level(13),
         Level(3), Level(14), Level(4), Level(15)};
@@ -328,7 +333,7 @@ TEST_F(ManagerFixture, ChannelsStartingLateAreSilentBefore)
 
 TEST_F(ManagerFixture, AllModeWalksTheDocumentInBuffers)
 {
-    manager.AddChannel(MakeChannel(Counting(200)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(200))));
     manager.SetLoop(false);
     Samples all = Counting(200);
     ExpectMonoFrames(Mix(64), Samples(all.begin(), all.begin() + 64));
@@ -347,7 +352,7 @@ TEST_F(ManagerFixture, AllModeWalksTheDocumentInBuffers)
 
 TEST_F(ManagerFixture, ABufferEndingExactlyAtTheEndStops)
 {
-    manager.AddChannel(MakeChannel(Counting(128)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(128))));
     manager.SetLoop(false);
     Mix(64);
     ExpectMonoFrames(Mix(64), Counting(64, 64));
@@ -357,7 +362,7 @@ TEST_F(ManagerFixture, ABufferEndingExactlyAtTheEndStops)
 
 TEST_F(ManagerFixture, RangeModeLooping)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetRangeStart(100);
     manager.SetRangeEnd(199);
     manager.SetPlayMode(ChannelManager::kPlayRange);
@@ -375,7 +380,7 @@ TEST_F(ManagerFixture, RangeModeLooping)
 
 TEST_F(ManagerFixture, RangeModeNotLooping)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetRangeStart(100);
     manager.SetRangeEnd(199);
     manager.SetPlayMode(ChannelManager::kPlayRange);
@@ -391,7 +396,7 @@ TEST_F(ManagerFixture, RangeModeNotLooping)
 
 TEST_F(ManagerFixture, RangeModeWithoutRangePlaysEverything)
 {
-    manager.AddChannel(MakeChannel(Counting(300)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(300))));
     manager.SetPlayMode(ChannelManager::kPlayRange);
     EXPECT_EQ(manager.RangeStart(), -1);
     manager.SetCurrentFrame(250);
@@ -400,7 +405,7 @@ TEST_F(ManagerFixture, RangeModeWithoutRangePlaysEverything)
 
 TEST_F(ManagerFixture, RangeShorterThanTheBuffer)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetRangeStart(10);
     manager.SetRangeEnd(20);
     manager.SetPlayMode(ChannelManager::kPlayRange);
@@ -418,7 +423,7 @@ TEST_F(ManagerFixture, RangeShorterThanTheBuffer)
 
 TEST_F(ManagerFixture, VisibleModeAsksTheWindowWhenItsLockIsFree)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetPlayMode(ChannelManager::kPlayVisible);
     window.visibleFirst = 300;
     window.visibleLast = 399;
@@ -430,7 +435,7 @@ TEST_F(ManagerFixture, VisibleModeAsksTheWindowWhenItsLockIsFree)
 
 TEST_F(ManagerFixture, VisibleModeFallsBackToTheDocumentWhenTheWindowIsBusy)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetPlayMode(ChannelManager::kPlayVisible);
     window.visibleFirst = 300;
     window.visibleLast = 399;
@@ -453,7 +458,7 @@ TEST_F(ManagerFixture, VisibleModeFallsBackToTheDocumentWhenTheWindowIsBusy)
 
 TEST_F(ManagerFixture, VisibleRangeIsClampedToTheDocument)
 {
-    manager.AddChannel(MakeChannel(Counting(100)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(100))));
     manager.SetPlayMode(ChannelManager::kPlayVisible);
     manager.SetLoop(true);
     window.visibleFirst = -50;
@@ -468,7 +473,7 @@ TEST_F(ManagerFixture, VisibleRangeIsClampedToTheDocument)
 
 TEST_F(ManagerFixture, SaveMixConvertsAndReportsShortLastBuffer)
 {
-    manager.AddChannel(MakeChannel({32767, -32768, 1, 0, 16384}, 0, Channel::kPanLeft));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({32767, -32768, 1, 0, 16384}, 0, Channel::kPanLeft)));
     int16_t out[8];
     int64_t frames = 4;
     EXPECT_TRUE(manager.FillBuffer(out, &frames));
@@ -487,7 +492,7 @@ TEST_F(ManagerFixture, SaveMixConvertsAndReportsShortLastBuffer)
 
 TEST_F(ManagerFixture, SaveMixIgnoresModeRangeAndLoop)
 {
-    manager.AddChannel(MakeChannel(Counting(50)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(50))));
     manager.SetRangeStart(10);
     manager.SetRangeEnd(20);
     manager.SetPlayMode(ChannelManager::kPlayRange);
@@ -504,7 +509,7 @@ TEST_F(ManagerFixture, SaveMixIgnoresModeRangeAndLoop)
 TEST_F(ManagerFixture, SaveMixOfManyLoudChannels)
 {
     for (int i = 0; i < 4; ++i)
-        manager.AddChannel(MakeChannel({32767, 8000}));
+        manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({32767, 8000})));
     int16_t out[4];
     int64_t frames = 2;
     EXPECT_TRUE(manager.FillBuffer(out, &frames));
@@ -517,9 +522,9 @@ TEST_F(ManagerFixture, SaveMixOfManyLoudChannels)
 
 TEST_F(ManagerFixture, RemovedChannelsAreNotMixedAndDeletedOnesFreed)
 {
-    manager.AddChannel(MakeChannel({100}));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel({100})));
     Channel* second = MakeChannel({200});
-    manager.AddChannel(second);
+    manager.AddChannel(std::unique_ptr<Channel>(second));
     std::unique_ptr<Channel> kept = manager.RemoveChannel(second);
     ExpectMonoFrames(Mix(1), {100});
 }
@@ -554,7 +559,7 @@ void EditStressDocument(ChannelManager& manager, Next& next, const Samples& bloc
         case 3:
             if (count < 8) {
                 const int64_t length = 1 + next() % 5000;
-                manager.AddChannel(MakeChannel(Counting(length), next() % 3000));
+                manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(length), next() % 3000)));
             }
             break;
         case 4:
@@ -576,8 +581,8 @@ void EditStressDocument(ChannelManager& manager, Next& next, const Samples& bloc
 
 void SetUpStressDocument(ChannelManager& manager, FakeDocumentWindow& window)
 {
-    manager.AddChannel(MakeChannel(Counting(20000)));
-    manager.AddChannel(MakeChannel(Counting(15000), 300, Channel::kPanLeft));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(20000))));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(15000), 300, Channel::kPanLeft)));
     manager.SetPlayMode(ChannelManager::kPlayVisible);
     window.visibleFirst = 0;
     window.visibleLast = 30000;
@@ -794,7 +799,7 @@ TEST_P(MixAgainstReference, RandomDocumentsMixBitForBit)
         channels.push_back(samples);
         pans.push_back(pan);
         muted.push_back(channel->IsMuted());
-        manager.AddChannel(channel);
+        manager.AddChannel(std::unique_ptr<Channel>(channel));
     }
     std::vector<float> out(size_t(frames) * 2);
     ASSERT_TRUE(manager.FillBuffer(out.data(), frames));
@@ -890,7 +895,7 @@ TEST_P(ScatteredMix, MixesBitForBit)
         Channel* channel = MakeChannel(samples, samples.empty() ? 0 : next() % 300, pan);
         channel->SetMuted(next() % 6 == 0);
         channels.push_back({channel, channel->IsMuted(), pan});
-        manager.AddChannel(channel);
+        manager.AddChannel(std::unique_ptr<Channel>(channel));
     }
     const int64_t total = manager.FrameCount();
     ASSERT_GT(total, 200);

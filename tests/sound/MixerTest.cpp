@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <memory>
+
 #include <atomic>
 #include <cmath>
 #include <set>
@@ -60,7 +62,7 @@ struct MixerFixture : ::testing::Test {
 
 TEST_F(MixerFixture, AnUnpreparedMixerRefusesEveryBufferAndChangesNothing)
 {
-    manager.AddChannel(MakeChannel(Counting(500)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(500))));
     manager.SetCurrentFrame(7);
     bool filled = true;
     bool reachedEnd = true;
@@ -72,7 +74,7 @@ TEST_F(MixerFixture, AnUnpreparedMixerRefusesEveryBufferAndChangesNothing)
 
 TEST_F(MixerFixture, APreparedMixerPlaysUpToThePreparedLengthAndRefusesLonger)
 {
-    manager.AddChannel(MakeChannel(Counting(500)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(500))));
     mixer.Prepare(64);
     EXPECT_EQ(mixer.PreparedFrames(), 64);
     bool filled = false;
@@ -92,7 +94,7 @@ TEST_F(MixerFixture, APreparedMixerPlaysUpToThePreparedLengthAndRefusesLonger)
 
 TEST_F(MixerFixture, TheEndOfARangeIsReportedToTheCallerNotPostedToTheWindow)
 {
-    manager.AddChannel(MakeChannel(Counting(1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(1000))));
     manager.SetRangeStart(100);
     manager.SetRangeEnd(199);
     manager.SetPlayMode(ChannelManager::kPlayRange);
@@ -116,7 +118,7 @@ TEST_F(MixerFixture, TheEndOfARangeIsReportedToTheCallerNotPostedToTheWindow)
 
 TEST_F(MixerFixture, APreparedSaveMixProducesWhatFitsAndSaysHowMuch)
 {
-    manager.AddChannel(MakeChannel(Counting(250, 1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Counting(250, 1000))));
     mixer.Prepare(100);
     std::vector<int16_t> out(500, 7);
     int64_t frames = 250;
@@ -139,7 +141,7 @@ TEST_F(MixerFixture, APreparedSaveMixProducesWhatFitsAndSaysHowMuch)
 TEST_F(MixerFixture, ChannelsAddedAfterPreparingNeedNoMoreScratch)
 {
     mixer.Prepare(32);
-    manager.AddChannel(MakeChannel(Samples(100, 1000)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Samples(100, 1000))));
     bool filled = false;
     bool reachedEnd = false;
     std::vector<float> out = Mix(32, &filled, &reachedEnd);
@@ -147,7 +149,7 @@ TEST_F(MixerFixture, ChannelsAddedAfterPreparingNeedNoMoreScratch)
     EXPECT_EQ(out[62], Level(1000));
 
     for (int c = 1; c < 600; c++)
-        manager.AddChannel(MakeChannel(Samples(100, 1), Channel::kPanLeft));
+        manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Samples(100, 1), Channel::kPanLeft)));
     out = Mix(32, &filled, &reachedEnd);
     ASSERT_TRUE(filled);
     EXPECT_EQ(mixer.PreparedFrames(), 32);
@@ -170,7 +172,7 @@ TEST(MixerStress, PreparingAndAddingChannelsWhilePlaying)
     constexpr int kMostChannels = 24;
     FakeDocumentWindow window;
     ChannelManager manager(&window);
-    manager.AddChannel(MakeChannel(Samples(50000, kValue)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Samples(50000, kValue))));
     Mixer mixer(&manager);
     mixer.Prepare(256);
 
@@ -200,7 +202,7 @@ TEST(MixerStress, PreparingAndAddingChannelsWhilePlaying)
     });
     for (int count = 2; count <= kMostChannels; count++) {
         mixer.Prepare(count % 2 == 0 ? 512 : 256);
-        manager.AddChannel(MakeChannel(Samples(50000, kValue)));
+        manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Samples(50000, kValue))));
         std::this_thread::sleep_for(std::chrono::milliseconds(2));
     }
     // Let the player see the last document too.

@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <memory>
+
 #include <cmath>
 
 #include <QFontMetricsF>
@@ -32,7 +34,7 @@ QRgb Pixel(const QImage& image, int x, int y)
 TEST(ChannelContainerView, StartsWithTheWholeDocumentAndNoPlaymark)
 {
     ViewFixture fixture(400, 200);
-    fixture.manager.AddChannel(MakeChannel(Ramp(5000)));
+    fixture.manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Ramp(5000))));
     ChannelContainerView container(&fixture.manager, nullptr, &fixture.window);
     EXPECT_EQ(container.objectName(), "sample view");
     EXPECT_EQ(container.FirstDisplayedFrame(), 0);
@@ -415,10 +417,10 @@ TEST(ChannelContainerView, FollowsTheChannelsOfTheDocument)
     Channel* a = MakeChannel(Ramp(100));
     Channel* b = MakeChannel(Ramp(100));
     Channel* c = MakeChannel(Ramp(100));
-    fixture.manager.AddChannel(a);
+    fixture.manager.AddChannel(std::unique_ptr<Channel>(a));
     SampleView* first = fixture.View(0);
-    fixture.manager.AddChannel(c);
-    ASSERT_TRUE(fixture.manager.AddChannel(b, 1));
+    fixture.manager.AddChannel(std::unique_ptr<Channel>(c));
+    ASSERT_EQ(fixture.manager.AddChannel(std::unique_ptr<Channel>(b), 1), nullptr);
     ASSERT_EQ(fixture.container->CountChannelViews(), 3);
     EXPECT_EQ(fixture.View(0), first);
     EXPECT_EQ(fixture.View(0)->GetChannel(), a);
@@ -446,8 +448,8 @@ TEST(ChannelContainerView, MakesViewsForChannelsItFindsAndRedrawsChangedOnes)
 {
     RecordingWindow window;
     ChannelManager manager(&window);
-    manager.AddChannel(MakeChannel(Ramp(100)));
-    manager.AddChannel(MakeChannel(Ramp(100)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Ramp(100))));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(Ramp(100))));
     ChannelContainerView container(&manager, new ZoomSlider(&window, 0, 0, 0), &window);
     ASSERT_EQ(container.CountChannelViews(), 2);
     EXPECT_EQ(container.SampleViewAtIndex(1)->GetChannel(), manager.ChannelAt(1));
@@ -558,7 +560,7 @@ TEST(ZoomSliderAndWindow, HandleDragsSetTheDisplayAndSettle)
     ChannelContainerView container(&manager, slider, &window);
     window.container = &container;
     container.resize(500, 150);
-    manager.AddChannel(MakeChannel(std::vector<int16_t>(100000, 0)));
+    manager.AddChannel(std::unique_ptr<Channel>(MakeChannel(std::vector<int16_t>(100000, 0))));
     container.show();
     ASSERT_TRUE(QTest::qWaitForWindowExposed(&container));
     DeliverPosted();

@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <memory>
+
 #include <cmath>
 
 #include "ViewFixture.h"
@@ -198,7 +200,7 @@ TEST(SampleViewRender, RowTableMapsExtremesToFirstAndLastRow)
     for (int height : {16, 17, 50, 100, 199, 200, 257, 600}) {
         ViewFixture fixture(60, 100);
         Channel* channel = MakeChannel(std::vector<int16_t>(100, 0));
-        fixture.manager.AddChannel(channel);
+        fixture.manager.AddChannel(std::unique_ptr<Channel>(channel));
         auto view = std::make_unique<SampleView>(channel, fixture.container.get());
         view->Layout({0, 0, 59, float(height - 1)});
         ASSERT_EQ(view->height(), height);

@@ -39,7 +39,7 @@ public:
     /// Adds the channel to the document; the container makes its view.
     SampleView* Add(Channel* channel)
     {
-        manager.AddChannel(channel);
+        manager.AddChannel(std::unique_ptr<Channel>(channel));
         SampleView* view = container->SampleViewAtIndex(manager.IndexOf(channel));
         view->SetClock(&ManualClock::Now);
         return view;
