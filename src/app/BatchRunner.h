@@ -4,13 +4,11 @@
 
 #include <cstdint>
 #include <cstdio>
-#include <functional>
 #include <istream>
-#include <map>
 #include <string>
-#include <vector>
 
 #include "app/QuillexWindow.h"
+#include "app/ScriptCommandTable.h"
 
 namespace glimmet {
 
@@ -27,12 +25,13 @@ class Quillex;
 /// still goes to standard output, and so does `print`.
 ///
 /// Commands live in a table keyed by name, so later features (the effect
-/// dialogs) add their own with AddCommand.
+/// dialogs) add their own with AddCommand. The built-in ones come in groups
+/// by what they act on (the *ScriptCommands classes).
 class BatchRunner {
 public:
-    using Arguments = std::vector<std::string>;
+    using Arguments = ScriptCommandTable::Arguments;
     /// Runs one command; returns false with a reason for a bad argument.
-    using Command = std::function<bool(const Arguments& arguments, std::string* reason)>;
+    using Command = ScriptCommandTable::Command;
 
     static constexpr int kSucceeded = 0;
     static constexpr int kFailed = 2;
@@ -69,32 +68,13 @@ public:
     static int Main(int argc, char** argv);
 
 private:
-    struct Entry {
-        int minimum;
-        int maximum;
-        Command run;
-    };
-
-    void AddDocumentCommands();
-    void AddSelectionCommands();
-    void AddChannelCommands();
-    void AddPlaybackCommands();
-    void AddFileCommands();
-    void AddOutputCommands();
-
     bool RunMessageCode(const std::string& code, const Arguments& arguments, std::string* reason);
     bool RequireWindow(std::string* reason) const;
-    bool ChannelIndex(const std::string& text, int32_t* index, std::string* reason) const;
-    void TypeIntoField(class TextControl* control, const std::string& text);
-    bool TriggerChannelMenuItem(int32_t index, const QString& label);
-    bool OpenThroughPanel(const std::string& path, std::string* reason);
-    bool SaveThroughPanel(const std::string& path, std::string* reason);
 
-    Quillex& application_;
     QPointer<QuillexWindow> window_;
     std::FILE* output_;
     std::FILE* errors_;
-    std::map<std::string, Entry> commands_;
+    ScriptCommandTable commands_;
     /// What the "Save changes?" question answers in a script.
     int saveAnswer_ = QuillexWindow::kDontQuit;
 };

@@ -2,11 +2,10 @@
 
 #include <algorithm>
 #include <cinttypes>
-#include <cmath>
 #include <cstdio>
-#include <cstring>
 #include <vector>
 
+#include "playback/BufferPlan.h"
 #include "playback/DeviceTimeSource.h"
 #include "sound/ChannelManager.h"
 #include "support/SystemTime.h"
@@ -19,42 +18,11 @@ namespace {
 // part of the lead time that a start is given.
 constexpr int64_t kSchedulingLatencyMicros = 1000;
 
-// A consumer may suggest any buffer size and a device any latency; beyond
-// these a connection is refused buffers rather than allowed to allocate
-// without bound.
-constexpr uint32_t kLargestBufferSize = 16u << 20;
-constexpr int64_t kMostBuffers = 64;
-
-int64_t MicrosOfFrames(int64_t frames, float frameRate)
-{
-    if (!(frameRate > 0))
-        return 0;
-    // The frame count is taken as unsigned for the conversion.
-    return std::llround(double(uint64_t(frames)) / double(frameRate) * 1000000.0);
-}
-
-void CopyName(char* to, const char* from)
-{
-    if (to == nullptr || to == from)
-        return;
-    std::strncpy(to, from, kMediaNameLength - 1);
-    to[kMediaNameLength - 1] = '\0';
-}
-
 }  // namespace
 
 AudioProducer::AudioProducer(ChannelManager* manager, MessageTarget* looper)
     : manager_(manager), mixer_(manager), relay_(looper)
 {
-    preferredFormat_.type = B_MEDIA_RAW_AUDIO;
-    preferredFormat_.frameRate = 44100;
-    preferredFormat_.channelCount = 2;
-    preferredFormat_.sampleFormat = B_AUDIO_FLOAT;
-    preferredFormat_.byteOrder = B_MEDIA_LITTLE_ENDIAN;
-    preferredFormat_.bufferSize = kWildcardBufferSize;
-
-    output_.destination = MediaDestination::Null();
-    output_.format = preferredFormat_;
 }
 
 AudioProducer::~AudioProducer()
@@ -75,9 +43,7 @@ void AudioProducer::NodeRegistered(int32_t nodeId)
     nodeId_ = nodeId;
     priority_ = kRealTimePriority;
     loopRunning_ = true;
-    output_.source = MediaSource{nodeId, 0};
-    output_.node = nodeId;
-    CopyName(output_.name, kOutputName);
+    negotiator_.Register(nodeId, kOutputName);
 }
 
 void AudioProducer::SetRunMode(int32_t mode)
@@ -104,56 +70,28 @@ int64_t AudioProducer::SchedulingLatency() const
 
 status_t AudioProducer::FormatSuggestionRequested(int32_t type, int32_t, MediaFormat* format)
 {
-    if (format == nullptr) {
-        std::printf("\tERROR - NULL format pointer passed in!\n");
-        return B_BAD_VALUE;
-    }
-    *format = preferredFormat_;
-    if (type == B_MEDIA_UNKNOWN_TYPE)
-        type = B_MEDIA_RAW_AUDIO;
-    return type == B_MEDIA_RAW_AUDIO ? B_OK : B_MEDIA_BAD_FORMAT;
+    return negotiator_.SuggestFormat(type, format);
 }
 
 status_t AudioProducer::FormatProposal(const MediaSource& output, MediaFormat* format)
 {
-    if (!IsOurSource(output)) {
-        std::printf("AudioProducer::FormatProposal returning B_MEDIA_BAD_SOURCE\n");
-        return B_MEDIA_BAD_SOURCE;
-    }
-    if (format == nullptr)
-        return B_BAD_VALUE;
-    const int32_t proposed = format->type;
-    *format = preferredFormat_;
-    if (proposed == B_MEDIA_UNKNOWN_TYPE || proposed == B_MEDIA_RAW_AUDIO)
-        return B_OK;
-    std::printf("AudioProducer::FormatProposal returning B_MEDIA_BAD_FORMAT\n");
-    return B_MEDIA_BAD_FORMAT;
+    return negotiator_.ProposeFormat(output, format);
 }
 
 status_t AudioProducer::FormatChangeRequested(const MediaSource& source, const MediaDestination& destination,
     MediaFormat* format, int32_t*)
 {
-    if (!(destination == output_.destination))
-        return B_MEDIA_BAD_DESTINATION;
-    if (!IsOurSource(source))
-        return B_MEDIA_BAD_SOURCE;
-    if (format == nullptr)
-        return B_BAD_VALUE;
-    output_.format = *format;
-    PrepareMixer(output_.format);
-    AllocateBuffers(output_.format);
+    const status_t status = negotiator_.ChangeFormat(source, destination, format);
+    if (status != B_OK)
+        return status;
+    PrepareMixer(Output().format);
+    AllocateBuffers(Output().format);
     return B_OK;
 }
 
 status_t AudioProducer::GetNextOutput(int32_t* cookie, MediaOutput* output)
 {
-    if (cookie == nullptr || output == nullptr)
-        return B_BAD_VALUE;
-    if (*cookie != 0)
-        return B_BAD_INDEX;
-    *output = output_;
-    ++*cookie;
-    return B_OK;
+    return negotiator_.GetNextOutput(cookie, output);
 }
 
 status_t AudioProducer::DisposeOutputCookie(int32_t)
@@ -168,7 +106,7 @@ status_t AudioProducer::SetBufferGroup(const MediaSource& forSource, std::unique
     if (group.get() != bufferGroup_.get()) {
         bufferGroup_.reset();
         if (group == nullptr)
-            AllocateBuffers(output_.format, false);
+            AllocateBuffers(Output().format, false);
         else
             bufferGroup_ = std::move(group);
     }
@@ -178,62 +116,25 @@ status_t AudioProducer::SetBufferGroup(const MediaSource& forSource, std::unique
 status_t AudioProducer::PrepareToConnect(const MediaSource& what, const MediaDestination& where,
     MediaFormat* format, MediaSource* source, char* name)
 {
-    if (!IsOurSource(what))
-        return B_MEDIA_BAD_SOURCE;
-    if (IsConnected())
-        return B_MEDIA_ALREADY_CONNECTED;
-    if (format == nullptr)
-        return B_BAD_VALUE;
-    if (format->type != B_MEDIA_RAW_AUDIO) {
-        std::printf("\tnon-raw-audio format?!\n");
-        return B_MEDIA_BAD_FORMAT;
-    }
-    if (format->sampleFormat != B_AUDIO_FLOAT) {
-        std::printf("\tnon-float-audio format?!\n");
-        return B_MEDIA_BAD_FORMAT;
-    }
-    if (format->bufferSize == kWildcardBufferSize) {
-        format->bufferSize = kDefaultBufferSize;
-        std::printf("\tno buffer size provided, suggesting %lu\n", (unsigned long)format->bufferSize);
-    } else {
-        std::printf("\tconsumer suggested buffer_size %lu\n", (unsigned long)format->bufferSize);
-    }
-    output_.destination = where;
-    output_.format = *format;
-    if (source != nullptr)
-        *source = output_.source;
-    CopyName(name, output_.name);
-    return B_OK;
-}
-
-int64_t AudioProducer::MixFramesPerBuffer(uint32_t bufferSize, uint32_t channelCount) const
-{
-    // The mixer always writes stereo; the count of frames follows the
-    // format's channel count as the connection states it.
-    if (channelCount == 0)
-        return 0;
-    return int64_t(bufferSize / 4) / int64_t(channelCount);
+    return negotiator_.PrepareToConnect(what, where, format, source, name);
 }
 
 void AudioProducer::Connect(status_t error, const MediaSource&, const MediaDestination& destination,
     const MediaFormat& format, char* name, int64_t downstreamLatency)
 {
     if (error != B_OK) {
-        output_.destination = MediaDestination::Null();
-        output_.format = preferredFormat_;
+        negotiator_.Reset();
         return;
     }
-    output_.destination = destination;
-    output_.format = format;
-    CopyName(name, output_.name);
+    negotiator_.Connected(destination, format, name);
     downstreamLatency_.store(downstreamLatency, std::memory_order_relaxed);
 
     // The trial mix is a real one: it moves the document's play position on
     // by one buffer, which the window resets before playing anyway. It runs
     // on the prepared mixer, so it measures what playback will cost.
     PrepareMixer(format);
-    const uint32_t bufferSize = std::min(format.bufferSize, kLargestBufferSize);
-    const int64_t frames = MixFramesPerBuffer(bufferSize, format.channelCount);
+    const uint32_t bufferSize = std::min(format.bufferSize, BufferPlan::kLargestBufferSize);
+    const int64_t frames = BufferPlan::MixFramesPerBuffer(bufferSize, format.channelCount);
     std::vector<float> trial(std::max<size_t>(bufferSize / 4, size_t(frames) * 2));
     const int64_t before = system_time();
     Mix(trial.data(), frames);
@@ -242,18 +143,14 @@ void AudioProducer::Connect(status_t error, const MediaSource&, const MediaDesti
     std::printf("\tbuffer-filling took %" PRId64 " usec on this machine\n", internal);
 
     SetEventLatency(downstreamLatency + internal);
-    const int64_t samplesPerSecond = std::llround(double(format.channelCount) * double(format.frameRate));
-    SetBufferDuration(samplesPerSecond > 0 ? int64_t(format.bufferSize / 4) * 1000000 / samplesPerSecond : 0);
+    SetBufferDuration(BufferPlan::BufferDuration(format));
     if (bufferGroup_ == nullptr)
-        AllocateBuffers(output_.format);
+        AllocateBuffers(Output().format);
 }
 
 void AudioProducer::PrepareMixer(const MediaFormat& format)
 {
-    // Buffers beyond the largest size get no buffers at all (see
-    // AllocateBuffers), so the mixer need not hold them either.
-    const uint32_t bufferSize = std::min(format.bufferSize, kLargestBufferSize);
-    mixer_.Prepare(MixFramesPerBuffer(bufferSize, format.channelCount));
+    mixer_.Prepare(BufferPlan::MixerFrames(format));
 }
 
 bool AudioProducer::Mix(float* out, int64_t frames)
@@ -272,31 +169,16 @@ bool AudioProducer::Mix(float* out, int64_t frames)
 void AudioProducer::AllocateBuffers(const MediaFormat& format, bool requirePositiveDuration)
 {
     bufferGroup_.reset();
-    const int64_t duration = BufferDuration();
-    int64_t count = 0;
-    if (duration > 0)
-        count = DownstreamLatency() / duration + 2;
-    else if (!requirePositiveDuration)
-        count = 2;  // no duration to divide by yet: the two buffers any group has
-    count = std::clamp<int64_t>(count, 0, kMostBuffers);
-    if (format.bufferSize > kLargestBufferSize)
-        count = 0;
-    const int64_t frames = MixFramesPerBuffer(format.bufferSize, format.channelCount);
-    const size_t floats = format.bufferSize / 4;
-    const size_t spare = size_t(frames) * 2 > floats ? size_t(frames) * 2 - floats : 0;
-    bufferGroup_ = std::make_unique<BufferGroup>(format.bufferSize, int32_t(count), spare);
+    const int64_t count =
+        BufferPlan::BufferCount(format, BufferDuration(), DownstreamLatency(), requirePositiveDuration);
+    bufferGroup_ =
+        std::make_unique<BufferGroup>(format.bufferSize, int32_t(count), BufferPlan::SpareFloats(format));
 }
 
 void AudioProducer::Disconnect(const MediaSource& what, const MediaDestination& where)
 {
-    if (IsOurSource(what) && where == output_.destination) {
-        output_.destination = MediaDestination::Null();
-        output_.format = preferredFormat_;
+    if (negotiator_.Disconnect(what, where))
         bufferGroup_.reset();
-        return;
-    }
-    std::printf("\tDisconnect() called with wrong source/destination (%ld/%ld), ours is (%ld/%ld)\n",
-        long(what.id), long(where.id), long(output_.source.id), long(output_.destination.id));
 }
 
 void AudioProducer::LateNoticeReceived(const MediaSource& what, int64_t howMuch, int64_t)
@@ -313,7 +195,7 @@ void AudioProducer::LateNoticeReceived(const MediaSource& what, int64_t howMuch,
         std::printf("\tincreasing latency to %" PRId64 "\n", total);
     } else {
         // The buffer's sample count (both channels), not its frame count.
-        framesSent_.fetch_add(int64_t(output_.format.bufferSize / 4), std::memory_order_relaxed);
+        framesSent_.fetch_add(int64_t(Output().format.bufferSize / 4), std::memory_order_relaxed);
         std::printf("\tskipping a buffer to try to catch up\n");
     }
 }
@@ -327,7 +209,7 @@ void AudioProducer::EnableOutput(const MediaSource& what, bool enabled, int32_t*
 void AudioProducer::LatencyChanged(const MediaSource& source, const MediaDestination& destination,
     int64_t newLatency, uint32_t)
 {
-    if (!IsOurSource(source) || !(destination == output_.destination))
+    if (!IsOurSource(source) || !(destination == Output().destination))
         return;
     downstreamLatency_.store(newLatency, std::memory_order_relaxed);
     SetEventLatency(newLatency + InternalLatency());
@@ -347,37 +229,19 @@ status_t AudioProducer::SetPlayRate(int32_t, int32_t)
 
 // Event loop ----------------------------------------------------------------
 
-bool AudioProducer::PushEvent(const MediaEvent& event)
-{
-    const size_t head = eventHead_.load(std::memory_order_relaxed);
-    if (head - eventTail_.load(std::memory_order_acquire) >= kEventQueueSize)
-        return false;
-    events_[head % kEventQueueSize] = event;
-    eventHead_.store(head + 1, std::memory_order_release);
-    return true;
-}
-
 status_t AudioProducer::Start(int64_t performanceTime)
 {
-    return PushEvent(MediaEvent{B_START, performanceTime}) ? B_OK : B_ERROR;
+    return events_.Push(MediaEvent{B_START, performanceTime}) ? B_OK : B_ERROR;
 }
 
 status_t AudioProducer::Stop(int64_t performanceTime, bool immediate)
 {
-    return PushEvent(MediaEvent{B_STOP, immediate ? INT64_MIN : performanceTime}) ? B_OK : B_ERROR;
+    return events_.Push(MediaEvent{B_STOP, immediate ? INT64_MIN : performanceTime}) ? B_OK : B_ERROR;
 }
 
 void AudioProducer::RunDueEvents(int64_t periodEnd)
 {
-    size_t tail = eventTail_.load(std::memory_order_relaxed);
-    const size_t head = eventHead_.load(std::memory_order_acquire);
-    // In the order they were queued; a future event holds back those behind it.
-    while (tail != head && events_[tail % kEventQueueSize].eventTime < periodEnd) {
-        const MediaEvent event = events_[tail % kEventQueueSize];
-        ++tail;
-        eventTail_.store(tail, std::memory_order_release);
-        HandleEvent(event, 0, true);
-    }
+    events_.RunDue(periodEnd, [this](const MediaEvent& event) { HandleEvent(event, 0, true); });
 }
 
 void AudioProducer::HandleEvent(const MediaEvent& event, int64_t, bool)
@@ -417,7 +281,7 @@ void AudioProducer::HandleStop()
 
 int64_t AudioProducer::TimeOfFramesSent(int64_t frames) const
 {
-    return StartTime() + MicrosOfFrames(frames, output_.format.frameRate);
+    return StartTime() + BufferPlan::MicrosOfFrames(frames, Output().format.frameRate);
 }
 
 void AudioProducer::QueueNextBuffer()
@@ -433,24 +297,25 @@ void AudioProducer::HandleBuffer(const MediaEvent& event)
         return;
     BufferGroup::Buffer* buffer = FillNextBuffer(event.eventTime);
     if (buffer != nullptr) {
-        if (!IsOutputEnabled() || SendBuffer(buffer, output_.destination) != B_OK)
+        if (!IsOutputEnabled() || SendBuffer(buffer, Output().destination) != B_OK)
             bufferGroup_->Recycle(buffer);
     }
-    const uint32_t channels = std::max<uint32_t>(output_.format.channelCount, 1);
-    framesSent_.fetch_add(int64_t(output_.format.bufferSize / (channels * 4)), std::memory_order_relaxed);
+    const MediaFormat& format = Output().format;
+    const uint32_t channels = std::max<uint32_t>(format.channelCount, 1);
+    framesSent_.fetch_add(int64_t(format.bufferSize / (channels * 4)), std::memory_order_relaxed);
     QueueNextBuffer();
 }
 
 BufferGroup::Buffer* AudioProducer::FillNextBuffer(int64_t eventTime)
 {
-    const uint32_t bufferSize = output_.format.bufferSize;
+    const uint32_t bufferSize = Output().format.bufferSize;
     BufferGroup::Buffer* buffer = bufferGroup_ ? bufferGroup_->RequestBuffer(bufferSize) : nullptr;
     if (buffer == nullptr) {
         std::printf("no buffer!\n");
         return nullptr;
     }
     const size_t floats = bufferSize / 4;
-    const int64_t frames = MixFramesPerBuffer(bufferSize, output_.format.channelCount);
+    const int64_t frames = BufferPlan::MixFramesPerBuffer(bufferSize, Output().format.channelCount);
     if (!Mix(buffer->data.data(), frames))
         std::fill_n(buffer->data.begin(), floats, 0.0f);
     buffer->sizeUsed = floats * 4;
@@ -494,22 +359,17 @@ void AudioProducer::ServeDevice(float* out, int32_t frames, int64_t deviceFrame)
     deviceFrames_ = frames;
     currentDeviceFrame_ = deviceFrame;
 
-    const float rate = output_.format.frameRate;
-    const int64_t periodStart = MicrosOfFrames(deviceFrame, rate);
-    RunDueEvents(MicrosOfFrames(deviceFrame + frames, rate));
+    const float rate = Output().format.frameRate;
+    const int64_t periodStart = BufferPlan::MicrosOfFrames(deviceFrame, rate);
+    RunDueEvents(BufferPlan::MicrosOfFrames(deviceFrame + frames, rate));
     ServeDueBuffer(frames, deviceFrame);
     deviceOut_ = nullptr;
 
     // A period served more slowly than it plays leaves the device behind.
     const int64_t took = system_time() - began;
-    periodsServed_.fetch_add(1, std::memory_order_relaxed);
-    if (took > longestPeriod_.load(std::memory_order_relaxed))
-        longestPeriod_.store(took, std::memory_order_relaxed);
     const int64_t duration = BufferDuration();
-    if (duration > 0 && took > duration) {
-        latePeriods_.fetch_add(1, std::memory_order_relaxed);
-        LateNoticeReceived(output_.source, took - duration, periodStart);
-    }
+    if (periods_.Record(took, duration))
+        LateNoticeReceived(Output().source, took - duration, periodStart);
 }
 
 }  // namespace glimmet

@@ -1,13 +1,15 @@
 #pragma once
 
-#include <array>
 #include <atomic>
 #include <cstdint>
 #include <memory>
 
 #include "playback/BufferGroup.h"
 #include "playback/MediaKit.h"
+#include "playback/OutputNegotiator.h"
+#include "playback/PeriodStatistics.h"
 #include "playback/PlaymarkRelay.h"
+#include "playback/ProducerEventQueue.h"
 #include "sound/Mixer.h"
 #include "support/Status.h"
 
@@ -30,6 +32,11 @@ class MessageTarget;
 /// either thread may set. Everything the audio thread touches per buffer is
 /// allocated at connection, the mixer's scratch included; both messages go
 /// through the relay, never through Qt's queue from the audio thread.
+///
+/// The negotiation of the output's format is the OutputNegotiator's, the
+/// buffer arithmetic the BufferPlan's, the event ring the
+/// ProducerEventQueue's and the period accounting the PeriodStatistics';
+/// the producer ties them to the mixer, the buffers and the device.
 class AudioProducer {
 public:
     static constexpr const char* kNodeName = "Glimmet";
@@ -37,7 +44,7 @@ public:
     static constexpr int32_t kRealTimePriority = 120;
     /// The buffer size given to a consumer that leaves it open: 256 stereo
     /// float frames.
-    static constexpr uint32_t kDefaultBufferSize = 2048;
+    static constexpr uint32_t kDefaultBufferSize = OutputNegotiator::kDefaultBufferSize;
 
     AudioProducer(ChannelManager* manager, MessageTarget* looper);
     ~AudioProducer();
@@ -82,7 +89,7 @@ public:
 
     // Format negotiation --------------------------------------------------
 
-    const MediaFormat& PreferredFormat() const { return preferredFormat_; }
+    const MediaFormat& PreferredFormat() const { return negotiator_.PreferredFormat(); }
     status_t FormatSuggestionRequested(int32_t type, int32_t quality, MediaFormat* format);
     status_t FormatProposal(const MediaSource& output, MediaFormat* format);
     status_t FormatChangeRequested(const MediaSource& source, const MediaDestination& destination,
@@ -106,7 +113,7 @@ public:
     status_t HandleMessage(int32_t message, const void* data, size_t size);
     status_t SetPlayRate(int32_t numerator, int32_t denominator);
 
-    const MediaOutput& Output() const { return output_; }
+    const MediaOutput& Output() const { return negotiator_.Output(); }
     bool IsOutputEnabled() const { return outputEnabled_.load(std::memory_order_relaxed); }
     const BufferGroup* Buffers() const { return bufferGroup_.get(); }
 
@@ -133,24 +140,21 @@ public:
     /// Performance time stamped on the latest buffer produced.
     int64_t LastBufferStartTime() const { return lastBufferStart_.load(std::memory_order_relaxed); }
     /// Device periods whose service took longer than a buffer lasts.
-    int64_t LatePeriods() const { return latePeriods_.load(std::memory_order_relaxed); }
+    int64_t LatePeriods() const { return periods_.LatePeriods(); }
     /// Device periods served, and the longest time one took (microseconds).
-    int64_t PeriodsServed() const { return periodsServed_.load(std::memory_order_relaxed); }
-    int64_t LongestPeriodMicros() const { return longestPeriod_.load(std::memory_order_relaxed); }
+    int64_t PeriodsServed() const { return periods_.PeriodsServed(); }
+    int64_t LongestPeriodMicros() const { return periods_.LongestPeriodMicros(); }
     PlaymarkRelay& Relay() { return relay_; }
 
 private:
-    static constexpr size_t kEventQueueSize = 32;
-
-    bool IsOurSource(const MediaSource& source) const { return source == output_.source; }
-    bool IsConnected() const { return !(output_.destination == MediaDestination::Null()); }
+    bool IsOurSource(const MediaSource& source) const { return negotiator_.IsOurSource(source); }
+    bool IsConnected() const { return negotiator_.IsConnected(); }
     void AllocateBuffers(const MediaFormat& format, bool requirePositiveDuration = true);
     /// Sizes the mixer for the buffers of the format (window thread).
     void PrepareMixer(const MediaFormat& format);
     /// One buffer of frames from the document; false when the mixer gave
     /// none. Relays the stop at the end of a range that does not loop.
     bool Mix(float* out, int64_t frames);
-    int64_t MixFramesPerBuffer(uint32_t bufferSize, uint32_t channelCount) const;
     int64_t TimeOfFramesSent(int64_t frames) const;
     void QueueNextBuffer();
     void HandleStart(const MediaEvent& event);
@@ -158,14 +162,12 @@ private:
     void HandleBuffer(const MediaEvent& event);
     BufferGroup::Buffer* FillNextBuffer(int64_t eventTime);
     status_t SendBuffer(BufferGroup::Buffer* buffer, const MediaDestination& destination);
-    bool PushEvent(const MediaEvent& event);
     void RunDueEvents(int64_t periodEnd);
     void ServeDueBuffer(int32_t frames, int64_t deviceFrame);
 
     // Window thread while no device serves the producer.
     std::unique_ptr<BufferGroup> bufferGroup_;
-    MediaOutput output_;
-    MediaFormat preferredFormat_;
+    OutputNegotiator negotiator_;
     ChannelManager* manager_;  // not owned
     Mixer mixer_;              // sized at connection; the audio thread's own
     PlaymarkRelay relay_;      // carries 'udpm' and 'stop' to the looper (the window)
@@ -186,18 +188,14 @@ private:
 
     // Events: written by the window thread (head), read by the audio thread
     // (tail).
-    std::array<MediaEvent, kEventQueueSize> events_{};
-    std::atomic<size_t> eventHead_{0};
-    std::atomic<size_t> eventTail_{0};
+    ProducerEventQueue events_;
 
     // Audio thread (atomics only so that other threads may look).
     std::atomic<bool> started_{false};
     std::atomic<int64_t> framesSent_{0};
     std::atomic<int64_t> startTime_{0};
     std::atomic<int64_t> lastBufferStart_{0};
-    std::atomic<int64_t> latePeriods_{0};
-    std::atomic<int64_t> periodsServed_{0};
-    std::atomic<int64_t> longestPeriod_{0};
+    PeriodStatistics periods_;
     bool bufferPending_ = false;      // a B_HANDLE_BUFFER event is queued
     int64_t pendingBufferTime_ = 0;   // its performance time
     int64_t pendingBufferFrame_ = 0;  // frames sent when it was queued
