@@ -8,6 +8,7 @@
 #include "app/Quillex.h"
 #include "app/ScriptArguments.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 
 namespace glimmet {
 
@@ -23,8 +24,8 @@ void FileScriptCommands::AddTo(BatchRunner& runner, Quillex& application)
         if (!Quillex::ResolvePath(arguments[0], &path))
             return ScriptArguments::Fail(reason, "no such file: " + arguments[0]);
         Message drop(kMsgSimpleData);
-        drop.AddPath("refs", path);
-        drop.AddInt32("modifiers", int32_t(Qt::ShiftModifier));
+        drop.AddPath(kFieldRefs, path);
+        drop.AddInt32(kFieldModifiers, int32_t(Qt::ShiftModifier));
         runner.Window()->PostMessage(drop);
         return true;
     });
