@@ -3,12 +3,12 @@
 #include <algorithm>
 #include <cinttypes>
 #include <cmath>
-#include <cstdio>
 #include <cstring>
 #include <vector>
 
 #include "playback/DeviceTimeSource.h"
 #include "sound/ChannelManager.h"
+#include "support/Diagnostics.h"
 #include "support/SystemTime.h"
 
 namespace glimmet {
@@ -105,7 +105,7 @@ int64_t AudioProducer::SchedulingLatency() const
 status_t AudioProducer::FormatSuggestionRequested(int32_t type, int32_t, MediaFormat* format)
 {
     if (format == nullptr) {
-        std::printf("\tERROR - NULL format pointer passed in!\n");
+        Diagnostics::Print("\tERROR - NULL format pointer passed in!\n");
         return B_BAD_VALUE;
     }
     *format = preferredFormat_;
@@ -117,7 +117,7 @@ status_t AudioProducer::FormatSuggestionRequested(int32_t type, int32_t, MediaFo
 status_t AudioProducer::FormatProposal(const MediaSource& output, MediaFormat* format)
 {
     if (!IsOurSource(output)) {
-        std::printf("AudioProducer::FormatProposal returning B_MEDIA_BAD_SOURCE\n");
+        Diagnostics::Print("AudioProducer::FormatProposal returning B_MEDIA_BAD_SOURCE\n");
         return B_MEDIA_BAD_SOURCE;
     }
     if (format == nullptr)
@@ -126,7 +126,7 @@ status_t AudioProducer::FormatProposal(const MediaSource& output, MediaFormat* f
     *format = preferredFormat_;
     if (proposed == B_MEDIA_UNKNOWN_TYPE || proposed == B_MEDIA_RAW_AUDIO)
         return B_OK;
-    std::printf("AudioProducer::FormatProposal returning B_MEDIA_BAD_FORMAT\n");
+    Diagnostics::Print("AudioProducer::FormatProposal returning B_MEDIA_BAD_FORMAT\n");
     return B_MEDIA_BAD_FORMAT;
 }
 
@@ -185,18 +185,18 @@ status_t AudioProducer::PrepareToConnect(const MediaSource& what, const MediaDes
     if (format == nullptr)
         return B_BAD_VALUE;
     if (format->type != B_MEDIA_RAW_AUDIO) {
-        std::printf("\tnon-raw-audio format?!\n");
+        Diagnostics::Print("\tnon-raw-audio format?!\n");
         return B_MEDIA_BAD_FORMAT;
     }
     if (format->sampleFormat != B_AUDIO_FLOAT) {
-        std::printf("\tnon-float-audio format?!\n");
+        Diagnostics::Print("\tnon-float-audio format?!\n");
         return B_MEDIA_BAD_FORMAT;
     }
     if (format->bufferSize == kWildcardBufferSize) {
         format->bufferSize = kDefaultBufferSize;
-        std::printf("\tno buffer size provided, suggesting %lu\n", (unsigned long)format->bufferSize);
+        Diagnostics::Print("\tno buffer size provided, suggesting %lu\n", (unsigned long)format->bufferSize);
     } else {
-        std::printf("\tconsumer suggested buffer_size %lu\n", (unsigned long)format->bufferSize);
+        Diagnostics::Print("\tconsumer suggested buffer_size %lu\n", (unsigned long)format->bufferSize);
     }
     output_.destination = where;
     output_.format = *format;
@@ -239,7 +239,7 @@ void AudioProducer::Connect(status_t error, const MediaSource&, const MediaDesti
     Mix(trial.data(), frames);
     const int64_t internal = system_time() - before;
     internalLatency_.store(internal, std::memory_order_relaxed);
-    std::printf("\tbuffer-filling took %" PRId64 " usec on this machine\n", internal);
+    Diagnostics::Print("\tbuffer-filling took %" PRId64 " usec on this machine\n", internal);
 
     SetEventLatency(downstreamLatency + internal);
     const int64_t samplesPerSecond = std::llround(double(format.channelCount) * double(format.frameRate));
@@ -295,7 +295,7 @@ void AudioProducer::Disconnect(const MediaSource& what, const MediaDestination& 
         bufferGroup_.reset();
         return;
     }
-    std::printf("\tDisconnect() called with wrong source/destination (%ld/%ld), ours is (%ld/%ld)\n",
+    Diagnostics::Print("\tDisconnect() called with wrong source/destination (%ld/%ld), ours is (%ld/%ld)\n",
         long(what.id), long(where.id), long(output_.source.id), long(output_.destination.id));
 }
 
@@ -310,11 +310,11 @@ void AudioProducer::LateNoticeReceived(const MediaSource& what, int64_t howMuch,
         const int64_t internal = internalLatency_.fetch_add(howMuch, std::memory_order_relaxed) + howMuch;
         const int64_t total = DownstreamLatency() + internal;
         SetEventLatency(total);
-        std::printf("\tincreasing latency to %" PRId64 "\n", total);
+        Diagnostics::Print("\tincreasing latency to %" PRId64 "\n", total);
     } else {
         // The buffer's sample count (both channels), not its frame count.
         framesSent_.fetch_add(int64_t(output_.format.bufferSize / 4), std::memory_order_relaxed);
-        std::printf("\tskipping a buffer to try to catch up\n");
+        Diagnostics::Print("\tskipping a buffer to try to catch up\n");
     }
 }
 
@@ -446,7 +446,7 @@ BufferGroup::Buffer* AudioProducer::FillNextBuffer(int64_t eventTime)
     const uint32_t bufferSize = output_.format.bufferSize;
     BufferGroup::Buffer* buffer = bufferGroup_ ? bufferGroup_->RequestBuffer(bufferSize) : nullptr;
     if (buffer == nullptr) {
-        std::printf("no buffer!\n");
+        Diagnostics::Print("no buffer!\n");
         return nullptr;
     }
     const size_t floats = bufferSize / 4;
