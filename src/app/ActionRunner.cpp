@@ -3,13 +3,12 @@
 #include <QAction>
 #include <QString>
 
-#include <cstdio>
-
 #include "app/MenuBuilder.h"
 #include "edit/Action.h"
 #include "edit/EditContext.h"
 #include "edit/HistoryManager.h"
 #include "sound/ChannelManager.h"
+#include "support/Diagnostics.h"
 #include "support/MessageCodes.h"
 #include "support/MessageTarget.h"
 
@@ -87,8 +86,7 @@ void ActionRunner::Undo()
 {
     const status_t status = history_.Undo();
     if (status != B_OK) {
-        std::printf("Error doing undo: %s\n", StatusText(status));
-        std::fflush(stdout);
+        Diagnostics::Print("Error doing undo: %s\n", StatusText(status));
         return;
     }
     Redraw();
@@ -98,8 +96,7 @@ void ActionRunner::Redo()
 {
     const status_t status = history_.Redo();
     if (status != B_OK) {
-        std::printf("Error doing redo: %s\n", StatusText(status));
-        std::fflush(stdout);
+        Diagnostics::Print("Error doing redo: %s\n", StatusText(status));
         return;
     }
     Redraw();

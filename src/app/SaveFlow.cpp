@@ -5,11 +5,10 @@
 #include <QMessageBox>
 #include <QPushButton>
 
-#include <cstdio>
-
 #include "app/QuillexWindow.h"
 #include "edit/HistoryManager.h"
 #include "files/DocumentSaver.h"
+#include "support/Diagnostics.h"
 #include "support/Message.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
@@ -48,8 +47,7 @@ void SaveFlow::Save()
     }
     const status_t status = SaveFile(*fileEntry_);
     if (status != B_OK) {
-        std::printf("error writing file. (%s)\n", StatusText(status));
-        std::fflush(stdout);
+        Diagnostics::Print("error writing file. (%s)\n", StatusText(status));
     }
 }
 

@@ -1,12 +1,12 @@
 #include "edit/PasteAction.h"
 
 #include <algorithm>
-#include <cstdio>
 
 #include "edit/CopyBuffer.h"
 #include "edit/EditContext.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "support/Diagnostics.h"
 
 namespace glimmet {
 
@@ -58,10 +58,9 @@ void PasteAction::PasteOverRange(const std::vector<const int16_t*>& buffers, int
             break;
         const status_t status = channel->ReplaceFrames(buffers[i], frames, RangeStart(), RangeEnd());
         if (status != B_OK)
-            std::printf("error replacing frames: %s\n", StatusText(status));
+            Diagnostics::Print("error replacing frames: %s\n", StatusText(status));
         pastedChannelCount_++;
     }
-    std::fflush(stdout);
     pasteStart_ = RangeStart();
     // From the cursor, not the range start: the range end then marks the
     // cursor's length of pasted frames.
@@ -79,11 +78,10 @@ void PasteAction::InsertAtCursor(const std::vector<const int16_t*>& buffers, int
             break;
         const status_t status = channel->InsertFrames(buffers[i], frames, Cursor());
         if (status != B_OK)
-            std::printf("error inserting frames: %s\n", StatusText(status));
+            Diagnostics::Print("error inserting frames: %s\n", StatusText(status));
         channel->SetSelected(true);
         pastedChannelCount_++;
     }
-    std::fflush(stdout);
     pasteStart_ = Cursor();
     pasteEnd_ = Cursor() + frames - 1;
     Manager()->SetRangeStart(pasteStart_);
@@ -98,10 +96,9 @@ void PasteAction::RemoveInsertedFrames()
             break;
         const status_t status = channel->RemoveFrames(pasteStart_, pasteEnd_);
         if (status != B_OK)
-            std::printf("error removing frames while unding paste: %s\n", StatusText(status));
+            Diagnostics::Print("error removing frames while unding paste: %s\n", StatusText(status));
         channel->SetSelected(true);
     }
-    std::fflush(stdout);
 }
 
 status_t PasteAction::Undo()

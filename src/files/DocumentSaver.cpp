@@ -1,6 +1,5 @@
 #include "files/DocumentSaver.h"
 
-#include <cstdio>
 #include <mutex>
 #include <system_error>
 
@@ -10,6 +9,7 @@
 #include "files/SaveTarget.h"
 #include "files/WavFileWriter.h"
 #include "sound/ChannelManager.h"
+#include "support/Diagnostics.h"
 
 namespace glimmet {
 
@@ -41,8 +41,7 @@ status_t DocumentSaver::SaveFile(const std::filesystem::path& file, ChannelManag
     }
     const status_t released = writer.Finish();
     if (released != B_OK) {
-        std::printf("Error releasing tracks: %s\n", StatusText(released));
-        std::fflush(stdout);
+        Diagnostics::Print("Error releasing tracks: %s\n", StatusText(released));
     }
     return SetTypeOfSavedFile(destination);
 }

@@ -8,6 +8,7 @@
 #include "playback/BufferPlan.h"
 #include "playback/DeviceTimeSource.h"
 #include "sound/ChannelManager.h"
+#include "support/Diagnostics.h"
 #include "support/SystemTime.h"
 
 namespace glimmet {
@@ -140,7 +141,7 @@ void AudioProducer::Connect(status_t error, const MediaSource&, const MediaDesti
     Mix(trial.data(), frames);
     const int64_t internal = system_time() - before;
     internalLatency_.store(internal, std::memory_order_relaxed);
-    std::printf("\tbuffer-filling took %" PRId64 " usec on this machine\n", internal);
+    Diagnostics::Print("\tbuffer-filling took %" PRId64 " usec on this machine\n", internal);
 
     SetEventLatency(downstreamLatency + internal);
     SetBufferDuration(BufferPlan::BufferDuration(format));
@@ -192,11 +193,11 @@ void AudioProducer::LateNoticeReceived(const MediaSource& what, int64_t howMuch,
         const int64_t internal = internalLatency_.fetch_add(howMuch, std::memory_order_relaxed) + howMuch;
         const int64_t total = DownstreamLatency() + internal;
         SetEventLatency(total);
-        std::printf("\tincreasing latency to %" PRId64 "\n", total);
+        Diagnostics::Print("\tincreasing latency to %" PRId64 "\n", total);
     } else {
         // The buffer's sample count (both channels), not its frame count.
         framesSent_.fetch_add(int64_t(Output().format.bufferSize / 4), std::memory_order_relaxed);
-        std::printf("\tskipping a buffer to try to catch up\n");
+        Diagnostics::Print("\tskipping a buffer to try to catch up\n");
     }
 }
 
@@ -311,7 +312,7 @@ BufferGroup::Buffer* AudioProducer::FillNextBuffer(int64_t eventTime)
     const uint32_t bufferSize = Output().format.bufferSize;
     BufferGroup::Buffer* buffer = bufferGroup_ ? bufferGroup_->RequestBuffer(bufferSize) : nullptr;
     if (buffer == nullptr) {
-        std::printf("no buffer!\n");
+        Diagnostics::Print("no buffer!\n");
         return nullptr;
     }
     const size_t floats = bufferSize / 4;

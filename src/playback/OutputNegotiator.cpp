@@ -1,7 +1,8 @@
 #include "playback/OutputNegotiator.h"
 
-#include <cstdio>
 #include <cstring>
+
+#include "support/Diagnostics.h"
 
 namespace glimmet {
 
@@ -40,7 +41,7 @@ void OutputNegotiator::Register(int32_t nodeId, const char* name)
 status_t OutputNegotiator::SuggestFormat(int32_t type, MediaFormat* format) const
 {
     if (format == nullptr) {
-        std::printf("\tERROR - NULL format pointer passed in!\n");
+        Diagnostics::Print("\tERROR - NULL format pointer passed in!\n");
         return B_BAD_VALUE;
     }
     *format = preferredFormat_;
@@ -52,7 +53,7 @@ status_t OutputNegotiator::SuggestFormat(int32_t type, MediaFormat* format) cons
 status_t OutputNegotiator::ProposeFormat(const MediaSource& output, MediaFormat* format) const
 {
     if (!IsOurSource(output)) {
-        std::printf("AudioProducer::FormatProposal returning B_MEDIA_BAD_SOURCE\n");
+        Diagnostics::Print("AudioProducer::FormatProposal returning B_MEDIA_BAD_SOURCE\n");
         return B_MEDIA_BAD_SOURCE;
     }
     if (format == nullptr)
@@ -61,7 +62,7 @@ status_t OutputNegotiator::ProposeFormat(const MediaSource& output, MediaFormat*
     *format = preferredFormat_;
     if (proposed == B_MEDIA_UNKNOWN_TYPE || proposed == B_MEDIA_RAW_AUDIO)
         return B_OK;
-    std::printf("AudioProducer::FormatProposal returning B_MEDIA_BAD_FORMAT\n");
+    Diagnostics::Print("AudioProducer::FormatProposal returning B_MEDIA_BAD_FORMAT\n");
     return B_MEDIA_BAD_FORMAT;
 }
 
@@ -99,18 +100,18 @@ status_t OutputNegotiator::PrepareToConnect(const MediaSource& what, const Media
     if (format == nullptr)
         return B_BAD_VALUE;
     if (format->type != B_MEDIA_RAW_AUDIO) {
-        std::printf("\tnon-raw-audio format?!\n");
+        Diagnostics::Print("\tnon-raw-audio format?!\n");
         return B_MEDIA_BAD_FORMAT;
     }
     if (format->sampleFormat != B_AUDIO_FLOAT) {
-        std::printf("\tnon-float-audio format?!\n");
+        Diagnostics::Print("\tnon-float-audio format?!\n");
         return B_MEDIA_BAD_FORMAT;
     }
     if (format->bufferSize == kWildcardBufferSize) {
         format->bufferSize = kDefaultBufferSize;
-        std::printf("\tno buffer size provided, suggesting %lu\n", (unsigned long)format->bufferSize);
+        Diagnostics::Print("\tno buffer size provided, suggesting %lu\n", (unsigned long)format->bufferSize);
     } else {
-        std::printf("\tconsumer suggested buffer_size %lu\n", (unsigned long)format->bufferSize);
+        Diagnostics::Print("\tconsumer suggested buffer_size %lu\n", (unsigned long)format->bufferSize);
     }
     output_.destination = where;
     output_.format = *format;
@@ -139,7 +140,7 @@ bool OutputNegotiator::Disconnect(const MediaSource& what, const MediaDestinatio
         Reset();
         return true;
     }
-    std::printf("\tDisconnect() called with wrong source/destination (%ld/%ld), ours is (%ld/%ld)\n",
+    Diagnostics::Print("\tDisconnect() called with wrong source/destination (%ld/%ld), ours is (%ld/%ld)\n",
         long(what.id), long(where.id), long(output_.source.id), long(output_.destination.id));
     return false;
 }

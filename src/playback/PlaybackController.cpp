@@ -1,9 +1,8 @@
 #include "playback/PlaybackController.h"
 
-#include <cstdio>
-
 #include "playback/PlaybackWindow.h"
 #include "sound/ChannelManager.h"
+#include "support/Diagnostics.h"
 #include "support/Message.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
@@ -22,7 +21,7 @@ status_t PlaybackController::SetUp()
 {
     const status_t status = graph_.SetupNodes();
     if (status != B_OK)
-        std::printf("Error setting up nodes!\n");
+        Diagnostics::Print("Error setting up nodes!\n");
     return status;
 }
 

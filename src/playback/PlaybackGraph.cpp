@@ -4,11 +4,11 @@
 
 #include <atomic>
 #include <cmath>
-#include <cstdio>
 #include <cstring>
 
 #include "playback/AudioProducer.h"
 #include "playback/AudioSystem.h"
+#include "support/Diagnostics.h"
 #include "support/SystemTime.h"
 
 namespace glimmet {
@@ -47,7 +47,7 @@ status_t PlaybackGraph::SetupNodes()
     if (!share_) {
         fellBack = true;
         if (!FallBack()) {
-            std::printf("Can't find the media roster, error: %lx\n", Hex(B_MEDIA_SYSTEM_FAILURE));
+            Diagnostics::Print("Can't find the media roster, error: %lx\n", Hex(B_MEDIA_SYSTEM_FAILURE));
             return B_MEDIA_SYSTEM_FAILURE;
         }
     }
@@ -62,7 +62,7 @@ status_t PlaybackGraph::SetupNodes()
 
     // The system's mixer stands for the output device of the driver in use.
     if (AudioSystem::CurrentDriver() == nullptr) {
-        std::printf("unable to get the system mixer, error: %lx\n", Hex(B_MEDIA_SYSTEM_FAILURE));
+        Diagnostics::Print("unable to get the system mixer, error: %lx\n", Hex(B_MEDIA_SYSTEM_FAILURE));
         return B_MEDIA_SYSTEM_FAILURE;
     }
     mixerNode_ = gNextNodeId++;
@@ -71,7 +71,7 @@ status_t PlaybackGraph::SetupNodes()
     int32_t cookie = 0;
     MediaOutput output;
     if (producer_->GetNextOutput(&cookie, &output) != B_OK || !(output.destination == MediaDestination::Null())) {
-        std::printf("unable to get a free output from the producer node, error: %lx\n", Hex(B_MEDIA_BAD_NODE));
+        Diagnostics::Print("unable to get a free output from the producer node, error: %lx\n", Hex(B_MEDIA_BAD_NODE));
         return B_MEDIA_BAD_NODE;
     }
     const MediaDestination input{mixerNode_, 0};
@@ -99,7 +99,7 @@ status_t PlaybackGraph::SetupNodes()
     if (status != B_OK) {
         source_ = MediaSource::Null();
         destination_ = MediaDestination::Null();
-        std::printf("unable to connect nodes, error: %lx\n", Hex(status));
+        Diagnostics::Print("unable to connect nodes, error: %lx\n", Hex(status));
         return status;
     }
     format_ = format;
@@ -110,7 +110,7 @@ status_t PlaybackGraph::SetupNodes()
 
 bool PlaybackGraph::FallBack()
 {
-    std::printf("No sound device could be opened (%s); playing through SDL's %s driver\n", SDL_GetError(),
+    Diagnostics::Print("No sound device could be opened (%s); playing through SDL's %s driver\n", SDL_GetError(),
         fallbackDriver_.c_str());
     return AudioSystem::SwitchDriver(fallbackDriver_.c_str(), share_, &share_);
 }
@@ -188,14 +188,14 @@ status_t PlaybackGraph::StartNodes()
     int64_t initialLatency = 0;
     const status_t initialStatus = GetInitialLatency(&initialLatency);
     if (initialStatus < 0) {
-        std::printf("Can't get initial latency for audio producer node - Error: %s\n", StatusText(initialStatus));
+        Diagnostics::Print("Can't get initial latency for audio producer node - Error: %s\n", StatusText(initialStatus));
     }
     initialLatency += producer_->SchedulingLatency();
 
     const int64_t start = timeSource_.PerformanceTimeFor(DeviceTimeSource::RealTime() + latency + initialLatency);
     const status_t status = producer_->IsLoopRunning() ? producer_->Start(start) : B_MEDIA_BAD_NODE;
     if (status != B_OK) {
-        std::printf("Can't start the audio producer - Error: %s\n", StatusText(status));
+        Diagnostics::Print("Can't start the audio producer - Error: %s\n", StatusText(status));
         return status;
     }
     return B_OK;
@@ -238,11 +238,11 @@ void PlaybackGraph::TearDownNodes()
         status = B_OK;
     }
     if (status != B_OK)
-        std::printf("Error disconnecting audio nodes:  %ld (%s)\n", long(status), StatusText(status));
+        Diagnostics::Print("Error disconnecting audio nodes:  %ld (%s)\n", long(status), StatusText(status));
 
     producerNode_ = -1;
     if (mixerNode_ < 0)
-        std::printf("Error releasing audio consumer: %s\n", StatusText(B_MEDIA_BAD_NODE));
+        Diagnostics::Print("Error releasing audio consumer: %s\n", StatusText(B_MEDIA_BAD_NODE));
     mixerNode_ = -1;
 
     producer_.reset();

@@ -1,9 +1,10 @@
 #include "sound/Channel.h"
 
 #include <algorithm>
-#include <cstdio>
 #include <cstring>
 #include <new>
+
+#include "support/Diagnostics.h"
 
 namespace glimmet {
 
@@ -92,8 +93,7 @@ bool Channel::FindSamples(int64_t start, int64_t count, const int16_t** samples,
     } else if (start >= first_ && start > end) {
         return true;
     } else if (start == end) {
-        std::printf("what the....?\n");
-        std::fflush(stdout);
+        Diagnostics::Print("what the....?\n");
         return false;
     } else if (last <= first_) {
         // Also when the request ends exactly on the first frame: that frame
@@ -185,8 +185,7 @@ status_t Channel::ReplaceInData(const int16_t* frames, int64_t count, int64_t fr
     if (from >= first_ && from < end) {
         const int64_t head = from - first_;
         if (to >= end) {
-            std::printf("  ending outside data\n");
-            std::fflush(stdout);
+            Diagnostics::Print("  ending outside data\n");
         }
         const int64_t tailIndex = std::min(to - first_ + 1, count_);
         const int64_t tail = count_ - tailIndex;

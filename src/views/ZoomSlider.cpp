@@ -2,12 +2,12 @@
 
 #include <algorithm>
 #include <cinttypes>
-#include <cstdio>
 
 #include <QMouseEvent>
 #include <QPainter>
 #include <QTimer>
 
+#include "support/Diagnostics.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
 #include "support/SystemTime.h"
@@ -50,8 +50,8 @@ ZoomSlider::~ZoomSlider() = default;
 void ZoomSlider::SetLowValue(int64_t value, bool notify)
 {
     if (value < 0 || high_ - value < minRange_) {
-        std::printf("ZoomSlider::SetLowValue() - Error: f=%" PRId64 ", l=%" PRId64 ", r=%" PRId64 "\n", value, high_,
-                    minRange_);
+        Diagnostics::Print("ZoomSlider::SetLowValue() - Error: f=%" PRId64 ", l=%" PRId64 ", r=%" PRId64 "\n",
+            value, high_, minRange_);
         return;
     }
     low_ = value;
@@ -63,8 +63,8 @@ void ZoomSlider::SetLowValue(int64_t value, bool notify)
 void ZoomSlider::SetHighValue(int64_t value, bool notify)
 {
     if (value < low_ + minRange_) {
-        std::printf("ZoomSlider::SetHighValue() - Error: f=%" PRId64 ", l=%" PRId64 ", r=%" PRId64 "\n", low_, value,
-                    minRange_);
+        Diagnostics::Print("ZoomSlider::SetHighValue() - Error: f=%" PRId64 ", l=%" PRId64 ", r=%" PRId64 "\n",
+            low_, value, minRange_);
         return;
     }
     high_ = value;
@@ -76,8 +76,8 @@ void ZoomSlider::SetHighValue(int64_t value, bool notify)
 void ZoomSlider::SetMinRange(int64_t range)
 {
     if (range > high_ - low_) {
-        std::printf("ZoomSlider::SetMinRange() - Error: f=%" PRId64 ", l=%" PRId64 ", r=%" PRId64 "\n", low_, high_,
-                    range);
+        Diagnostics::Print("ZoomSlider::SetMinRange() - Error: f=%" PRId64 ", l=%" PRId64 ", r=%" PRId64 "\n",
+            low_, high_, range);
         return;
     }
     minRange_ = range;

@@ -24,6 +24,7 @@
 #include "playback/PlaybackController.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
 #include "views/ChannelContainerView.h"
 
@@ -426,10 +427,10 @@ TEST(QuillexWindow, UndoAndRedoFailuresArePrinted)
 {
     AppFixture fixture;
     QuillexWindow* window = OpenWindow(fixture);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     window->MessageReceived(Message(kMsgUndo));
     window->MessageReceived(Message(kMsgRedo));
-    const std::string output = testing::internal::GetCapturedStdout();
+    const std::string output = capture.Finish();
     EXPECT_EQ(output, std::string("Error doing undo: ") + StatusText(B_ERROR) + "\nError doing redo: "
             + StatusText(B_ERROR) + "\n");
     // A failure leaves the menu as it was built.

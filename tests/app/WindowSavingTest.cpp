@@ -15,6 +15,7 @@
 #include "app/MenuTable.h"
 #include "edit/HistoryManager.h"
 #include "sound/ChannelManager.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
 #include "views/ChannelContainerView.h"
 
@@ -98,9 +99,9 @@ TEST(QuillexWindow, SaveFailurePrintsTheError)
     AppFixture fixture;
     QuillexWindow* window = OpenWindow(fixture);
     window->SetFileEntry(fixture.Dir() / "no-such-folder" / "x.wav");
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     window->MessageReceived(Message(kMsgSave));
-    const std::string output = testing::internal::GetCapturedStdout();
+    const std::string output = capture.Finish();
     EXPECT_NE(output.find("error writing file. ("), std::string::npos) << output;
     EXPECT_EQ(output.back(), '\n');
 }

@@ -21,6 +21,7 @@
 #include "files/MediaTrack.h"
 #include "files/WavFileWriter.h"
 #include "sound/Channel.h"
+#include "support/DiagnosticsCapture.h"
 
 namespace glimmet {
 namespace {
@@ -257,9 +258,9 @@ TEST_F(DocumentSaverTest, FailedWriteLeavesTheOldFileAndNoTemporaryFile)
     rlimit small = previous;
     small.rlim_cur = 64 * 1024;
     ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &small), 0);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     const status_t status = DocumentSaver::SaveFile(path, window);
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = capture.Finish();
     setrlimit(RLIMIT_FSIZE, &previous);
     std::signal(SIGXFSZ, oldHandler);
 
@@ -277,9 +278,9 @@ TEST_F(DocumentSaverTest, MissingDirectoryFailsWithTheTypeSettingStatus)
     AddChannel(SoundFixtures::Pattern(100, 1), Channel::kPanMiddle);
     MakeUnsaved();
     const auto path = fixtures.PathOf("no/such/dir.wav");
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(DocumentSaver::SaveFile(path, window), B_ENTRY_NOT_FOUND);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "Error releasing tracks: No such file or directory\n");
+    EXPECT_EQ(capture.Finish(), "Error releasing tracks: No such file or directory\n");
     EXPECT_FALSE(std::filesystem::exists(path));
     // No track was made, so nothing was marked.
     EXPECT_FALSE(window.history.IsSaved());
@@ -328,9 +329,9 @@ TEST_F(DocumentSaverTest, DirectoryInTheWayIsNeitherWrittenNorLabelled)
     AddChannel(SoundFixtures::Pattern(100, 1), Channel::kPanMiddle);
     const auto directory = fixtures.PathOf("folder.wav");
     std::filesystem::create_directory(directory);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(DocumentSaver::SaveFile(directory, window), B_IS_A_DIRECTORY);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "Error releasing tracks: Is a directory\n");
+    EXPECT_EQ(capture.Finish(), "Error releasing tracks: Is a directory\n");
     EXPECT_TRUE(std::filesystem::is_directory(directory));
     EXPECT_EQ(FileType(directory), "");
     EXPECT_EQ(DirectoryListing(fixtures.Directory()), std::vector<std::string>{"folder.wav"});

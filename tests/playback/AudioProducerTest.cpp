@@ -9,6 +9,7 @@
 #include "playback/AudioProducer.h"
 #include "playback/MediaKit.h"
 #include "sound/ChannelManager.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet {
@@ -60,10 +61,10 @@ protected:
         MediaFormat format = RawFloat();
         MediaSource source;
         char name[kMediaNameLength] = {};
-        testing::internal::CaptureStdout();
+        DiagnosticsCapture capture;
         ASSERT_EQ(producer->PrepareToConnect(kOurSource, kDevice, &format, &source, name), B_OK);
         producer->Connect(B_OK, source, kDevice, format, name, downstreamLatency);
-        connectOutput = testing::internal::GetCapturedStdout();
+        connectOutput = capture.Finish();
     }
 
     /// One device period served at deviceFrame; returns its floats.
@@ -125,9 +126,9 @@ TEST_F(ProducerTest, SuggestsItsFormatForRawOrUnknownTypesOnly)
     EXPECT_EQ(producer->FormatSuggestionRequested(B_MEDIA_ENCODED_AUDIO, 0, &format), B_MEDIA_BAD_FORMAT);
     EXPECT_EQ(format, producer->PreferredFormat());
 
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(producer->FormatSuggestionRequested(B_MEDIA_RAW_AUDIO, 0, nullptr), B_BAD_VALUE);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\tERROR - NULL format pointer passed in!\n");
+    EXPECT_EQ(capture.Finish(), "\tERROR - NULL format pointer passed in!\n");
 }
 
 TEST_F(ProducerTest, ProposalOfANonRawTypeIsRefusedWithThePreferredFormatWrittenIn)
@@ -135,9 +136,9 @@ TEST_F(ProducerTest, ProposalOfANonRawTypeIsRefusedWithThePreferredFormatWritten
     MediaFormat format;
     format.type = B_MEDIA_ENCODED_AUDIO;
     format.frameRate = 8000;
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(producer->FormatProposal(kOurSource, &format), B_MEDIA_BAD_FORMAT);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "AudioProducer::FormatProposal returning B_MEDIA_BAD_FORMAT\n");
+    EXPECT_EQ(capture.Finish(), "AudioProducer::FormatProposal returning B_MEDIA_BAD_FORMAT\n");
     EXPECT_EQ(format, producer->PreferredFormat());
 }
 
@@ -147,9 +148,9 @@ TEST_F(ProducerTest, ProposalOfRawOrUnknownIsAnsweredWithThePreferredFormat)
         MediaFormat format;
         format.type = type;
         format.channelCount = 6;
-        testing::internal::CaptureStdout();
+        DiagnosticsCapture capture;
         EXPECT_EQ(producer->FormatProposal(kOurSource, &format), B_OK);
-        EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+        EXPECT_EQ(capture.Finish(), "");
         EXPECT_EQ(format, producer->PreferredFormat());
     }
 }
@@ -157,9 +158,9 @@ TEST_F(ProducerTest, ProposalOfRawOrUnknownIsAnsweredWithThePreferredFormat)
 TEST_F(ProducerTest, ProposalForAForeignSourceIsRefused)
 {
     MediaFormat format = RawFloat();
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(producer->FormatProposal(MediaSource{kNode + 1, 0}, &format), B_MEDIA_BAD_SOURCE);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "AudioProducer::FormatProposal returning B_MEDIA_BAD_SOURCE\n");
+    EXPECT_EQ(capture.Finish(), "AudioProducer::FormatProposal returning B_MEDIA_BAD_SOURCE\n");
     EXPECT_EQ(format, RawFloat());
 }
 
@@ -168,9 +169,9 @@ TEST_F(ProducerTest, AnOpenBufferSizeBecomes2048Bytes)
     MediaFormat format = RawFloat();
     MediaSource source;
     char name[kMediaNameLength] = {};
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(producer->PrepareToConnect(kOurSource, kDevice, &format, &source, name), B_OK);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\tno buffer size provided, suggesting 2048\n");
+    EXPECT_EQ(capture.Finish(), "\tno buffer size provided, suggesting 2048\n");
     EXPECT_EQ(format.bufferSize, 2048u);
     EXPECT_EQ(source, kOurSource);
     EXPECT_STREQ(name, "Quillex Sound Output");
@@ -187,9 +188,9 @@ TEST_F(ProducerTest, ASuggestedBufferSizeIsTaken)
     format.channelCount = 2;
     MediaSource source;
     char name[kMediaNameLength] = {};
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(producer->PrepareToConnect(kOurSource, kDevice, &format, &source, name), B_OK);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\tconsumer suggested buffer_size 4096\n");
+    EXPECT_EQ(capture.Finish(), "\tconsumer suggested buffer_size 4096\n");
     EXPECT_EQ(format.bufferSize, 4096u);
     EXPECT_EQ(producer->Output().format.frameRate, 48000.0f);
 }
@@ -200,15 +201,15 @@ TEST_F(ProducerTest, NonRawAndNonFloatFormatsAreRefusedWhenConnecting)
     char name[kMediaNameLength] = {};
     MediaFormat encoded = RawFloat();
     encoded.type = B_MEDIA_ENCODED_AUDIO;
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(producer->PrepareToConnect(kOurSource, kDevice, &encoded, &source, name), B_MEDIA_BAD_FORMAT);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\tnon-raw-audio format?!\n");
+    EXPECT_EQ(capture.Finish(), "\tnon-raw-audio format?!\n");
 
     MediaFormat shorts = RawFloat();
     shorts.sampleFormat = B_AUDIO_SHORT;
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture secondCapture;
     EXPECT_EQ(producer->PrepareToConnect(kOurSource, kDevice, &shorts, &source, name), B_MEDIA_BAD_FORMAT);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\tnon-float-audio format?!\n");
+    EXPECT_EQ(secondCapture.Finish(), "\tnon-float-audio format?!\n");
 
     MediaFormat fine = RawFloat();
     EXPECT_EQ(producer->PrepareToConnect(MediaSource{3, 3}, kDevice, &fine, &source, name), B_MEDIA_BAD_SOURCE);
@@ -243,10 +244,10 @@ TEST_F(ProducerTest, AFailedConnectionReturnsToThePreferredFormat)
     MediaFormat format = RawFloat();
     MediaSource source;
     char name[kMediaNameLength] = {};
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(producer->PrepareToConnect(kOurSource, kDevice, &format, &source, name), B_OK);
     producer->Connect(B_ERROR, source, kDevice, format, name);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\tno buffer size provided, suggesting 2048\n");
+    EXPECT_EQ(capture.Finish(), "\tno buffer size provided, suggesting 2048\n");
     EXPECT_EQ(producer->Output().destination, MediaDestination::Null());
     EXPECT_EQ(producer->Output().format, producer->PreferredFormat());
 }
@@ -263,9 +264,9 @@ TEST_F(ProducerTest, DisconnectReturnsToTheUnconnectedState)
 TEST_F(ProducerTest, DisconnectOfAForeignConnectionIsReportedAndChangesNothing)
 {
     Connect();
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     producer->Disconnect(MediaSource{kNode, 3}, MediaDestination{42, 9});
-    EXPECT_EQ(testing::internal::GetCapturedStdout(),
+    EXPECT_EQ(capture.Finish(),
         "\tDisconnect() called with wrong source/destination (3/9), ours is (0/0)\n");
     EXPECT_EQ(producer->Output().destination, kDevice);
     EXPECT_NE(producer->Buffers(), nullptr);
@@ -284,10 +285,10 @@ TEST_F(ProducerTest, LateNoticeRaisesTheLatencyInIncreaseLatencyMode)
 {
     Connect(5804);
     const int64_t internal = producer->InternalLatency();
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     producer->LateNoticeReceived(kOurSource, 1500, 0);
     const int64_t total = 5804 + internal + 1500;
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\tincreasing latency to " + std::to_string(total) + "\n");
+    EXPECT_EQ(capture.Finish(), "\tincreasing latency to " + std::to_string(total) + "\n");
     EXPECT_EQ(producer->InternalLatency(), internal + 1500);
     EXPECT_EQ(producer->EventLatency(), total);
     EXPECT_EQ(producer->FramesSent(), 0);
@@ -297,9 +298,9 @@ TEST_F(ProducerTest, LateNoticeSkipsTwiceABufferInOtherModes)
 {
     Connect();
     producer->SetRunMode(B_DROP_DATA);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     producer->LateNoticeReceived(kOurSource, 1500, 0);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\tskipping a buffer to try to catch up\n");
+    EXPECT_EQ(capture.Finish(), "\tskipping a buffer to try to catch up\n");
     EXPECT_EQ(producer->FramesSent(), 512);
 }
 
@@ -307,11 +308,11 @@ TEST_F(ProducerTest, LateNoticesAreIgnoredWhileRecordingOrForAForeignSource)
 {
     Connect();
     const int64_t latency = producer->EventLatency();
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     producer->LateNoticeReceived(MediaSource{1, 1}, 1500, 0);
     producer->SetRunMode(B_RECORDING);
     producer->LateNoticeReceived(kOurSource, 1500, 0);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(capture.Finish(), "");
     EXPECT_EQ(producer->EventLatency(), latency);
     EXPECT_EQ(producer->FramesSent(), 0);
 }
@@ -459,9 +460,9 @@ TEST_F(ProducerTest, WithoutABufferNothingIsMixedButTimeGoesOn)
     Connect();
     ASSERT_EQ(producer->SetBufferGroup(kOurSource, std::make_unique<BufferGroup>(2048, 0)), B_OK);
     ASSERT_EQ(producer->Start(0), B_OK);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(Serve(0), std::vector<float>(512, 0.0f));
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "no buffer!\n");
+    EXPECT_EQ(capture.Finish(), "no buffer!\n");
     EXPECT_EQ(producer->FramesSent(), test::kBufferFrames);
     producer->Relay().Drain();
     window.ProcessPending();
@@ -477,9 +478,9 @@ TEST_F(ProducerTest, ASkippedBufferLeavesTwoPeriodsSilent)
     producer->SetRunMode(B_DROP_DATA);
     ASSERT_EQ(producer->Start(0), B_OK);
     EXPECT_NE(Serve(0), std::vector<float>(512, 0.0f));
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     producer->LateNoticeReceived(kOurSource, 3000, 0);
-    testing::internal::GetCapturedStdout();
+    capture.Finish();
     // The buffer already queued still plays; the next two periods are skipped.
     EXPECT_NE(Serve(256), std::vector<float>(512, 0.0f));
     EXPECT_EQ(Serve(512), std::vector<float>(512, 0.0f));
@@ -497,7 +498,7 @@ TEST_F(ProducerTest, ASlowPeriodRaisesALateNotice)
     Connect();
     ASSERT_EQ(producer->Start(0), B_OK);
     const int64_t internal = producer->InternalLatency();
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     std::thread holder([&] {
         manager->Lock();
         std::this_thread::sleep_for(std::chrono::milliseconds(30));
@@ -509,7 +510,7 @@ TEST_F(ProducerTest, ASlowPeriodRaisesALateNotice)
     }
     Serve(0);
     holder.join();
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = capture.Finish();
     EXPECT_EQ(producer->LatePeriods(), 1);
     EXPECT_GT(producer->InternalLatency(), internal + 15000);
     EXPECT_EQ(printed, "\tincreasing latency to " + std::to_string(producer->EventLatency()) + "\n");

@@ -6,6 +6,7 @@
 #include "playback/AudioProducer.h"
 #include "playback/PlaybackController.h"
 #include "sound/ChannelManager.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet {
@@ -48,9 +49,9 @@ protected:
 
     void Connect()
     {
-        testing::internal::CaptureStdout();
+        DiagnosticsCapture capture;
         ASSERT_EQ(controller->SetUp(), B_OK);
-        testing::internal::GetCapturedStdout();
+        capture.Finish();
     }
 
     void Send(uint32_t what) { window.PostMessage(Message(what)); }
@@ -359,17 +360,17 @@ TEST_F(ControllerTest, AFailedSetupSaysSoAndTheWindowWorksOn)
 {
     setenv("SDL_AUDIODRIVER", "no-such-driver", 1);
     controller->Graph().SetFallbackDriver("no-such-fallback");
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_NE(controller->SetUp(), B_OK);
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = capture.Finish();
     EXPECT_EQ(printed.substr(printed.size() - 24), "Error setting up nodes!\n") << printed;
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture secondCapture;
     controller->MessageReceived(Message(kMsgTogglePlay));
     EXPECT_TRUE(controller->IsPlaying());
     controller->MessageReceived(Message(kMsgStop));
     EXPECT_FALSE(controller->IsPlaying());
     controller->TearDown();
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(secondCapture.Finish(), "");
 }
 
 TEST_F(ControllerTest, StopWhileStoppedResetsThePositionAndMovesThePlayMark)

@@ -9,6 +9,7 @@
 #include "playback/AudioSystem.h"
 #include "playback/PlaybackGraph.h"
 #include "sound/ChannelManager.h"
+#include "support/DiagnosticsCapture.h"
 
 namespace glimmet {
 namespace {
@@ -61,9 +62,9 @@ protected:
 
 TEST_F(GraphTest, SetupConnectsTheProducerToTheDeviceInTheNegotiatedFormat)
 {
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(graph->SetupNodes(), B_OK);
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = capture.Finish();
     EXPECT_EQ(printed.rfind("\tno buffer size provided, suggesting 2048\n\tbuffer-filling took ", 0), 0u) << printed;
     EXPECT_EQ(CountOccurrences(printed, "\n"), 2) << printed;
     EXPECT_EQ(graph->DriverName(), "disk");
@@ -83,9 +84,9 @@ TEST_F(GraphTest, SetupConnectsTheProducerToTheDeviceInTheNegotiatedFormat)
     // The trial mix moved the play position on by one buffer.
     EXPECT_EQ(manager->CurrentFrame(), test::kBufferFrames);
     // Set up once only.
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture secondCapture;
     EXPECT_EQ(graph->SetupNodes(), B_MEDIA_ALREADY_CONNECTED);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(secondCapture.Finish(), "");
     EXPECT_EQ(graph->Producer(), producer);
     graph->TearDownNodes();
     EXPECT_EQ(graph->Producer(), nullptr);
@@ -93,22 +94,22 @@ TEST_F(GraphTest, SetupConnectsTheProducerToTheDeviceInTheNegotiatedFormat)
 
 TEST_F(GraphTest, StartingWithoutAProducerFailsSilently)
 {
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(graph->StartNodes(), B_ERROR);
     graph->StopNodes();
     graph->TearDownNodes();
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(capture.Finish(), "");
 }
 
 TEST_F(GraphTest, StartPlaysInRecordingModeAfterTheLatency)
 {
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(graph->SetupNodes(), B_OK);
-    testing::internal::GetCapturedStdout();
+    capture.Finish();
     manager->ResetCurrentFrame();
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture secondCapture;
     ASSERT_EQ(graph->StartNodes(), B_OK);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(secondCapture.Finish(), "");
     AudioProducer* producer = graph->Producer();
     EXPECT_EQ(producer->RunMode(), B_RECORDING);
     int64_t latency = 0;
@@ -129,10 +130,10 @@ TEST_F(GraphTest, StartPlaysInRecordingModeAfterTheLatency)
 
 TEST_F(GraphTest, StoppingAndStartingAgainBeginsAFreshTimeLine)
 {
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(graph->SetupNodes(), B_OK);
     ASSERT_EQ(graph->StartNodes(), B_OK);
-    testing::internal::GetCapturedStdout();
+    capture.Finish();
     AudioProducer* producer = graph->Producer();
     ASSERT_TRUE(WaitForBuffers(8));
     graph->StopNodes();
@@ -160,10 +161,10 @@ TEST_F(GraphTest, StoppingAndStartingAgainBeginsAFreshTimeLine)
 
 TEST_F(GraphTest, ALateDeviceRaisesTheLatencyOnlyOutsideRecordingMode)
 {
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(graph->SetupNodes(), B_OK);
     ASSERT_EQ(graph->StartNodes(), B_OK);
-    testing::internal::GetCapturedStdout();
+    capture.Finish();
     AudioProducer* producer = graph->Producer();
     ASSERT_TRUE(WaitForBuffers(2));
 
@@ -176,16 +177,16 @@ TEST_F(GraphTest, ALateDeviceRaisesTheLatencyOnlyOutsideRecordingMode)
         return window.ProcessUntil([&] { return producer->LatePeriods() > late; });
     };
     const int64_t internal = producer->InternalLatency();
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture secondCapture;
     ASSERT_TRUE(stallOnePeriod());
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(secondCapture.Finish(), "");
     EXPECT_EQ(producer->InternalLatency(), internal);
 
     producer->SetRunMode(B_INCREASE_LATENCY);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture thirdCapture;
     ASSERT_TRUE(stallOnePeriod());
     graph->StopNodes();
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = thirdCapture.Finish();
     EXPECT_GT(producer->InternalLatency(), internal + 10000);
     EXPECT_EQ(printed.rfind("\tincreasing latency to ", 0), 0u) << printed;
     graph->TearDownNodes();
@@ -194,9 +195,9 @@ TEST_F(GraphTest, ALateDeviceRaisesTheLatencyOnlyOutsideRecordingMode)
 TEST_F(GraphTest, ADeviceThatCannotBeOpenedFallsBackToTheDummyDriverWithOneLine)
 {
     setenv("SDL_AUDIODRIVER", "no-such-driver", 1);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(graph->SetupNodes(), B_OK);
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = capture.Finish();
     EXPECT_EQ(graph->DriverName(), "dummy");
     EXPECT_EQ(CountOccurrences(printed, "No sound device could be opened ("), 1) << printed;
     EXPECT_EQ(CountOccurrences(printed, "); playing through SDL's dummy driver\n"), 1) << printed;
@@ -212,43 +213,43 @@ TEST_F(GraphTest, WithoutAnyDriverThereIsNoRoster)
 {
     setenv("SDL_AUDIODRIVER", "no-such-driver", 1);
     graph->SetFallbackDriver("no-such-fallback");
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(graph->SetupNodes(), B_MEDIA_SYSTEM_FAILURE);
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = capture.Finish();
     EXPECT_NE(printed.find("); playing through SDL's no-such-fallback driver\n"), std::string::npos) << printed;
     EXPECT_NE(printed.find("Can't find the media roster, error: 80004100\n"), std::string::npos) << printed;
     EXPECT_EQ(graph->Producer(), nullptr);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture secondCapture;
     EXPECT_EQ(graph->StartNodes(), B_ERROR);
     graph->TearDownNodes();
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(secondCapture.Finish(), "");
 }
 
 TEST_F(GraphTest, AFailedConnectionLeavesTheProducerAndAFailedInitialLatencyStillStarts)
 {
     setenv("SDL_DISKAUDIOFILE", "/nonexistent-folder/output.raw", 1);
     graph->SetFallbackDriver("no-such-fallback");
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(graph->SetupNodes(), B_MEDIA_SYSTEM_FAILURE);
-    std::string printed = testing::internal::GetCapturedStdout();
+    std::string printed = capture.Finish();
     EXPECT_NE(printed.find("unable to connect nodes, error: 80004100\n"), std::string::npos) << printed;
     AudioProducer* producer = graph->Producer();
     ASSERT_NE(producer, nullptr);
     EXPECT_EQ(producer->Output().destination, MediaDestination::Null());
 
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture secondCapture;
     EXPECT_EQ(graph->StartNodes(), B_OK);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(),
+    EXPECT_EQ(secondCapture.Finish(),
         "Can't get initial latency for audio producer node - Error: Media nodes not connected\n");
     // The start is queued: the producer takes it at its next period.
     std::vector<float> period(512);
     producer->ServeDevice(period.data(), 256, 1 << 30);
     EXPECT_TRUE(producer->IsStarted());
 
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture thirdCapture;
     graph->StopNodes();
     graph->TearDownNodes();
-    printed = testing::internal::GetCapturedStdout();
+    printed = thirdCapture.Finish();
     EXPECT_EQ(printed, "Error disconnecting audio nodes:  " + std::to_string(long(B_MEDIA_NOT_CONNECTED))
         + " (Media nodes not connected)\n");
     EXPECT_EQ(graph->Producer(), nullptr);
@@ -256,14 +257,14 @@ TEST_F(GraphTest, AFailedConnectionLeavesTheProducerAndAFailedInitialLatencyStil
 
 TEST_F(GraphTest, TearDownClosesTheDeviceAndReleasesTheSoundSystem)
 {
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(graph->SetupNodes(), B_OK);
-    testing::internal::GetCapturedStdout();
+    capture.Finish();
     EXPECT_EQ(AudioSystem::Users(), 1);
     const auto before = std::chrono::steady_clock::now();
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture secondCapture;
     graph->TearDownNodes();
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    EXPECT_EQ(secondCapture.Finish(), "");
     EXPECT_GE(std::chrono::steady_clock::now() - before, std::chrono::milliseconds(20));
     EXPECT_EQ(graph->Device(), 0u);
     EXPECT_EQ(AudioSystem::Users(), 0);

@@ -17,6 +17,7 @@
 #include "edit/RevertPhasesAction.h"
 #include "playback/AudioProducer.h"
 #include "sound/Channel.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
 #include "support/SystemTime.h"
 
@@ -78,9 +79,9 @@ TEST(PlaybackStressTest, PlaysWhileTheWindowEditsUndoesAndRedoes)
 
     PlaybackController controller(&manager, &window, &window);
     window.Attach(&manager, &controller);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     ASSERT_EQ(controller.SetUp(), B_OK);
-    testing::internal::GetCapturedStdout();
+    capture.Finish();
     window.PostMessage(kMsgPlay);
     ASSERT_TRUE(window.ProcessUntil([&] { return window.playmarkUpdates.size() >= 5; }));
 

@@ -16,6 +16,7 @@
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "sound/SoftClip.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet {
@@ -656,7 +657,7 @@ TEST(ChannelManagerStress, MixingWhileEditing)
     ChannelManager manager(&window);
     SetUpStressDocument(manager, window);
     // Edits and mixes print the refused requests they meet; not of interest.
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
 
     std::atomic<int64_t> editsDone{0};
     std::atomic<bool> editing{true};
@@ -720,7 +721,7 @@ TEST(ChannelManagerStress, MixingWhileEditing)
                 matched[i] = MixesAlike(model, mixed[i], out);
         }
     }
-    testing::internal::GetCapturedStdout();
+    capture.Finish();
 
     ExpectSameDocument(manager, model);
     const auto unmatched = std::find(matched.begin(), matched.end(), false);
@@ -915,13 +916,13 @@ TEST_P(ScatteredMix, MixesBitForBit)
                 if (loop)
                     parts.push_back({0, head, frames - head});
             }
-            testing::internal::CaptureStdout();
+            DiagnosticsCapture capture;
             const std::vector<float> expected = ScatteredReference(channels, frames, parts);
-            const std::string printedByReference = testing::internal::GetCapturedStdout();
+            const std::string printedByReference = capture.Finish();
             std::vector<float> out(size_t(frames) * 2, -9.0f);
-            testing::internal::CaptureStdout();
+            DiagnosticsCapture secondCapture;
             ASSERT_TRUE(manager.FillBuffer(out.data(), frames));
-            const std::string printedByMix = testing::internal::GetCapturedStdout();
+            const std::string printedByMix = secondCapture.Finish();
             for (size_t i = 0; i < out.size(); ++i) {
                 ASSERT_EQ(std::bit_cast<uint32_t>(out[i]), std::bit_cast<uint32_t>(expected[i]))
                     << "loop " << loop << " buffer " << buffer << " value " << i;

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "sound/Channel.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/Status.h"
 
 namespace glimmet {
@@ -125,9 +126,9 @@ TEST_P(ChannelFillTest, FillsTheTimeline)
     const FillCase& fill = GetParam();
     auto channel = MakeChannel(Ramp(10), 100);
     Samples buffer(size_t(fill.count), int16_t(-7));
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(channel->FillBuffer(buffer.data(), fill.start, fill.count), fill.result);
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = capture.Finish();
     if (fill.result) {
         EXPECT_EQ(buffer, fill.expected);
         EXPECT_EQ(printed, "");
@@ -146,7 +147,7 @@ TEST_P(ChannelFillTest, ReadForMixDescribesTheSameSamples)
     channel->SetPanPosition(Channel::kPanRight);
     Samples buffer = Zeros(fill.count);
     int calls = 0;
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     const bool result = channel->ReadForMix(fill.start, fill.count, [&](const Channel::MixSource& source) {
         ++calls;
         EXPECT_TRUE(source.muted);
@@ -162,7 +163,7 @@ TEST_P(ChannelFillTest, ReadForMixDescribesTheSameSamples)
         EXPECT_EQ(source.samples + source.length + source.following, data + 10);
         std::copy_n(source.samples, source.length, buffer.begin() + source.offset);
     });
-    const std::string printed = testing::internal::GetCapturedStdout();
+    const std::string printed = capture.Finish();
     EXPECT_EQ(calls, 1);
     EXPECT_EQ(result, fill.result);
     if (fill.result) {
@@ -198,9 +199,9 @@ TEST(ChannelTest, EmptyChannelAtFrameZeroIsTheEndCase)
 {
     Channel channel;
     Samples buffer(4, 3);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_FALSE(channel.FillBuffer(buffer.data(), 0, 4));
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), "what the....?\n");
+    EXPECT_EQ(capture.Finish(), "what the....?\n");
     EXPECT_TRUE(channel.FillBuffer(buffer.data(), 5, 4));
     EXPECT_EQ(buffer, Zeros(4));
 }
@@ -282,9 +283,9 @@ TEST_P(ChannelReplaceTest, Replaces)
     const ReplaceCase& replace = GetParam();
     auto channel = MakeChannel(Ramp(10), 100);
     const Samples frames = Ramp(3, 901);
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     EXPECT_EQ(channel->ReplaceFrames(frames.data(), 3, replace.from, replace.to), replace.expected.status);
-    EXPECT_EQ(testing::internal::GetCapturedStdout(), replace.printed);
+    EXPECT_EQ(capture.Finish(), replace.printed);
     ExpectChannel(*channel, replace.expected);
 }
 

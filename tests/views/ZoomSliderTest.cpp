@@ -4,6 +4,7 @@
 
 #include "ViewFixture.h"
 #include "WaveformReference.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet::test {
@@ -137,13 +138,12 @@ TEST_F(ZoomSliderTest, SettersNotifyOnlyOnChange)
 
 TEST_F(ZoomSliderTest, InvalidValuesArePrintedAndKept)
 {
-    testing::internal::CaptureStdout();
+    DiagnosticsCapture capture;
     slider.SetLowValue(-1, false);
     slider.SetLowValue(9950, false);
     slider.SetHighValue(50, false);
     slider.SetMinRange(20000);
-    std::fflush(stdout);
-    const std::string out = testing::internal::GetCapturedStdout();
+    const std::string out = capture.Finish();
     EXPECT_EQ(out, "ZoomSlider::SetLowValue() - Error: f=-1, l=9999, r=100\n"
                    "ZoomSlider::SetLowValue() - Error: f=9950, l=9999, r=100\n"
                    "ZoomSlider::SetHighValue() - Error: f=0, l=50, r=100\n"
