@@ -8,6 +8,7 @@
 #include <memory>
 #include <vector>
 
+#include "PostedMessages.h"
 #include "app/MenuBuilder.h"
 #include "edit/Action.h"
 #include "edit/DocumentMirror.h"
@@ -20,18 +21,7 @@
 namespace glimmet {
 namespace {
 
-/// Keeps what is posted to it instead of delivering it.
-class PostedMessages : public MessageTarget {
-public:
-    using MessageTarget::PostMessage;
-    status_t PostMessage(const Message& message) override
-    {
-        codes.push_back(message.what);
-        return B_OK;
-    }
-
-    std::vector<uint32_t> codes;
-};
+using test::PostedMessages;
 
 /// An edit that counts its runs and tells when it dies.
 class CountingAction : public Action {

@@ -10,6 +10,7 @@
 #include <memory>
 #include <vector>
 
+#include "PostedMessages.h"
 #include "edit/Action.h"
 #include "edit/HistoryManager.h"
 #include "sound/ChannelManager.h"
@@ -20,17 +21,7 @@
 namespace glimmet {
 namespace {
 
-class PostedMessages : public MessageTarget {
-public:
-    using MessageTarget::PostMessage;
-    status_t PostMessage(const Message& message) override
-    {
-        codes.push_back(message.what);
-        return B_OK;
-    }
-
-    std::vector<uint32_t> codes;
-};
+using test::PostedMessages;
 
 /// An edit that is always ready and changes nothing.
 class MarkAction : public Action {

@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "FakeDocumentWindow.h"
+#include "MixSamples.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "sound/SoftClip.h"
@@ -22,7 +23,9 @@
 namespace glimmet {
 namespace {
 
-using Samples = std::vector<int16_t>;
+using test::Counting;
+using test::Level;
+using test::Samples;
 
 Channel* MakeChannel(const Samples& samples, int64_t first = 0, int8_t pan = 0)
 {
@@ -33,17 +36,6 @@ Channel* MakeChannel(const Samples& samples, int64_t first = 0, int8_t pan = 0)
     channel->SetPanPosition(pan);
     return channel;
 }
-
-// Frame i holds the value i (wrapping), so every frame tells where it came from.
-Samples Counting(int64_t count, int16_t offset = 0)
-{
-    Samples samples = Samples(size_t(count));
-    for (int64_t i = 0; i < count; ++i)
-        samples[size_t(i)] = int16_t(i + offset);
-    return samples;
-}
-
-float Level(int16_t sample) { return float(sample) / 32768.0f; }
 
 struct ManagerFixture : ::testing::Test {
     FakeDocumentWindow window;

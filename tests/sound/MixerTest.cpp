@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "FakeDocumentWindow.h"
+#include "MixSamples.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "sound/Mixer.h"
@@ -17,7 +18,9 @@
 namespace glimmet {
 namespace {
 
-using Samples = std::vector<int16_t>;
+using test::Counting;
+using test::Level;
+using test::Samples;
 
 Channel* MakeChannel(const Samples& samples, int8_t pan = Channel::kPanMiddle)
 {
@@ -26,16 +29,6 @@ Channel* MakeChannel(const Samples& samples, int8_t pan = Channel::kPanMiddle)
     channel->SetPanPosition(pan);
     return channel;
 }
-
-Samples Counting(int64_t count, int16_t offset = 0)
-{
-    Samples samples = Samples(size_t(count));
-    for (int64_t i = 0; i < count; ++i)
-        samples[size_t(i)] = int16_t(i + offset);
-    return samples;
-}
-
-float Level(int16_t sample) { return float(sample) / 32768.0f; }
 
 struct MixerFixture : ::testing::Test {
     FakeDocumentWindow window;
