@@ -9,6 +9,7 @@
 #include <sstream>
 
 #include "app/QuillexWindow.h"
+#include "app/TextControl.h"
 #include "edit/HistoryManager.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
@@ -102,6 +103,19 @@ std::string DocumentStateReport::Json(QuillexWindow& window)
     }
     out << "]}";
     return out.str();
+}
+
+std::string DocumentStateReport::LiveJson(QuillexWindow& window)
+{
+    std::string json = Json(window);
+    json.pop_back();  // the closing brace
+    const QPoint screen = window.mapToGlobal(QPoint(0, 0));
+    std::ostringstream out;
+    out << ", \"screen\": [" << screen.x() << ", " << screen.y() << "]"
+        << ", \"active\": " << Boolean(window.isActiveWindow()) << ", \"playing\": " << Boolean(window.IsPlaying())
+        << ", \"fields\": [" << Quoted(window.RangeStartField()->Text().toStdString()) << ", "
+        << Quoted(window.RangeEndField()->Text().toStdString()) << "]}";
+    return json + out.str();
 }
 
 }  // namespace glimmet

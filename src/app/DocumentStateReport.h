@@ -21,6 +21,10 @@ class DocumentStateReport {
 public:
     /// Reads the window under the document lock; no trailing newline.
     static std::string Json(QuillexWindow& window);
+    /// Json, followed by what only a window on a screen has:
+    ///   "screen": [X, Y] (the window's top left on the screen),
+    ///   "active": B, "playing": B, "fields": [START TEXT, END TEXT].
+    static std::string LiveJson(QuillexWindow& window);
     /// text as a JSON string literal, quotes included.
     static std::string Quoted(const std::string& text);
 };

@@ -18,6 +18,9 @@ namespace {
 // What travels over the socket: this header, then each path in UTF-8
 // followed by a zero byte. Changed whenever the format changes.
 const QByteArray kHeader = QByteArrayLiteral("glimmet-open-1\n");
+// A request for the windows' state: this line alone, answered before the
+// server disconnects.
+const QByteArray kStateRequest = QByteArrayLiteral("glimmet-state-1\n");
 // More than any command line can carry; a longer message is not ours.
 constexpr qint64 kMaxMessageBytes = 16 * 1024 * 1024;
 
@@ -86,10 +89,32 @@ bool InstanceServer::ForwardToRunningInstance(const QString& name, const QString
     return true;
 }
 
+bool InstanceServer::QueryState(const QString& name, std::string* state, int timeoutMs)
+{
+    QLocalSocket socket;
+    socket.connectToServer(name);
+    if (!socket.waitForConnected(timeoutMs))
+        return false;
+    socket.write(kStateRequest);
+    if (!socket.waitForBytesWritten(timeoutMs))
+        return false;
+    QByteArray answer;
+    while (socket.state() == QLocalSocket::ConnectedState && socket.waitForReadyRead(timeoutMs))
+        answer += socket.readAll();
+    answer += socket.readAll();
+    *state = answer.toStdString();
+    return true;
+}
+
 void InstanceServer::Accept()
 {
     while (QLocalSocket* socket = server_->nextPendingConnection()) {
         socket->setReadBufferSize(kMaxMessageBytes);
+        // A state request waits for its answer instead of disconnecting.
+        connect(socket, &QLocalSocket::readyRead, this, [this, socket] {
+            if (socket->bytesAvailable() >= kStateRequest.size() && socket->peek(kStateRequest.size()) == kStateRequest)
+                AnswerStateRequest(socket);
+        });
         // The sender disconnects once everything is written.
         connect(socket, &QLocalSocket::disconnected, this, [this, socket] { Deliver(socket); });
         if (socket->state() == QLocalSocket::UnconnectedState)
@@ -97,10 +122,24 @@ void InstanceServer::Accept()
     }
 }
 
-void InstanceServer::Deliver(QLocalSocket* socket)
+void InstanceServer::AnswerStateRequest(QLocalSocket* socket)
 {
     if (socket->property("delivered").toBool())
         return;
+    socket->setProperty("delivered", true);
+    socket->readAll();
+    const std::string state = stateReporter_ ? stateReporter_() : std::string();
+    socket->write(state.data(), qint64(state.size()));
+    // The socket goes once the answer is out and the line is down.
+    socket->disconnectFromServer();
+}
+
+void InstanceServer::Deliver(QLocalSocket* socket)
+{
+    if (socket->property("delivered").toBool()) {
+        socket->deleteLater();
+        return;
+    }
     socket->setProperty("delivered", true);
     const QByteArray data = socket->read(kMaxMessageBytes);
     socket->deleteLater();

@@ -4,16 +4,22 @@
 
 #include <SDL.h>
 
+#include <cstdio>
 #include <filesystem>
+#include <string>
 #include <string_view>
 
 #include "app/BatchRunner.h"
+#include "app/DocumentStateReport.h"
 #include "app/InstanceServer.h"
 #include "app/Quillex.h"
+#include "app/QuillexWindow.h"
 
 using glimmet::BatchRunner;
 using glimmet::InstanceServer;
+using glimmet::DocumentStateReport;
 using glimmet::Quillex;
+using glimmet::QuillexWindow;
 
 namespace {
 
@@ -30,6 +36,29 @@ QStringList ResolvedFiles(const QStringList& arguments)
     return files;
 }
 
+/// One line of JSON per window, in the order of the window list.
+std::string StateOfEveryWindow(Quillex& application)
+{
+    std::string lines;
+    for (int32_t i = 0; i < application.CountWindows(); ++i) {
+        if (QuillexWindow* window = application.WindowAt(i))
+            lines += DocumentStateReport::LiveJson(*window) + "\n";
+    }
+    return lines;
+}
+
+int PrintRunningState(int argc, char** argv)
+{
+    QCoreApplication core(argc, argv);
+    std::string state;
+    if (!InstanceServer::QueryState(InstanceServer::DefaultName(), &state)) {
+        std::fprintf(stderr, "no running editor answered\n");
+        return 1;
+    }
+    std::fputs(state.c_str(), stdout);
+    return 0;
+}
+
 }  // namespace
 
 int main(int argc, char** argv)
@@ -41,6 +70,9 @@ int main(int argc, char** argv)
     // to a running editor.
     if (argc >= 2 && std::string_view(argv[1]) == "--batch")
         return BatchRunner::Main(argc, argv);
+    // A script asks the running editor what its windows show.
+    if (argc == 2 && std::string_view(argv[1]) == "--state")
+        return PrintRunningState(argc, argv);
     QApplication toolkit(argc, argv);
     QApplication::setApplicationName(QStringLiteral("Glimmet"));
     QApplication::setDesktopFileName(QStringLiteral("glimmet"));
@@ -54,5 +86,6 @@ int main(int argc, char** argv)
 
     Quillex application;
     InstanceServer server(instanceName, &application);
+    server.SetStateReporter([&application] { return StateOfEveryWindow(application); });
     return application.Run(arguments);
 }
