@@ -58,8 +58,7 @@ await_file gui.wav
 cp gui.wav gui-first.wav
 
 # One more edit, so that closing asks about saving.
-xdotool windowactivate --sync "$window" 2>/dev/null || xdotool windowfocus --sync "$window"
-expect_state '.active' true "the window is active after saving"
+reactivate
 xdotool key ctrl+i
 expect_state '.undo' "Fade In" "Ctrl+I"
 

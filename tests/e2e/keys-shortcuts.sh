@@ -22,15 +22,16 @@ note "range $start..$end, cursor $cursor"
 {
     printf 'open %s\nrange %s %s\nselect 0 1\nfocus 0\ncursor %s\n' "$PWD/in.wav" "$start" "$end" "$cursor"
     printf 'fdin\nprint\nmaxi\nprint\nundo\nprint\nredo\nprint\nCOPY\nCCUT\nprint\nPSTE\nprint\n'
-    printf 'zora\nprint\nshal\nprint\nfdot\nprint\nSALL\nprint\nsaveas %s\nprint\n' "$PWD/batch.wav"
-    printf 'append %s\nprint\nsave\nprint\n' "$PWD/in.wav"
-} | batch | jq -c '[.frames, .range, .display, .undo, .redo, .saved]' >expected.txt
+    printf 'zora\nprint\nshal\nprint\nfdot\nprint\nSALL\nprint\nsaveas %s\nprint\n' "$PWD/batch-first.wav"
+    # Ctrl+S is done as another Save As, keeping the first file.
+    printf 'fdin\nsaveas %s\nprint\nappend %s\nprint\n' "$PWD/batch.wav" "$PWD/in.wav"
+} | batch | jq -c '[.frames, (.channels | length), .range, .display, .undo, .redo, .saved]' >expected.txt
 [ "$(wc -l <expected.txt)" = 13 ] || fail "the batch mode printed $(wc -l <expected.txt) states"
 step=0
 # Compares the window's state with the batch mode's next one.
 expect_step() {
     step=$((step + 1))
-    expect_state '[.frames, .range, .display, .undo, .redo, .saved]' "$(sed -n "${step}p" expected.txt)" "$1"
+    expect_state '[.frames, (.channels | length), .range, .display, .undo, .redo, .saved]' "$(sed -n "${step}p" expected.txt)" "$1"
 }
 
 note "Ctrl+I, Ctrl+M, Ctrl+Z, Ctrl+Shift+Z"
@@ -66,20 +67,25 @@ xdotool key ctrl+shift+s
 choose_in_panel "Save As" "$PWD/gui.wav"
 await_file gui.wav
 expect_state '.title' "Glimmet - gui.wav" "the window takes the saved file's name"
+reactivate
 expect_step "Save As"
-cmp gui.wav batch.wav || fail "the file saved through Ctrl+Shift+S differs from the batch mode's"
+cmp gui.wav batch-first.wav || fail "the file saved through Ctrl+Shift+S differs from the batch mode's"
 cmp -s gui.wav in.wav && fail "the edits changed nothing"
 
-note "Ctrl+Shift+O appends, Ctrl+S saves"
-xdotool key ctrl+shift+o
-choose_in_panel "Open" "$PWD/in.wav"
-expect_step "Ctrl+Shift+O appends the file chosen"
-before=$(stat -c %Y.%s gui.wav)
+note "Ctrl+S saves a further edit"
 cp gui.wav gui-before.wav
+xdotool key ctrl+i
+settle 0.2
 xdotool key ctrl+s
-expect_step "Ctrl+S saves"
+expect_step "Ctrl+I, then Ctrl+S"
 cmp gui.wav batch.wav || fail "the file saved through Ctrl+S differs from the batch mode's"
 cmp -s gui.wav gui-before.wav && fail "Ctrl+S wrote nothing new"
+
+note "Ctrl+Shift+O appends the channels of the file chosen"
+xdotool key ctrl+shift+o
+choose_in_panel "Open" "$PWD/in.wav"
+expect_step "Ctrl+Shift+O appends in.wav"
+reactivate
 
 note "Ctrl+N opens a window, Ctrl+H changes nothing, Ctrl+W closes, Ctrl+Q quits"
 xdotool key ctrl+n
@@ -103,3 +109,4 @@ expect_state '.active' true "the second new window is active" 1
 xdotool key ctrl+q
 await_exit "Ctrl+Q quits with two windows open"
 cmp gui.wav batch.wav || fail "quitting changed the saved file"
+cmp -s gui.wav gui-before.wav && fail "quitting undid the save"

@@ -19,12 +19,10 @@ choose_in_panel "Open" "$PWD/b.wav"
 expect_state '[.title, .frames]' '["Glimmet - b.wav",44100]' "b.wav opens into the second window" 1
 
 note "both play"
-xdotool windowactivate --sync "$first" 2>/dev/null || true
-expect_state '.active' true "the first window is active again" 0
+reactivate 0 "$first"
 xdotool key ctrl+space
 expect_state '.playing' true "the first window plays" 0
-xdotool windowactivate --sync "$second" 2>/dev/null || true
-expect_state '.active' true "the second window is active again" 1
+reactivate 1 "$second"
 xdotool key ctrl+space
 expect_state '.playing' true "the second window plays" 1
 expect_state '.playing' true "the first window plays on" 0

@@ -135,7 +135,7 @@ expect_no_log() {
 type_range_field() {
     field_click "$1"
     xdotool key ctrl+a
-    xdotool type --delay 5 "$2"
+    xdotool type --delay 5 -- "$2"
     xdotool key Return
 }
 
@@ -151,4 +151,23 @@ field_click() {
         click_at $((wx + w - 10)) $((wy + 35))
     fi
     sleep 0.2
+}
+
+# The white boxes (the range fields) crossing row $2 of screenshot $1, one
+# "LEFT RIGHT" line each, in screen pixels.
+white_runs() {
+    convert "$1" -crop "1024x1+0+$2" +repage -depth 8 txt:- | awk -F'[,: ]+' '
+        /^[0-9]/ {
+            white = ($0 ~ /#FFFFFF/)
+            if (white && start < 0) start = $1
+            if (!white && start >= 0) { if ($1 - start >= 15) print start, $1 - 1; start = -1 }
+        }
+        BEGIN { start = -1 }'
+}
+
+# Brings document window $1 (default 0; its X id in $2, default $window)
+# back to the front after a panel closed, and waits until it is active.
+reactivate() {
+    xdotool windowactivate --sync "${2:-$window}" 2>/dev/null || xdotool windowfocus --sync "${2:-$window}"
+    expect_state '.active' true "window ${1:-0} is active again" "${1:-0}"
 }
