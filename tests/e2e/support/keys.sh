@@ -112,6 +112,14 @@ choose_in_panel() {
     xdotool windowactivate --sync "$panel" 2>/dev/null || xdotool windowfocus --sync "$panel"
     sleep 0.3
     xdotool type --delay 5 "$2"
+    if [ -e "$2" ]; then
+        # A name that exists opens the name field's completion list, which
+        # would outlive the panel and keep the window from becoming active;
+        # Escape closes the list first.
+        sleep 0.4
+        xdotool key Escape
+        sleep 0.1
+    fi
     xdotool key Return
 }
 
