@@ -110,3 +110,4 @@ xdotool key ctrl+q
 await_exit "Ctrl+Q quits with two windows open"
 cmp gui.wav batch.wav || fail "quitting changed the saved file"
 cmp -s gui.wav gui-before.wav && fail "quitting undid the save"
+note "every shortcut did what its item does"
