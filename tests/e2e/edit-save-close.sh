@@ -80,12 +80,7 @@ expect_state '.range' "[$range_start,$range_end]" "the range fields tell the ran
 screenshot 06-before-close.png
 
 xdotool key ctrl+w
-for _ in $(seq 50); do
-    [ "$(xdotool getactivewindow 2>/dev/null)" != "$window" ] && break
-    sleep 0.1
-done
-[ "$(xdotool getactivewindow 2>/dev/null)" != "$window" ] || fail "closing did not ask \"Save changes?\""
-sleep 0.3
+await_alert "the edited window"
 screenshot 07-save-changes.png
 # The default button is "Don't quit!"; "Yes, please." is the one before it.
 xdotool key shift+Tab space

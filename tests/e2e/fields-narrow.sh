@@ -10,7 +10,7 @@ launch in.wav
 focus_channel 0 0.5
 
 xdotool key ctrl+a
-expect_state '.fields' '["0","132299"]' "Ctrl+A puts the whole range into the fields"
+expect_state '[.range, .fields]' '[[0,132299],["0","132299"]]' "Ctrl+A selects all and puts the range into the fields"
 
 note "the window at its narrowest"
 xdotool windowsize --sync "$window" 50 301 2>/dev/null || xdotool windowsize "$window" 50 301

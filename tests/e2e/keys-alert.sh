@@ -16,12 +16,7 @@ edit_and_close() {
     xdotool key ctrl+a ctrl+i
     expect_state '[.undo, .saved]' '["Fade In",false]' "Ctrl+A Ctrl+I fades $1 in"
     xdotool key ctrl+w
-    for _ in $(seq 50); do
-        [ "$(xdotool getactivewindow 2>/dev/null)" != "$window" ] && break
-        sleep 0.1
-    done
-    [ "$(xdotool getactivewindow 2>/dev/null)" != "$window" ] || fail "closing $1 did not ask \"Save changes?\""
-    sleep 0.3
+    await_alert "$1"
 }
 
 note "Yes, please."

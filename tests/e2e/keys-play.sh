@@ -6,9 +6,7 @@
 . "$(dirname "$0")/support/keys.sh"
 e2e_begin "$@"
 
-make_stereo in.wav
-launch in.wav
-read -r wx wy <<<"$(window_box)"
+launch_stereo
 
 note "Space starts and stops playing"
 focus_channel 0 0.5

@@ -6,9 +6,7 @@
 . "$(dirname "$0")/support/keys.sh"
 e2e_begin "$@"
 
-make_stereo in.wav
-launch in.wav
-read -r wx wy <<<"$(window_box)"
+launch_stereo
 read -r vx vy vw vh <<<"$(state_field '.channels[0].view | @tsv')"
 read -r _ v1y _ _ <<<"$(state_field '.channels[1].view | @tsv')"
 eval "$(xdotool getwindowgeometry --shell "$window")"

@@ -179,3 +179,22 @@ reactivate() {
     xdotool windowactivate --sync "${2:-$window}" 2>/dev/null || xdotool windowfocus --sync "${2:-$window}"
     expect_state '.active' true "window ${1:-0} is active again" "${1:-0}"
 }
+
+# Waits for "Save changes?" to take the focus from window $window after a
+# close was asked for ($1 says which).
+await_alert() {
+    for _ in $(seq 50); do
+        [ "$(xdotool getactivewindow 2>/dev/null)" != "$window" ] && break
+        sleep 0.1
+    done
+    [ "$(xdotool getactivewindow 2>/dev/null)" != "$window" ] || fail "closing $1 did not ask \"Save changes?\""
+    sleep 0.3
+}
+
+# Opens a new stereo in.wav in the editor; sets wx, wy to the window's
+# origin on the screen.
+launch_stereo() {
+    make_stereo in.wav
+    launch in.wav
+    read -r wx wy <<<"$(window_box)"
+}
