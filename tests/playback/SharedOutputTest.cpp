@@ -24,14 +24,6 @@ using test::FakePlaybackWindow;
 constexpr int64_t kLength = 20000;
 constexpr size_t kPeriodFloats = 2 * test::kBufferFrames;
 
-int CountOccurrences(const std::string& text, const std::string& what)
-{
-    int count = 0;
-    for (size_t at = text.find(what); at != std::string::npos; at = text.find(what, at + 1))
-        count++;
-    return count;
-}
-
 std::vector<ChannelRecipe> RandomDocument(unsigned seed)
 {
     std::mt19937 random(seed);
@@ -75,6 +67,13 @@ struct Player {
         return graph->StartNodes();
     }
 
+    /// Stops and tears down, as a closing window does.
+    void Close()
+    {
+        graph->StopNodes();
+        graph->TearDownNodes();
+    }
+
     int64_t BuffersSent() const { return graph->Producer()->FramesSent() / test::kBufferFrames; }
 
     /// Runs the event loop until the producer has sent count buffers more.
@@ -89,6 +88,26 @@ struct Player {
     std::unique_ptr<ChannelManager> manager;
     std::unique_ptr<PlaybackGraph> graph;
 };
+
+/// Sets up both windows, collecting what they print; true when both
+/// succeed.
+bool SetUpBoth(Player& first, Player& second, std::string* printed = nullptr)
+{
+    const status_t firstStatus = first.SetUp(printed);
+    const status_t secondStatus = second.SetUp(printed);
+    return firstStatus == B_OK && secondStatus == B_OK;
+}
+
+/// Starts both windows, lets each send the given buffers, then closes
+/// both; true when both started and were heard.
+bool PlayBothAndClose(Player& first, Player& second, int64_t buffers)
+{
+    const bool started = first.Start() == B_OK && second.Start() == B_OK;
+    const bool heard = started && first.WaitForBuffers(buffers) && second.WaitForBuffers(buffers);
+    first.Close();
+    second.Close();
+    return heard;
+}
 
 /// How each period of one window's playback was heard in the device output.
 struct Heard {
@@ -151,8 +170,7 @@ TEST_F(SharedOutputTest, TwoWindowsSetUpAtOnceAndTheirSumIsHeard)
 {
     Player first(RandomDocument(5));
     Player second(ConstantDocument(1000));
-    ASSERT_EQ(first.SetUp(), B_OK);
-    ASSERT_EQ(second.SetUp(), B_OK);
+    ASSERT_TRUE(SetUpBoth(first, second));
     EXPECT_NE(first.graph->Device(), 0u);
     EXPECT_EQ(second.graph->Device(), first.graph->Device());
     EXPECT_EQ(second.graph->DriverName(), "disk");
@@ -184,16 +202,8 @@ TEST_F(SharedOutputTest, ASumBeyondFullScaleIsClipped)
 {
     Player first(ConstantDocument(30000));
     Player second(ConstantDocument(20000));
-    ASSERT_EQ(first.SetUp(), B_OK);
-    ASSERT_EQ(second.SetUp(), B_OK);
-    ASSERT_EQ(first.Start(), B_OK);
-    ASSERT_EQ(second.Start(), B_OK);
-    ASSERT_TRUE(first.WaitForBuffers(6));
-    ASSERT_TRUE(second.WaitForBuffers(6));
-    first.graph->StopNodes();
-    second.graph->StopNodes();
-    first.graph->TearDownNodes();
-    second.graph->TearDownNodes();
+    ASSERT_TRUE(SetUpBoth(first, second));
+    ASSERT_TRUE(PlayBothAndClose(first, second, 6));
 
     int64_t clipped = 0;
     int64_t other = 0;
@@ -211,8 +221,7 @@ TEST_F(SharedOutputTest, AWindowThatStopsFallsSilentWhileTheOtherPlaysOn)
 {
     Player first(RandomDocument(9));
     Player second(ConstantDocument(1500));
-    ASSERT_EQ(first.SetUp(), B_OK);
-    ASSERT_EQ(second.SetUp(), B_OK);
+    ASSERT_TRUE(SetUpBoth(first, second));
     // The first window is heard first, so that its buffers mark the start.
     ASSERT_EQ(first.Start(), B_OK);
     ASSERT_TRUE(first.WaitForBuffers(1));
@@ -282,8 +291,7 @@ TEST_F(SharedOutputTest, TheDeviceLivesFromTheFirstSetupToTheLastTearDown)
     EXPECT_EQ(third.graph->DriverName(), "disk");
     ASSERT_EQ(third.Start(), B_OK);
     ASSERT_TRUE(third.WaitForBuffers(3));
-    third.graph->StopNodes();
-    third.graph->TearDownNodes();
+    third.Close();
 }
 
 TEST_F(SharedOutputTest, TwoControllersSetUpWithoutAnError)
@@ -309,40 +317,33 @@ TEST_F(SharedOutputTest, TwoControllersSetUpWithoutAnError)
     first.window.ProcessPending();
 }
 
-TEST_F(SharedOutputTest, TwoWindowsFallBackToTheDummyDriverWithOneLine)
+/// Two windows set up after the configured driver failed them: the first
+/// falls back to the dummy driver, saying so once, and the second plays
+/// through the same device.
+void ExpectOneFallbackForTwoWindows()
 {
-    setenv("SDL_AUDIODRIVER", "no-such-driver", 1);
     Player first(RandomDocument(1));
     Player second(RandomDocument(2));
     std::string printed;
-    ASSERT_EQ(first.SetUp(&printed), B_OK);
-    ASSERT_EQ(second.SetUp(&printed), B_OK);
+    ASSERT_TRUE(SetUpBoth(first, second, &printed));
     EXPECT_EQ(first.graph->DriverName(), "dummy");
     EXPECT_EQ(second.graph->DriverName(), "dummy");
-    EXPECT_EQ(CountOccurrences(printed, "); playing through SDL's dummy driver\n"), 1) << printed;
-    ASSERT_EQ(first.Start(), B_OK);
-    ASSERT_EQ(second.Start(), B_OK);
-    ASSERT_TRUE(first.WaitForBuffers(2));
-    ASSERT_TRUE(second.WaitForBuffers(2));
-    first.graph->StopNodes();
-    second.graph->StopNodes();
-    first.graph->TearDownNodes();
-    second.graph->TearDownNodes();
+    EXPECT_EQ(second.graph->Device(), first.graph->Device());
+    EXPECT_EQ(test::CountOccurrences(printed, "No sound device could be opened ("), 1) << printed;
+    EXPECT_EQ(test::CountOccurrences(printed, "); playing through SDL's dummy driver\n"), 1) << printed;
+    EXPECT_TRUE(PlayBothAndClose(first, second, 2));
 }
 
-TEST_F(SharedOutputTest, ADeviceThatCannotBeOpenedFallsBackOnceForTwoWindows)
+TEST_F(SharedOutputTest, TwoWindowsWithoutTheConfiguredDriverFallBackOnce)
+{
+    setenv("SDL_AUDIODRIVER", "no-such-driver", 1);
+    ExpectOneFallbackForTwoWindows();
+}
+
+TEST_F(SharedOutputTest, TwoWindowsWhoseDeviceCannotBeOpenedFallBackOnce)
 {
     setenv("SDL_DISKAUDIOFILE", "/nonexistent-folder/output.raw", 1);
-    Player first(RandomDocument(1));
-    Player second(RandomDocument(2));
-    std::string printed;
-    ASSERT_EQ(first.SetUp(&printed), B_OK);
-    ASSERT_EQ(second.SetUp(&printed), B_OK);
-    EXPECT_EQ(second.graph->DriverName(), "dummy");
-    EXPECT_EQ(second.graph->Device(), first.graph->Device());
-    EXPECT_EQ(CountOccurrences(printed, "No sound device could be opened ("), 1) << printed;
-    first.graph->TearDownNodes();
-    second.graph->TearDownNodes();
+    ExpectOneFallbackForTwoWindows();
 }
 
 TEST_F(SharedOutputTest, AnotherFormatIsRefusedWhileTheDeviceIsOpen)
