@@ -25,7 +25,8 @@ unsigned long Hex(status_t status)
 
 }  // namespace
 
-PlaybackGraph::PlaybackGraph(ChannelManager* manager, MessageTarget* window) : manager_(manager), window_(window), output_(&SharedOutput::Instance())
+PlaybackGraph::PlaybackGraph(ChannelManager* manager, MessageTarget* window)
+    : manager_(manager), window_(window), output_(&SharedOutput::Instance())
 {
 }
 

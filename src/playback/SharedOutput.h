@@ -23,7 +23,7 @@ class DeviceTimeSource;
 /// A graph joins with its negotiated format: the first place opens the
 /// device in that format, and the last one to leave closes it; a later
 /// window opens it again. A format that differs from the open device's in
-/// rate, channels or buffer size is refused with a diagnostic (status
+/// rate, channels, sample format or buffer size is refused with a diagnostic (status
 /// B_MEDIA_ALREADY_CONNECTED) rather than converted: every producer
 /// negotiates the same format today, so a mismatch is a fault worth hearing
 /// about, not something to resample around.
@@ -33,14 +33,15 @@ class DeviceTimeSource;
 /// source, exactly as when it had a device of its own. The buffers are then
 /// added in attachment order and the sum hard-clipped to [-1, 1]. A lone
 /// producer's samples are copied unchanged, and the clip leaves in-range
-/// samples alone, so one window sounds bit for bit as it did alone.
+/// samples alone, so a window playing by itself sounds bit for bit as it
+/// did with a device of its own.
 ///
 /// Thread use: Join, Attach, Detach and Leave run on window threads and are
 /// serialized by a mutex of our own. The producer list is changed only
 /// while SDL's device lock is held as well, which is also held around every
-/// callback: the audio thread reads it without a lock of ours, never
-/// allocates and never waits on anything but that device lock. Once Detach
-/// returns, the producer is served no more.
+/// callback: the audio thread reads it without taking a lock of ours, and
+/// neither allocates nor posts anything itself. Once Detach returns, the
+/// producer is served no more.
 class SharedOutput {
 public:
     /// The longest period SDL can be asked for, and the most channels.
