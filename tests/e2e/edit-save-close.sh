@@ -66,7 +66,8 @@ expect_state '.undo' "Fade In" "Ctrl+I"
 # the end field's text (the primary selection); Shift+Tab moves to the start
 # field, selecting its text, which Ctrl+C copies.
 read -r wx wy <<<"$(window_box)"
-xdotool mousemove --sync $((wx + WIDTH - 40)) $((wy + 35)) click --repeat 3 1
+pointer_to $((wx + WIDTH - 40)) $((wy + 35))
+xdotool click --repeat 3 1
 sleep 0.3
 range_end=$(xclip -o -selection primary)
 xdotool key shift+Tab

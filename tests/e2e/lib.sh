@@ -197,15 +197,27 @@ await_pixel() {
 
 # --- Input -----------------------------------------------------------------
 
+# Moves the pointer to ($1, $2) and waits until it is there. A move to
+# where the pointer already is would make `xdotool mousemove --sync` wait
+# for a motion that never comes.
+pointer_to() {
+    local X Y SCREEN WINDOW
+    eval "$(xdotool getmouselocation --shell)"
+    [ "$X" = "$1" ] && [ "$Y" = "$2" ] && return 0
+    xdotool mousemove --sync "$1" "$2"
+}
+
 # Presses button $3 (default 1) at ($1, $2) and releases it there.
 click_at() {
-    xdotool mousemove --sync "$1" "$2" click "${3:-1}"
+    pointer_to "$1" "$2"
+    xdotool click "${3:-1}"
 }
 
 # Drags with button $5 (default 1) from ($1, $2) to ($3, $4) in eight steps.
 drag() {
     local button=${5:-1}
-    xdotool mousemove --sync "$1" "$2" mousedown "$button"
+    pointer_to "$1" "$2"
+    xdotool mousedown "$button"
     for step in 1 2 3 4 5 6 7 8; do
         xdotool mousemove $(($1 + ($3 - $1) * step / 8)) $(($2 + ($4 - $2) * step / 8))
         sleep 0.04

@@ -53,7 +53,7 @@ drag_range() {
 menu_open_at() {
     local wx wy
     read -r wx wy <<<"$(window_box "${3:-0}")"
-    xdotool mousemove --sync $((wx + 20)) $((wy + 8)) click 1
+    click_at $((wx + 20)) $((wy + 8))
     sleep 0.3
     # A clicked menu has no item marked yet; moving to the next menu marks
     # that menu's first item.
