@@ -1,0 +1,250 @@
+# Helpers of the mouse cases (mouse-*.sh), sourced after lib.sh.
+#
+# A mouse script is a list of cases run one after the other in the same
+# window; each case is a shell function run by run_case in a subshell, so
+# that one failing case is reported and the others still run. Cases start
+# from a state they set up themselves or that the case before left.
+#
+# Every program started costs time on a loaded machine, so the window's
+# layout is read once (load_layout) and places are computed from it in the
+# shell.
+
+MOUSE_FAILED=""
+MOUSE_STARTED=$(date +%s%N)
+
+# Tenths of a second since $1 (from date +%s%N), as "S.T s".
+since() {
+    local tenths=$((($(date +%s%N) - $1) / 100000000))
+    echo "$((tenths / 10)).$((tenths % 10)) s"
+}
+
+# Runs case function $1 (named $1 in the report) with `set -e` in effect.
+run_case() {
+    local status=0 started
+    started=$(date +%s%N)
+    note "case $1"
+    set +e
+    (
+        set -e
+        "$1"
+    )
+    status=$?
+    set -e
+    if [ "$status" = 0 ]; then
+        note "case $1: ok ($(since "$started"))"
+    else
+        note "case $1: FAILED ($(since "$started"))"
+        MOUSE_FAILED="$MOUSE_FAILED $1"
+    fi
+}
+
+# Ends the script: fails when a case did, with the names of those cases.
+finish_cases() {
+    note "$(basename "$0"): $(since "$MOUSE_STARTED")"
+    [ -z "$MOUSE_FAILED" ] || {
+        echo "FAIL: cases failed:$MOUSE_FAILED" >&2
+        exit 1
+    }
+}
+
+# Like lib.sh's expect_state, bounded by the clock rather than by a number
+# of tries (each try starts programs, slow on a loaded machine): waits up to
+# $4 seconds (default 5) for `state_field EXPR` to print EXPECTED.
+#   expect_soon EXPR EXPECTED WHAT [SECONDS]
+expect_soon() {
+    local got="" deadline=$(($(date +%s%N) + ${4:-5} * 1000000000))
+    while :; do
+        got=$(state_field "$1" 2>/dev/null || true)
+        [ "$got" = "$2" ] && return 0
+        [ "$(date +%s%N)" -lt "$deadline" ] || break
+        sleep 0.1
+    done
+    fail "$3: $1 is '$got', expected '$2'"
+}
+
+# --- Test files ------------------------------------------------------------
+
+# The width in pixels of a sample view in a new window, as the batch mode
+# lays it out (the same layout as a real window's).
+view_width() {
+    sox -r 44100 -n -r 44100 -c 1 -b 16 layout.wav synth 0.1 sine 300
+    printf 'open %s\nprint\n' "$E2E_WORK/layout.wav" | QT_QPA_PLATFORM=offscreen "$GLIMMET" --batch - 2>/dev/null \
+        | grep '^{' | jq -r '.channels[0].view[2]'
+}
+
+# A file of $3 channels holding exactly $2 frames per column of a $4 pixel
+# wide view, so that every column starts on a whole frame and the frames
+# under a pixel are easy to check by hand: column c holds the frames
+# $2 * c .. $2 * c + $2 - 1. Tones at half scale: the top and bottom rows of
+# every data column stay empty.
+make_columns_file() {
+    local file=$1 per_column=$2 channels=$3 width=$4
+    local tones="sine 300 sine 500"
+    [ "$channels" = 1 ] && tones="sine 400"
+    # The rate is given for the generated input too, or it is made at
+    # another rate and resampled to a different length.
+    sox -r 44100 -n -r 44100 -c "$channels" -b 16 "$file" synth "$((per_column * width))s" $tones vol 0.5
+}
+
+# --- The layout and the frames under the pointer ----------------------------
+
+# The interpreter itself rather than a launcher in front of it, which may
+# take longer to start than the step it runs.
+MOUSE_PYTHON=$(python3 -c 'import sys; print(sys.executable)')
+
+# Reads where the window's sample views are on the screen (VIEW_X, VIEW_Y,
+# VIEW_W, VIEW_H, one entry per channel), the view width and the displayed
+# frames (MAP_WIDTH, MAP_FIRST, MAP_LAST, for frame_map). Run again when
+# channels come or go or the display changes.
+load_layout() {
+    local line
+    line=$(state | sed -n 1p)
+    read -r MAP_WIDTH MAP_FIRST MAP_LAST <<<"$(jq -r '[.channels[0].view[2], .display[0], .display[1]] | @tsv' <<<"$line")"
+    VIEW_X=() VIEW_Y=() VIEW_W=() VIEW_H=()
+    while read -r x y w h; do
+        VIEW_X+=("$x") VIEW_Y+=("$y") VIEW_W+=("$w") VIEW_H+=("$h")
+    done < <(jq -r '.screen as $s | .channels[] | [$s[0] + .view[0], $s[1] + .view[1], .view[2], .view[3]] | @tsv' <<<"$line")
+}
+
+# The screen position of column $2 of channel $1's view, in row $3 (default
+# half way down), as "X Y".
+spot() {
+    echo "$((VIEW_X[$1] + $2)) $((VIEW_Y[$1] + ${3:-$((VIEW_H[$1] / 2))}))"
+}
+
+# What FrameMapping gives for the layout read by load_layout, in single
+# precision as it computes, for pairs of a question and a value:
+#   frame_map first|last|frame COLUMN ... | pos FRAME ...
+# "first", "last" and "frame" take a column (x in the mapping's
+# coordinates), "pos" a frame. The answers are printed comma separated.
+# Sample views map clicks at their own x; a drag is mapped at the view's
+# x + 2 (container coordinates plus one), a channel move at x + 1
+# (container coordinates).
+frame_map() {
+    "$MOUSE_PYTHON" - "$MAP_WIDTH" "$MAP_FIRST" "$MAP_LAST" "$@" <<'EOF'
+import math, struct, sys
+width, first, last = (int(v) for v in sys.argv[1:4])
+def f32(x):
+    return struct.unpack('f', struct.pack('f', x))[0]
+# The container's width: the view plus its one-pixel frame on both sides,
+# less one (edges are inclusive).
+mapping_width = f32(width + 1)
+per_column = f32(f32(last - first + 1) / f32(mapping_width - 1.0))
+def first_at(x):
+    return math.trunc(f32(f32(x) * per_column)) + first
+def last_at(x):
+    return math.trunc(f32(f32(f32(x) + 1.0) * per_column)) + first - 1
+def pos_at(frame):
+    quotient = (frame - first) * f32(mapping_width - 1.0) / (last - first)
+    return int(math.ceil(f32(quotient)) - 1)
+answers = {
+    'first': first_at,
+    'last': last_at,
+    'frame': lambda x: (first_at(x) + last_at(x)) // 2,
+    'pos': pos_at,
+}
+pairs = sys.argv[4:]
+print(','.join(str(answers[pairs[i]](int(pairs[i + 1]))) for i in range(0, len(pairs), 2)))
+EOF
+}
+
+# --- Input -----------------------------------------------------------------
+
+# Moves the pointer out of the window and waits out the double-click
+# interval (400 ms), so that the next press in a view is a click of its
+# own. Moving away also keeps the next `mousemove --sync` from waiting for a
+# motion that never comes when the pointer is already where it is sent.
+pause_clicks() {
+    xdotool mousemove 0 0
+    sleep 0.5
+}
+
+# Clicks column $2 of channel $1 (half way down) after a pause.
+click_column() {
+    pause_clicks
+    click_at $(spot "$1" "$2")
+}
+
+# Two presses of button 1 120 ms apart in column $2 of channel $1, the
+# second $3 pixels right of the first (default 0, the same spot).
+double_click_column() {
+    local x y apart=${3:-0}
+    pause_clicks
+    read -r x y <<<"$(spot "$1" "$2")"
+    if [ "$apart" = 0 ]; then
+        xdotool mousemove --sync "$x" "$y" click --repeat 2 --delay 120 1
+    else
+        xdotool mousemove --sync "$x" "$y" click 1 sleep 0.12 mousemove "$((x + apart))" "$y" click 1
+    fi
+}
+
+# Drags with button $5 (default 1) from column $2 of channel $1 to screen
+# ($3, $4), holding key $6 (e.g. ctrl; default none) from before the press
+# to after the release.
+drag_from() {
+    local x y key=${6:-}
+    pause_clicks
+    read -r x y <<<"$(spot "$1" "$2")"
+    [ -z "$key" ] || xdotool keydown "$key"
+    drag "$x" "$y" "$3" "$4" "${5:-1}"
+    [ -z "$key" ] || xdotool keyup "$key"
+}
+
+# --- Pixels ----------------------------------------------------------------
+
+# A screenshot without the time it was taken, so that two of the same
+# screen are the same file.
+bare_screenshot() {
+    import -window root -define png:exclude-chunk=date,time "$1"
+}
+
+# Takes screenshot $1 until two in a row are the same (the window has
+# drawn what it was asked to), for up to about three seconds.
+settled_screenshot() {
+    bare_screenshot "$1"
+    for _ in $(seq 12); do
+        sleep 0.1
+        bare_screenshot "$1.next.png"
+        if cmp -s "$1" "$1.next.png"; then
+            rm -f "$1.next.png"
+            return 0
+        fi
+        mv "$1.next.png" "$1"
+    done
+}
+
+# The view columns of every channel whose pixel in the view's row 0 is
+# blue (a cursor column) in screenshot $1: one line per channel, the
+# columns space separated. Row 0 of a data column is empty with the test
+# files' tones at half scale, so a cursor there is pure blue.
+blue_columns() {
+    local rows="" c
+    for ((c = 0; c < ${#VIEW_X[@]}; c++)); do
+        rows="$rows ${VIEW_X[$c]},${VIEW_Y[$c]},${VIEW_W[$c]}"
+    done
+    convert "$1" -depth 8 rgb:- | "$MOUSE_PYTHON" -c '
+import sys
+screen = int(sys.argv[1])
+data = sys.stdin.buffer.read()
+for row in sys.argv[2:]:
+    x, y, width = (int(v) for v in row.split(","))
+    blue = []
+    for column in range(width):
+        i = 3 * (y * screen + x + column)
+        r, g, b = data[i:i + 3]
+        if b >= r + 100 and b >= g + 100:
+            blue.append(str(column))
+    print(" ".join(blue))
+' "$(identify -format %w "$1")" $rows
+}
+
+# Fails unless the only blue columns of row 0 of every channel in
+# screenshot $1 are the cursor's ($2, a view column; none when empty).
+expect_cursor_columns() {
+    local c=0 got
+    while IFS= read -r got; do
+        [ "$got" = "$2" ] || fail "$1: blue columns of channel $c are '$got', expected '$2' ($3)"
+        c=$((c + 1))
+    done < <(blue_columns "$1")
+    [ "$c" = "${#VIEW_X[@]}" ] || fail "$1: could not read the columns of every channel"
+}
