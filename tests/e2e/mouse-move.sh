@@ -17,31 +17,23 @@ width=$(view_width)
 make_columns_file moves.wav "$per_column" 2 "$width"
 frames=$((per_column * width))
 launch moves.wav
-load_mapping
+load_layout
 
 # Drags channel $1 from column $2 to column $3 with button $4 while key $5
 # (or none) is held, and checks that it moved by the frames between the two
 # columns, that the window offers to undo the move and that Ctrl+Z puts the
 # channel back.
 move_and_undo() {
-    local channel=$1 from=$2 to=$3 button=$4 key=${5:-}
-    local x0 y0 x1 y1 distance other=$((1 - $1))
+    local channel=$1 from=$2 to=$3 distance other=$((1 - $1))
+    load_layout
     distance=$(($(frame_map first $((to + 1))) - $(frame_map first "$from")))
-    pause_clicks
-    read -r x0 y0 <<<"$(spot "$channel" "$from")"
-    read -r x1 y1 <<<"$(spot "$channel" "$to")"
-    if [ -n "$key" ]; then
-        drag_holding "$x0" "$y0" "$x1" "$y1" "$button" "$key"
-    else
-        drag "$x0" "$y0" "$x1" "$y1" "$button"
-    fi
-    expect_soon ".channels[$channel].first" "$distance" "first frame of channel $channel after the move"
-    expect_soon ".channels[$other].first" 0 "first frame of the channel not moved"
-    expect_soon '.frames' $((frames + distance)) "the document's length after the move"
-    expect_soon '.undo' "Move Sample" "the undo item after the move"
+    drag_from "$channel" "$from" $(spot "$channel" "$to") "$4" "${5:-}"
+    expect_soon "[.channels[$channel].first, .channels[$other].first, .frames, .undo] | @csv" \
+        "$distance,0,$((frames + distance)),\"Move Sample\"" \
+        "first frames of channel $channel and $other, length and undo item after the move"
     xdotool key ctrl+z
-    expect_soon ".channels[$channel].first" 0 "first frame of channel $channel after undoing the move"
-    expect_soon '[.frames, .undo, .redo] | @csv' "$frames,,\"Move Sample\"" "length and history after undoing the move"
+    expect_soon "[.channels[$channel].first, .frames, .undo, .redo] | @csv" "0,$frames,,\"Move Sample\"" \
+        "first frame of channel $channel, length and history after undoing the move"
 }
 
 middle_button_moves() {
@@ -55,24 +47,22 @@ ctrl_primary_button_moves() {
 # A moved channel's own frames start later: a double click selects them and
 # puts the cursor on their first frame, which both channels draw.
 double_click_on_moved_channel() {
-    local x y first column
-    pause_clicks
-    read -r x y <<<"$(spot 1 100)"
-    drag "$x" "$y" $(spot 1 199) 2
+    local first column
+    load_layout
     first=$(($(frame_map first 200) - $(frame_map first 100)))
+    drag_from 1 100 $(spot 1 199) 2
     expect_soon '.channels[1].first' "$first" "first frame of channel 1 after the move"
-    pause_clicks
-    read -r x y <<<"$(spot 1 400)"
-    double_click_at "$x" "$y" 6
-    expect_soon '[.range[], .cursor] | @csv' "$first,$((first + frames - 1)),$first" "range and cursor after a double click on the moved channel"
-    expect_soon '[.channels[].selected] | @csv' "false,true" "selection after a double click on the moved channel"
-    column=$((first / per_column))
+    load_layout
+    column=$(frame_map column "$first")
+    double_click_column 1 400 6
+    expect_soon '[.range[], .cursor, (.channels[] | .selected)] | @csv' \
+        "$first,$((first + frames - 1)),$first,false,true" \
+        "range, cursor and selection after a double click on the moved channel"
     settled_screenshot double-click-moved.png
     expect_cursor_columns double-click-moved.png "$column" "the cursor on the moved channel's first frame"
     # Left of it channel 1 has no frames: the plain empty colour, not the
     # range's.
-    read -r x y <<<"$(view_pixel 1 $((column - 1)) 0)"
-    expect_pixel double-click-moved.png "$x" "$y" "80,80,80" "channel 1 before its first frame"
+    expect_pixel double-click-moved.png $(spot 1 $((column - 1)) 0) "80,80,80" "channel 1 before its first frame"
 }
 
 run_case middle_button_moves

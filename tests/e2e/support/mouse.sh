@@ -114,9 +114,9 @@ spot() {
 
 # What FrameMapping gives for the layout read by load_layout, in single
 # precision as it computes, for pairs of a question and a value:
-#   frame_map first|last|frame COLUMN ... | pos FRAME ...
+#   frame_map first|last|frame COLUMN ... | pos|column FRAME ...
 # "first", "last" and "frame" take a column (x in the mapping's
-# coordinates), "pos" a frame. The answers are printed comma separated.
+# coordinates), "pos" and "column" a frame ("column" is the one drawing it). The answers are printed comma separated.
 # Sample views map clicks at their own x; a drag is mapped at the view's
 # x + 2 (container coordinates plus one), a channel move at x + 1
 # (container coordinates).
@@ -137,7 +137,15 @@ def last_at(x):
 def pos_at(frame):
     quotient = (frame - first) * f32(mapping_width - 1.0) / (last - first)
     return int(math.ceil(f32(quotient)) - 1)
+def column_of(frame):
+    # The column whose frames (first_at .. last_at, as the renderer
+    # splits them) hold the frame.
+    column = max(0, int((frame - first) / per_column) - 2)
+    while last_at(column) < frame:
+        column += 1
+    return column
 answers = {
+    'column': column_of,
     'first': first_at,
     'last': last_at,
     'frame': lambda x: (first_at(x) + last_at(x)) // 2,
@@ -247,4 +255,79 @@ expect_cursor_columns() {
         c=$((c + 1))
     done < <(blue_columns "$1")
     [ "$c" = "${#VIEW_X[@]}" ] || fail "$1: could not read the columns of every channel"
+}
+
+# --- Pop-up menus ----------------------------------------------------------
+
+# Waits for a pop-up menu of the editor (a visible window of its own other
+# than the editor's window) and prints its top left corner as "X Y".
+await_menu() {
+    local id
+    for _ in $(seq 50); do
+        id=$(xdotool search --onlyvisible --pid "$app" 2>/dev/null | grep -vx "$window" | head -1 || true)
+        if [ -n "$id" ]; then
+            xdotool getwindowgeometry --shell "$id" | sed -n 's/^[XY]=//p' | paste -sd ' '
+            return 0
+        fi
+        sleep 0.1
+    done
+    fail "no menu opened"
+}
+
+# Waits until the editor shows no pop-up menu.
+await_no_menu() {
+    for _ in $(seq 50); do
+        xdotool search --onlyvisible --pid "$app" 2>/dev/null | grep -qvx "$window" || return 0
+        sleep 0.1
+    done
+    fail "the menu stayed open"
+}
+
+# Reads the pop-up menu whose top left corner is at screen ($2, $3) from
+# screenshot $1: one line per item, "Y X MARKS", with the screen y of the
+# middle of the item's text, the screen x where its text starts, and how
+# many pixels left of the text (where a check box, a check mark or a radio
+# dot is drawn) differ from the menu's background. Items are told apart by
+# their text: rows with dark pixels, with rows without between them.
+menu_items() {
+    local width=240 height=300
+    convert "$1" -crop "${width}x${height}+$2+$3" +repage -depth 8 rgb:- | "$MOUSE_PYTHON" -c '
+import sys
+left, top, width = (int(v) for v in sys.argv[1:4])
+data = sys.stdin.buffer.read()
+height = len(data) // (3 * width)
+def at(x, y):
+    i = 3 * (y * width + x)
+    return tuple(data[i:i + 3])
+# Inside the one-pixel border: the background, up to the other border.
+background = at(2, 1)
+right = 2
+while right + 1 < width and at(right + 1, 1) == background:
+    right += 1
+bottom = 2
+while bottom + 1 < height and at(1, bottom + 1) == background:
+    bottom += 1
+def dark(p):
+    return max(p) < 110
+starts = {}
+for y in range(2, bottom + 1):
+    xs = [x for x in range(2, right + 1) if dark(at(x, y))]
+    if xs:
+        starts[y] = xs[0]
+items = []
+for y in sorted(starts):
+    if items and y - items[-1][1] <= 2:
+        items[-1][1] = y
+    else:
+        items.append([y, y])
+if not items:
+    sys.exit(0)
+# A marked item starts with its mark; the text of most items starts at the
+# same x.
+ordered = sorted(starts.values())
+text = ordered[len(ordered) // 2]
+for first, last in items:
+    marks = sum(1 for y in range(first, last + 1) for x in range(2, text - 3) if at(x, y) != background)
+    print(top + (first + last) // 2, left + text, marks)
+' "$2" "$3" "$width"
 }
