@@ -37,13 +37,27 @@ QMenuBar* MenuBuilder::Build(QWidget* parent)
         }
         QAction* item = menu->addAction(QString::fromUtf8(entry.label));
         if (entry.key != 0)
-            item->setShortcut(ShortcutOf(entry));
+            GiveShortcut(item, ShortcutOf(entry));
         const Message message(entry.code);
         const Post& post = entry.toApplication ? toApplication_ : toWindow_;
         QObject::connect(item, &QAction::triggered, item, [post, message] { post(message); });
         Keep(entry.kept, item);
     }
     return bar;
+}
+
+// Two items may share a shortcut. Qt would refuse both as ambiguous; the
+// first item in the menu bar's order is the one the keys fire. The later one
+// still shows the keys in its menu, but they act on it only where its own
+// menu has the keyboard, which the first item's window context never does.
+void MenuBuilder::GiveShortcut(QAction* item, const QKeySequence& keys)
+{
+    item->setShortcut(keys);
+    if (!taken_.contains(keys)) {
+        taken_.insert(keys);
+        return;
+    }
+    item->setShortcutContext(Qt::WidgetShortcut);
 }
 
 void MenuBuilder::Keep(KeptMenuItem which, QAction* item)

@@ -1,5 +1,8 @@
 #pragma once
 
+#include <QKeySequence>
+#include <QSet>
+
 #include <array>
 #include <functional>
 
@@ -33,11 +36,13 @@ public:
 
 private:
     void Keep(KeptMenuItem which, QAction* item);
+    void GiveShortcut(QAction* item, const QKeySequence& keys);
 
     Post toWindow_;
     Post toApplication_;
     /// Indexed by KeptMenuItem; owned by their menus.
     std::array<QAction*, size_t(KeptMenuItem::BubbleHelp) + 1> kept_{};
+    QSet<QKeySequence> taken_;  // shortcuts already given to an item
 };
 
 }  // namespace glimmet

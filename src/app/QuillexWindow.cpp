@@ -11,6 +11,7 @@
 #include <QLabel>
 #include <QMenuBar>
 #include <QMimeData>
+#include <QPalette>
 #include <QShortcut>
 #include <QUrl>
 #include <QVBoxLayout>
@@ -33,6 +34,7 @@
 #include "support/MessageEvent.h"
 #include "support/MessageFields.h"
 #include "views/ChannelContainerView.h"
+#include "views/ViewColors.h"
 #include "views/ZoomSlider.h"
 
 namespace glimmet {
@@ -58,6 +60,10 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
 {
     setAttribute(Qt::WA_QuitOnClose, false);
     setWindowTitle(QStringLiteral("Glimmet"));
+    // The window's own views stand on the views' grey, not the style's.
+    QPalette grey = palette();
+    grey.setColor(QPalette::Window, ViewBackgroundColor());
+    setPalette(grey);
     move(100, 100);
     resize(701, 301);
 
@@ -418,6 +424,15 @@ const std::optional<std::filesystem::path>& QuillexWindow::FileEntry() const
 void QuillexWindow::SetFileEntry(std::optional<std::filesystem::path> entry)
 {
     saving_->SetFileEntry(std::move(entry));
+}
+
+// Opening a file into the window starts a new document: the old one's
+// actions could only write its samples over the new file's.
+// A window with no history yet keeps its menu items as built.
+void QuillexWindow::DocumentReplaced()
+{
+    if (history_->UndoName() != nullptr || history_->RedoName() != nullptr)
+        actions_->DeleteHistory();
 }
 
 void QuillexWindow::ReplaceFileEntry(const std::filesystem::path& entry)

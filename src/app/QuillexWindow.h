@@ -73,6 +73,7 @@ public:
     // LoadTarget: the window's thread, while it loads.
     ChannelManager* DocumentManager() override { return manager_; }
     bool IsAppendOnLoad() override { return appendOnLoad_; }
+    void DocumentReplaced() override;
     void ReplaceFileEntry(const std::filesystem::path& entry) override;
     void SetWindowTitle(const std::string& title) override;
     status_t PostToSelf(uint32_t what) override { return PostMessage(what); }

@@ -35,6 +35,15 @@ QString TextControl::Text() const
 void TextControl::SetText(const QString& text)
 {
     field_->setText(text);
+    ShowStartUnlessEditing();
+}
+
+// A number wider than the field shows its leading digits, which tell it
+// apart, unless the user is at work in the field.
+void TextControl::ShowStartUnlessEditing()
+{
+    if (!field_->hasFocus())
+        field_->setCursorPosition(0);
 }
 
 void TextControl::AllowOnly(const QString& allowed)
@@ -45,6 +54,7 @@ void TextControl::AllowOnly(const QString& allowed)
 
 void TextControl::EntryFinished()
 {
+    ShowStartUnlessEditing();
     // editingFinished also fires when focus leaves an unchanged field; only a
     // real entry is a command.
     if (!field_->isModified())

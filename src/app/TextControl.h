@@ -30,6 +30,7 @@ public:
 
 private:
     void EntryFinished();
+    void ShowStartUnlessEditing();
 
     QLabel* label_;
     QLineEdit* field_;

@@ -96,6 +96,8 @@ status_t DocumentLoader::Load(const std::filesystem::path& file, LoadTarget& tar
     const status_t status = Load(file, target.DocumentManager(), target.IsAppendOnLoad(), &report);
     if (!report.opened)
         return status;
+    if (report.replacedDocument)
+        target.DocumentReplaced();
     target.ReplaceFileEntry(report.entry);
     const std::string name = report.entry.filename().string();
     if (!target.IsAppendOnLoad() && !name.empty())
@@ -122,22 +124,25 @@ status_t DocumentLoader::Load(const std::filesystem::path& file, ChannelManager*
         MediaTrack* track = media.TrackAt(index);
         if (track == nullptr)
             break;
-        if (LoadTrack(track, document, append, &status))
+        if (LoadTrack(track, document, append, &status, report))
             report->decodedTracks++;
         media.ReleaseTrack(track);
     }
     return status;
 }
 
-bool DocumentLoader::LoadTrack(MediaTrack* track, ChannelManager* document, bool append, status_t* status)
+bool DocumentLoader::LoadTrack(MediaTrack* track, ChannelManager* document, bool append, status_t* status,
+                               LoadReport* report)
 {
     media_format encoded;
     if (track->EncodedFormat(&encoded) != B_OK || !IsAudio(encoded))
         return false;
     if (document == nullptr)
         return false;
-    if (!append)
+    if (!append) {
         EmptyDocument(document);
+        report->replacedDocument = true;
+    }
 
     media_format decoded = ShortAudioRequest();
     *status = track->DecodedFormat(&decoded);

@@ -23,6 +23,9 @@ struct LoadReport {
     std::filesystem::path entry;
     /// Audio tracks that agreed to a decoded format.
     int32_t decodedTracks = 0;
+    /// The document's own channels were removed for the file's: it had an
+    /// audio track and the load did not append.
+    bool replacedDocument = false;
 };
 
 /// Loads a sound file into a document: every channel of every audio track
@@ -54,7 +57,8 @@ public:
 private:
     /// Loads one track; *status takes the decoded-format result of an audio
     /// track. True when an audio track agreed to a decoded format.
-    static bool LoadTrack(MediaTrack* track, ChannelManager* document, bool append, status_t* status);
+    static bool LoadTrack(MediaTrack* track, ChannelManager* document, bool append, status_t* status,
+                          LoadReport* report);
     static void EmptyDocument(ChannelManager* document);
     static std::filesystem::path FollowLinks(const std::filesystem::path& file);
 };

@@ -23,6 +23,9 @@ public:
     /// The append-on-load flag: when set, the file's channels go after the
     /// existing ones and the title stays.
     virtual bool IsAppendOnLoad() = 0;
+    /// The file's channels replaced the document's: nothing done to the old
+    /// ones can be undone any more, and the document is as on disk.
+    virtual void DocumentReplaced() = 0;
     /// Replaces the window's file entry by this one (links already followed).
     virtual void ReplaceFileEntry(const std::filesystem::path& entry) = 0;
     /// Sets the window's title ("Glimmet - " and the file's name).

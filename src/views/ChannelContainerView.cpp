@@ -13,13 +13,14 @@
 #include "support/MessageFields.h"
 #include "views/PixelCanvas.h"
 #include "views/SampleView.h"
+#include "views/ViewColors.h"
 #include "views/ZoomSlider.h"
 
 namespace glimmet {
 
 namespace {
 
-const QColor kBackground(216, 216, 216);
+const QColor kBackground = ViewBackgroundColor();
 const QColor kSunkenDark(152, 152, 152);
 const QColor kSunkenLight(255, 255, 255);
 const QColor kFocus(0, 0, 229);

@@ -1,5 +1,6 @@
 #include "views/ChannelContextMenu.h"
 
+#include <QActionGroup>
 #include <QMenu>
 
 #include "sound/Channel.h"
@@ -58,12 +59,16 @@ QMenu* ChannelContextMenu::MenuFor(Channel* channel)
         action->setCheckable(true);
         action->setChecked(marked);
         QObject::connect(action, &QAction::triggered, container, [container, what] { container->PostMessage(what); });
+        return action;
     };
     addItem("Mute", kMsgToggleMute, channel->IsMuted());
     menu->addSeparator();
-    addItem("Left", kMsgPanLeft, channel->PanPosition() == Channel::kPanLeft);
-    addItem("Middle", kMsgPanMiddle, channel->PanPosition() == Channel::kPanMiddle);
-    addItem("Right", kMsgPanRight, channel->PanPosition() == Channel::kPanRight);
+    // The pan positions are one choice: at most one of them is marked.
+    auto* pan = new QActionGroup(menu);
+    pan->setExclusionPolicy(QActionGroup::ExclusionPolicy::Exclusive);
+    pan->addAction(addItem("Left", kMsgPanLeft, channel->PanPosition() == Channel::kPanLeft));
+    pan->addAction(addItem("Middle", kMsgPanMiddle, channel->PanPosition() == Channel::kPanMiddle));
+    pan->addAction(addItem("Right", kMsgPanRight, channel->PanPosition() == Channel::kPanRight));
     menu->addSeparator();
     // "Remove" goes to the window, which removes the channel as an action.
     QAction* remove = menu->addAction(QStringLiteral("Remove"));

@@ -166,6 +166,25 @@ void SampleView::paintEvent(QPaintEvent* event)
 
 void SampleView::mousePressEvent(QMouseEvent* event)
 {
+    pressHandled_ = true;
+    Pressed(event);
+}
+
+// On X11 the second press of a double click reaches a widget only as a
+// double-click event, so it is taken as the press it is; the timing test
+// of Pressed still decides whether it makes a double click. Where a plain
+// press came first for the same button press, it was already handled.
+void SampleView::mouseDoubleClickEvent(QMouseEvent* event)
+{
+    event->accept();
+    if (pressHandled_)
+        return;
+    pressHandled_ = true;
+    Pressed(event);
+}
+
+void SampleView::Pressed(QMouseEvent* event)
+{
     setFocus(Qt::MouseFocusReason);
     if (container_ != nullptr)
         container_->update();
@@ -178,13 +197,6 @@ void SampleView::mousePressEvent(QMouseEvent* event)
             container_->Clicked(this, event->position(), event->button(), event->modifiers());
     }
     lastMouseDown_ = now;
-}
-
-// Every press, the second of a double click included, already reached
-// mousePressEvent, which tells double clicks apart by its own timing.
-void SampleView::mouseDoubleClickEvent(QMouseEvent* event)
-{
-    event->accept();
 }
 
 QPointF SampleView::ToContainer(QPointF point) const
@@ -201,6 +213,7 @@ void SampleView::mouseMoveEvent(QMouseEvent* event)
 
 void SampleView::mouseReleaseEvent(QMouseEvent* event)
 {
+    pressHandled_ = false;
     if (container_ != nullptr)
         container_->MouseUp(ToContainer(event->position()));
 }
@@ -262,6 +275,8 @@ void SampleView::focusInEvent(QFocusEvent* event)
 
 void SampleView::focusOutEvent(QFocusEvent* event)
 {
+    // A popup took the pointer: the release of this press goes elsewhere.
+    pressHandled_ = false;
     QWidget::focusOutEvent(event);
     if (container_ != nullptr)
         container_->update();

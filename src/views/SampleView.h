@@ -84,6 +84,9 @@ private:
     /// 0x1f, Delete 0x7f); 0 for a key that produces no character.
     static int KeyByte(const QKeyEvent* event);
     QPointF ToContainer(QPointF point) const;
+    /// A press, whichever event brought it: focus, then a click or a
+    /// double click by the time since the last press.
+    void Pressed(QMouseEvent* event);
 
     Channel* channel_;
     ChannelContainerView* container_;
@@ -93,6 +96,8 @@ private:
     std::array<int16_t, kRowTableSize> rowTable_{};
     Clock clock_;
     bool inLayout_ = false;
+    // A press was handled and its release has not come yet.
+    bool pressHandled_ = false;
 };
 
 }  // namespace glimmet

@@ -5,7 +5,8 @@
 #include <QAction>
 #include <QMenu>
 #include <QMenuBar>
-#include <QWidget>
+#include <QMainWindow>
+#include <QTest>
 
 #include <vector>
 
@@ -33,7 +34,7 @@ protected:
 
     std::vector<uint32_t> toWindow;
     std::vector<uint32_t> toApplication;
-    QWidget parent;
+    QMainWindow parent;
     MenuBuilder menus{[this](const Message& message) { toWindow.push_back(message.what); },
         [this](const Message& message) { toApplication.push_back(message.what); }};
     QMenuBar* bar = nullptr;
@@ -74,6 +75,33 @@ TEST_F(MenuBuilderTest, AClickAloneDoesNotMarkBubbleHelp)
     bubbleHelp->trigger();
     EXPECT_FALSE(bubbleHelp->isChecked());
     EXPECT_EQ(toApplication, std::vector<uint32_t>{kMsgToggleBubbleHelp});
+}
+
+TEST_F(MenuBuilderTest, ASharedShortcutFiresTheFirstItemInMenuBarOrder)
+{
+    parent.setMenuBar(bar);
+    parent.show();
+    ASSERT_TRUE(QTest::qWaitForWindowActive(&parent));
+    QTest::keyClick(&parent, Qt::Key_O, Qt::ControlModifier);
+    QTest::keyClick(&parent, Qt::Key_E, Qt::ControlModifier);
+    EXPECT_EQ(toWindow, (std::vector<uint32_t>{kMsgOpen, kMsgEnvelope}));
+}
+
+TEST_F(MenuBuilderTest, BothItemsOfASharedShortcutShowIt)
+{
+    EXPECT_EQ(Find("Tools", "Fade Out")->shortcut(), QKeySequence(Qt::CTRL | Qt::Key_O));
+    EXPECT_EQ(Find("View", "Show All")->shortcut(), QKeySequence(Qt::CTRL | Qt::Key_E));
+    EXPECT_EQ(Find("File", "Open\u2026")->shortcutContext(), Qt::WindowShortcut);
+    EXPECT_EQ(Find("Tools", "Envelope\u2026")->shortcutContext(), Qt::WindowShortcut);
+    EXPECT_EQ(Find("Tools", "Fade Out")->shortcutContext(), Qt::WidgetShortcut);
+    EXPECT_EQ(Find("View", "Show All")->shortcutContext(), Qt::WidgetShortcut);
+}
+
+TEST_F(MenuBuilderTest, TheSecondItemOfAPairStillWorksFromItsMenu)
+{
+    Find("Tools", "Fade Out")->trigger();
+    Find("View", "Show All")->trigger();
+    EXPECT_EQ(toWindow, (std::vector<uint32_t>{kMsgFadeOut, kMsgShowAll}));
 }
 
 }  // namespace

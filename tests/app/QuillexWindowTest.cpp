@@ -26,6 +26,7 @@
 #include "sound/ChannelManager.h"
 #include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
+#include "support/MessageFields.h"
 #include "views/ChannelContainerView.h"
 
 namespace glimmet::test {
@@ -90,6 +91,40 @@ TEST(QuillexWindow, ControlRowRunsLeftToRightWithTheFreeWidthBeforeTheRangeField
             - (window->LoopBox()->parentWidget()->mapTo(window, QPoint(0, 0)).y()
                 + window->LoopBox()->parentWidget()->height()),
         5);
+}
+
+TEST(QuillexWindow, TheWindowsOwnViewsStandOnTheViewsGrey)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    window->resize(900, 400);
+    Drain();
+    const QImage shot = window->grab().toImage();
+    const QColor grey(216, 216, 216);
+    // The free width of the control row, between the loop box and the fields.
+    const QPoint row = window->LoopBox()->mapTo(window, QPoint(window->LoopBox()->width() + 20, 2));
+    EXPECT_EQ(shot.pixelColor(row), grey);
+    // The margin between the control row and the channel strips.
+    const QPoint gap = window->ContainerView()->mapTo(window, QPoint(40, -3));
+    EXPECT_EQ(shot.pixelColor(gap), grey);
+    // The border around the container, left of its sunken frame.
+    const QPoint border = window->ContainerView()->mapTo(window, QPoint(-3, 40));
+    EXPECT_EQ(shot.pixelColor(border), grey);
+}
+
+TEST(QuillexWindow, ANumberWiderThanItsFieldShowsItsLeadingDigits)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture);
+    window->resize(window->minimumSizeHint());
+    Drain();
+    Message start(kMsgRangeStartChanged);
+    start.AddInt64(kFieldRangeStart, 1234567890123);
+    window->PostMessage(start);
+    Drain();
+    QLineEdit* field = window->RangeStartField()->Field();
+    ASSERT_EQ(field->text(), "1234567890123");
+    EXPECT_EQ(field->cursorPosition(), 0);
 }
 
 TEST(QuillexWindow, RangeFieldsAcceptOnlyDigitsAndMinus)
@@ -284,6 +319,40 @@ TEST(QuillexWindow, DroppingWithShiftAddsTheChannels)
     EXPECT_EQ(window->Manager()->CountChannels(), 3);
     EXPECT_EQ(window->ContainerView()->CountChannelViews(), 3);
     EXPECT_EQ(window->windowTitle(), "Glimmet - base.wav");
+}
+
+TEST(QuillexWindow, OpeningAFileIntoTheWindowEmptiesItsHistory)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("first.wav", 2, 1000));
+    window->PostMessage(kMsgSelectAll);
+    window->PostMessage(kMsgFadeOut);
+    Drain();
+    ASSERT_NE(window->History()->UndoName(), nullptr);
+    const auto second = fixture.MakeSound("second.wav", 2, 1000);
+    DropFiles(window, {second}, Qt::NoModifier);
+    ASSERT_EQ(window->windowTitle(), "Glimmet - second.wav");
+    const int16_t before = window->Manager()->ChannelAt(0)->Data()[999];
+    EXPECT_EQ(window->History()->UndoName(), nullptr);
+    EXPECT_TRUE(window->History()->IsSaved());
+    EXPECT_FALSE(window->MenuItem(KeptMenuItem::Save)->isEnabled());
+    EXPECT_FALSE(window->MenuItem(KeptMenuItem::Undo)->isEnabled());
+    window->PostMessage(kMsgUndo);
+    Drain();
+    EXPECT_EQ(window->Manager()->ChannelAt(0)->Data()[999], before);
+}
+
+TEST(QuillexWindow, AppendingAFileKeepsTheHistory)
+{
+    AppFixture fixture;
+    QuillexWindow* window = OpenWindow(fixture, fixture.MakeSound("first.wav", 1, 1000));
+    window->PostMessage(kMsgSelectAll);
+    window->PostMessage(kMsgFadeOut);
+    Drain();
+    DropFiles(window, {fixture.MakeSound("more.wav", 1, 1000)}, Qt::ShiftModifier);
+    ASSERT_EQ(window->Manager()->CountChannels(), 2);
+    EXPECT_STREQ(window->History()->UndoName(), "Fade Out");
+    EXPECT_FALSE(window->History()->IsSaved());
 }
 
 TEST(QuillexWindow, DropMessageWithoutRefsIsIgnored)

@@ -111,6 +111,7 @@ TEST_F(DocumentLoaderTest, AppendAddsAfterTheExistingChannelsAndKeepsTheTitle)
     EXPECT_EQ(window.title, "untitled");
     // The file entry is replaced all the same.
     EXPECT_EQ(window.entry.filename(), "stereo.wav");
+    EXPECT_EQ(window.replacements, 0);
 }
 
 TEST_F(DocumentLoaderTest, OnlyTheLastAudioTracksChannelsRemain)
@@ -121,6 +122,7 @@ TEST_F(DocumentLoaderTest, OnlyTheLastAudioTracksChannelsRemain)
     EXPECT_EQ(window.manager.ChannelAt(0)->FrameCount(), 700);
     EXPECT_EQ(window.mirror.shown.size(), 1u);
     EXPECT_EQ(window.posted, (std::vector<uint32_t>{kMsgShowAll, kMsgShowAll}));
+    EXPECT_EQ(window.replacements, 1);
 }
 
 TEST_F(DocumentLoaderTest, AppendKeepsEveryTracksChannels)
@@ -156,6 +158,8 @@ TEST_F(DocumentLoaderTest, FileWithoutAudioOnlyChangesTitleAndEntry)
     EXPECT_EQ(window.manager.CountChannels(), 1);
     EXPECT_EQ(window.title, "Glimmet - silent-movie.mkv");
     EXPECT_TRUE(window.posted.empty());
+    // Nothing of the document went, so its history stays.
+    EXPECT_EQ(window.replacements, 0);
 }
 
 TEST_F(DocumentLoaderTest, UnopenableFileLeavesTheDocumentUntouched)
@@ -168,6 +172,7 @@ TEST_F(DocumentLoaderTest, UnopenableFileLeavesTheDocumentUntouched)
     EXPECT_EQ(window.title, "untitled");
     EXPECT_TRUE(window.entry.empty());
     EXPECT_TRUE(window.posted.empty());
+    EXPECT_EQ(window.replacements, 0);
 }
 
 TEST_F(DocumentLoaderTest, TrackWithoutFramesEmptiesTheDocumentAndStillPosts)

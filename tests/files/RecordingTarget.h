@@ -21,6 +21,7 @@ public:
     ChannelManager* DocumentManager() override { return withDocument ? &manager : nullptr; }
     HistoryManager* DocumentHistory() override { return &history; }
     bool IsAppendOnLoad() override { return appendOnLoad; }
+    void DocumentReplaced() override { ++replacements; }
     void ReplaceFileEntry(const std::filesystem::path& path) override { entry = path; }
     void SetWindowTitle(const std::string& text) override { title = text; }
     status_t PostToSelf(uint32_t what) override
@@ -39,6 +40,7 @@ public:
     std::filesystem::path entry;
     std::string title = "untitled";
     std::vector<uint32_t> posted;
+    int replacements = 0;  // calls of DocumentReplaced
 };
 
 }  // namespace glimmet::test

@@ -1,6 +1,9 @@
 #include <gtest/gtest.h>
 
+#include <QActionGroup>
+#include <QApplication>
 #include <QMenu>
+#include <QMouseEvent>
 
 #include "ViewFixture.h"
 #include "support/MessageCodes.h"
@@ -236,6 +239,44 @@ TEST_F(Interaction, DoubleClickSelectsAMovedChannelsOwnExtent)
     EXPECT_FALSE(ChannelAt(0)->IsSelected());
 }
 
+// What an X server gives a widget for a double click: press, release, then
+// the second press only as a double-click event, then its release.
+void SendLikeX11(QWidget* view, QEvent::Type type, QPoint point)
+{
+    const Qt::MouseButtons held = type == QEvent::MouseButtonRelease ? Qt::NoButton : Qt::LeftButton;
+    QMouseEvent event(type, QPointF(point), view->mapToGlobal(QPointF(point)), Qt::LeftButton, held, Qt::NoModifier);
+    QApplication::sendEvent(view, &event);
+}
+
+TEST_F(Interaction, SecondPressArrivingOnlyAsADoubleClickEventSelectsTheChannel)
+{
+    SampleView* view = fixture.View(1);
+    ManualClock::Advance(1000000);
+    SendLikeX11(view, QEvent::MouseButtonPress, QPoint(200, 30));
+    SendLikeX11(view, QEvent::MouseButtonRelease, QPoint(200, 30));
+    ManualClock::Advance(120000);
+    SendLikeX11(view, QEvent::MouseButtonDblClick, QPoint(200, 30));
+    SendLikeX11(view, QEvent::MouseButtonRelease, QPoint(200, 30));
+    EXPECT_EQ(fixture.manager.RangeStart(), 0);
+    EXPECT_EQ(fixture.manager.RangeEnd(), ChannelAt(1)->FrameCount() - 1);
+    EXPECT_TRUE(ChannelAt(1)->IsSelected());
+}
+
+TEST_F(Interaction, ADoubleClickEventAfterItsOwnPressIsNotASecondClick)
+{
+    // Some platforms send the press and then the double-click event for the
+    // same button press; that press counts once.
+    SampleView* view = fixture.View(1);
+    ManualClock::Advance(1000000);
+    SendLikeX11(view, QEvent::MouseButtonPress, QPoint(200, 30));
+    ManualClock::Advance(1000);
+    SendLikeX11(view, QEvent::MouseButtonDblClick, QPoint(200, 30));
+    SendLikeX11(view, QEvent::MouseButtonRelease, QPoint(200, 30));
+    EXPECT_EQ(fixture.manager.RangeStart(), -1);
+    EXPECT_FALSE(ChannelAt(1)->IsSelected());
+    EXPECT_EQ(Container().CursorFrame(), Container().FrameAt(200));
+}
+
 TEST_F(Interaction, ClicksFurtherApartThanTheDoubleClickIntervalAreSingle)
 {
     SampleView* view = fixture.View(1);
@@ -288,6 +329,25 @@ TEST_F(Interaction, ContextMenuItemsMuteAndPan)
     EXPECT_EQ(channel->PanPosition(), 127);
     EXPECT_EQ(fixture.window.With(kMsgRemoveChannel).size(), 1u);
     EXPECT_TRUE(fixture.window.With(kMsgRemoveChannel)[0].IsEmpty());
+}
+
+TEST_F(Interaction, ThePanItemsAreOneExclusiveChoice)
+{
+    Click(1, QPoint(100, 20), Qt::RightButton);
+    QMenu* menu = Container().OpenContextMenu();
+    ASSERT_NE(menu, nullptr);
+    const QList<QAction*> items = menu->actions();
+    QActionGroup* group = items[2]->actionGroup();
+    ASSERT_NE(group, nullptr);
+    EXPECT_TRUE(group->isExclusive());
+    EXPECT_EQ(items[3]->actionGroup(), group);
+    EXPECT_EQ(items[4]->actionGroup(), group);
+    EXPECT_EQ(items[0]->actionGroup(), nullptr);
+    EXPECT_EQ(items[6]->actionGroup(), nullptr);
+    items[4]->trigger();  // a marked Middle gives way to Right
+    EXPECT_EQ(group->checkedAction(), items[4]);
+    EXPECT_FALSE(items[3]->isChecked());
+    menu->close();
 }
 
 TEST_F(Interaction, MiddleButtonMovesTheChannelAndReportsTheMove)
