@@ -3,18 +3,18 @@
 #
 #   mouse-drag.sh GLIMMET WORKDIR
 #
-# The file has 64 frames per view column (see mouse-click.sh). The press
-# anchors the range at the first frame of the pressed column; while the
-# button is held the pointer is mapped at its view x + 2 (container
-# coordinates plus one), a Shift-click at its own x.
+# The press anchors the range at the first frame of the pressed column;
+# while the button is held the pointer is mapped at its view x + 2
+# (container coordinates plus one), a Shift-click at its own x. The file is
+# two seconds long, so a column holds a fraction of frames more than a
+# whole number and the range's ends are where rounding decides (frame_map
+# rounds as the views do).
 . "$(dirname "$0")/lib.sh"
 . "$(dirname "$0")/support/mouse.sh"
 e2e_begin "$@"
 
-per_column=64
-width=$(view_width)
-make_columns_file drags.wav "$per_column" 2 "$width"
-frames=$((per_column * width))
+make_stereo drags.wav 2
+frames=88200
 launch drags.wav
 load_layout
 
@@ -39,7 +39,7 @@ drag_past_the_start() {
 
 # The end is the frame count itself, one past the last frame.
 drag_past_the_end() {
-    drag_from 1 200 $(spot 1 $((width + 40)))
+    drag_from 1 200 $(spot 1 $((MAP_WIDTH + 40)))
     expect_range "$(frame_map first 200),$frames" "false,true" "a drag right past the view"
 }
 
@@ -81,15 +81,20 @@ shift_extends_from_cursor() {
     expect_range "$(frame_map first 250 frame 300)" "false,true" "a Shift-click left of the cursor"
 }
 
-# A plain click after Shift-clicks leaves one cursor column: the new one.
+# A plain click after a Shift-click leaves one cursor column: the new one.
+# The Shift-click right of the range puts the cursor on the range's first
+# frame, the first of its column, and deselects channel 1, which keeps
+# showing the cursor there until the click moves it.
 click_after_shift_click() {
-    drag_from 0 200 $(spot 0 298)
-    shift_click 0 150
-    expect_soon '.cursor' "$(frame_map last 300)" "cursor after a Shift-click"
-    click_column 1 500
+    drag_from 0 200 $(spot 1 298)
+    shift_click 0 400
+    expect_soon '[.cursor, (.channels[] | .selected)] | @csv' "$(frame_map first 200),true,false" \
+        "cursor and selection after a Shift-click right of the range"
+    click_column 0 500
     expect_soon '[.cursor, .range[]] | @csv' "$(frame_map frame 500),-1,-1" "a click at column 500"
     settled_screenshot click-after-shift-click.png
-    expect_cursor_columns click-after-shift-click.png "500" "the cursor column after a click"
+    expect_cursor_columns click-after-shift-click.png "$(frame_map column "$(frame_map frame 500)")" \
+        "the cursor column after a click"
 }
 
 run_case drag_across_channels
