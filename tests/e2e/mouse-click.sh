@@ -62,7 +62,6 @@ double_click_apart() {
 double_click_draws_cursor() {
     double_click_column 1 400 6
     expect_channel_selected 1 "two clicks 6 px apart in channel 1"
-    settled_screenshot double-click-cursor.png
     expect_cursor_columns double-click-cursor.png "0" "the cursor on frame 0 after a double click"
 }
 

@@ -27,18 +27,30 @@ open_menu() {
     read -r menu_x menu_y <<<"$(await_menu)"
 }
 
-# Opens channel $1's menu and reads its items from screenshot $2 into
-# $menu (one "Y X MARKS" line each, see menu_items); leaves it open.
+# Reads the open menu's items from screenshot $1 into $menu (one
+# "Y X MARKS" line each, see menu_items), taking it again while the menu is
+# still being drawn, for up to three seconds.
 read_menu() {
-    open_menu "$1"
-    settled_screenshot "$2"
-    menu=$(menu_items "$2" "$menu_x" "$menu_y")
-    [ "$(wc -l <<<"$menu")" = "${#item_names[@]}" ] \
-        || fail "$2: the menu's items are not ${item_names[*]} (read: $(tr '\n' ';' <<<"$menu"))"
+    local deadline=$(($(date +%s%N) + 3000000000))
+    while :; do
+        screenshot "$1"
+        menu=$(menu_items "$1" "$menu_x" "$menu_y")
+        [ "$(wc -l <<<"$menu")" = "${#item_names[@]}" ] && return 0
+        [ "$(date +%s%N)" -lt "$deadline" ] || break
+        sleep 0.2
+    done
+    fail "$1: the menu's items are not ${item_names[*]} (read: $(tr '\n' ';' <<<"$menu"))"
+}
+
+# The names of the marked items among "Left", "Middle" and "Right" of $menu.
+marked_pans() {
+    sed -n 2,4p <<<"$menu" \
+        | awk 'BEGIN { split("Left Middle Right", n, " ") } $3 > 0 { printf "%s%s", out ? " " : "", n[NR]; out = 1 }'
 }
 
 # Where the items are in any menu: their offsets from its top left corner.
-read_menu 0 menu.png
+open_menu 0
+read_menu menu.png
 item_offsets=$(awk -v x="$menu_x" -v y="$menu_y" '{ print $1 - y, $2 - x + 10 }' <<<"$menu")
 xdotool key Escape
 await_no_menu
@@ -74,15 +86,20 @@ pan() {
 # Of "Left", "Middle" and "Right" exactly one is marked, the channel's
 # current pan: they are one group of choices.
 one_pan_marked() {
-    local name marked
+    local name marked deadline
     for name in Middle Right; do
         choose 0 "$name"
         expect_soon '.channels[0].pan' "$([ "$name" = Middle ] && echo 0 || echo 127)" "channel 0's pan after choosing $name"
-        read_menu 0 "marks-$name.png"
+        open_menu 0
+        deadline=$(($(date +%s%N) + 3000000000))
+        while :; do
+            read_menu "marks-$name.png"
+            marked=$(marked_pans)
+            [ "$marked" = "$name" ] || [ "$(date +%s%N)" -ge "$deadline" ] && break
+            sleep 0.2
+        done
         xdotool key Escape
         await_no_menu
-        marked=$(sed -n 2,4p <<<"$menu" \
-            | awk 'BEGIN { split("Left Middle Right", n, " ") } $3 > 0 { printf "%s%s", out ? " " : "", n[NR]; out = 1 }')
         [ "$marked" = "$name" ] || fail "marks-$name.png: marked are '$marked', expected only '$name'" \
             "(pixels left of the text: $(sed -n 2,4p <<<"$menu" | awk '{ printf "%s ", $3 }'))"
     done

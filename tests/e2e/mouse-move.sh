@@ -58,7 +58,6 @@ double_click_on_moved_channel() {
     expect_soon '[.range[], .cursor, (.channels[] | .selected)] | @csv' \
         "$first,$((first + frames - 1)),$first,false,true" \
         "range, cursor and selection after a double click on the moved channel"
-    settled_screenshot double-click-moved.png
     expect_cursor_columns double-click-moved.png "$column" "the cursor on the moved channel's first frame"
     # Left of it channel 1 has no frames: the plain empty colour, not the
     # range's.

@@ -200,27 +200,6 @@ drag_from() {
 
 # --- Pixels ----------------------------------------------------------------
 
-# A screenshot without the time it was taken, so that two of the same
-# screen are the same file.
-bare_screenshot() {
-    import -window root -define png:exclude-chunk=date,time "$1"
-}
-
-# Takes screenshot $1 until two in a row are the same (the window has
-# drawn what it was asked to), for up to about three seconds.
-settled_screenshot() {
-    bare_screenshot "$1"
-    for _ in $(seq 12); do
-        sleep 0.1
-        bare_screenshot "$1.next.png"
-        if cmp -s "$1" "$1.next.png"; then
-            rm -f "$1.next.png"
-            return 0
-        fi
-        mv "$1.next.png" "$1"
-    done
-}
-
 # The view columns of every channel whose pixel in the view's row 0 is
 # blue (a cursor column) in screenshot $1: one line per channel, the
 # columns space separated. Row 0 of a data column is empty with the test
@@ -246,18 +225,25 @@ for row in sys.argv[2:]:
 ' "$(identify -format %w "$1")" $rows
 }
 
-# Fails unless the only blue columns of row 0 of every channel in
-# screenshot $1 are the cursor's ($2, a view column; none when empty).
+# Takes screenshot $1 until the only blue columns of row 0 of every
+# channel are the cursor's ($2, a view column; none when empty), for up to
+# three seconds (the window may still be drawing), and fails if they never
+# are.
 expect_cursor_columns() {
-    local c=0 got
-    while IFS= read -r got; do
-        [ "$got" = "$2" ] || fail "$1: blue columns of channel $c are '$got', expected '$2' ($3)"
-        c=$((c + 1))
-    done < <(blue_columns "$1")
-    [ "$c" = "${#VIEW_X[@]}" ] || fail "$1: could not read the columns of every channel"
+    local c got deadline=$(($(date +%s%N) + 3000000000))
+    while :; do
+        screenshot "$1"
+        c=0
+        while IFS= read -r got; do
+            [ "$got" = "$2" ] || break
+            c=$((c + 1))
+        done < <(blue_columns "$1")
+        [ "$c" = "${#VIEW_X[@]}" ] && return 0
+        [ "$(date +%s%N)" -lt "$deadline" ] || break
+        sleep 0.2
+    done
+    fail "$1: blue columns of channel $c are '$got', expected '$2' ($3)"
 }
-
-# --- Pop-up menus ----------------------------------------------------------
 
 # Waits for a pop-up menu of the editor (a visible window of its own other
 # than the editor's window) and prints its top left corner as "X Y".
