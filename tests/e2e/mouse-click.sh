@@ -12,13 +12,7 @@
 e2e_begin "$@"
 
 per_column=64
-width=$(view_width)
-make_columns_file clicks.wav "$per_column" 2 "$width"
-frames=$((per_column * width))
-launch clicks.wav
-load_layout
-[ "$MAP_WIDTH,$MAP_FIRST,$MAP_LAST" = "$width,0,$((frames - 1))" ] \
-    || fail "the window shows frames $MAP_FIRST to $MAP_LAST in $MAP_WIDTH pixels, expected all $frames in $width"
+launch_columns_file clicks.wav "$per_column"
 
 # A click selects nothing, focuses the clicked channel and puts the cursor
 # on the frame under the pointer: the first and the last column, one inside

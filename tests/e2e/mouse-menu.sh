@@ -28,24 +28,29 @@ open_menu() {
 }
 
 # Reads the open menu's items from screenshot $1 into $menu (one
-# "Y X MARKS" line each, see menu_items), taking it again while the menu is
-# still being drawn, for up to three seconds.
+# "Y X MARKS" line each, see menu_items); tells whether all were found.
+menu_read() {
+    screenshot "$1"
+    menu=$(menu_items "$1" "$menu_x" "$menu_y")
+    [ "$(wc -l <<<"$menu")" = "${#item_names[@]}" ]
+}
+
+# Reads the open menu as menu_read does, taking the screenshot again while
+# the menu is still being drawn, for up to three seconds.
 read_menu() {
-    local deadline=$(($(date +%s%N) + 3000000000))
-    while :; do
-        screenshot "$1"
-        menu=$(menu_items "$1" "$menu_x" "$menu_y")
-        [ "$(wc -l <<<"$menu")" = "${#item_names[@]}" ] && return 0
-        [ "$(date +%s%N)" -lt "$deadline" ] || break
-        sleep 0.2
-    done
-    fail "$1: the menu's items are not ${item_names[*]} (read: $(tr '\n' ';' <<<"$menu"))"
+    retry_for 3 menu_read "$1" || fail "$1: the menu's items are not ${item_names[*]} (read: $(tr '\n' ';' <<<"$menu"))"
 }
 
 # The names of the marked items among "Left", "Middle" and "Right" of $menu.
 marked_pans() {
     sed -n 2,4p <<<"$menu" \
         | awk 'BEGIN { split("Left Middle Right", n, " ") } $3 > 0 { printf "%s%s", out ? " " : "", n[NR]; out = 1 }'
+}
+
+# Reads the open menu from screenshot $1 and tells whether its only marked
+# pan item is $2; sets $marked to the marked ones.
+pan_marked_is() {
+    menu_read "$1" && marked=$(marked_pans) && [ "$marked" = "$2" ]
 }
 
 # Where the items are in any menu: their offsets from its top left corner.
@@ -86,18 +91,12 @@ pan() {
 # Of "Left", "Middle" and "Right" exactly one is marked, the channel's
 # current pan: they are one group of choices.
 one_pan_marked() {
-    local name marked deadline
+    local name marked=""
     for name in Middle Right; do
         choose 0 "$name"
         expect_soon '.channels[0].pan' "$([ "$name" = Middle ] && echo 0 || echo 127)" "channel 0's pan after choosing $name"
         open_menu 0
-        deadline=$(($(date +%s%N) + 3000000000))
-        while :; do
-            read_menu "marks-$name.png"
-            marked=$(marked_pans)
-            [ "$marked" = "$name" ] || [ "$(date +%s%N)" -ge "$deadline" ] && break
-            sleep 0.2
-        done
+        retry_for 3 pan_marked_is "marks-$name.png" "$name" || true
         xdotool key Escape
         await_no_menu
         [ "$marked" = "$name" ] || fail "marks-$name.png: marked are '$marked', expected only '$name'" \

@@ -12,12 +12,7 @@
 . "$(dirname "$0")/support/mouse.sh"
 e2e_begin "$@"
 
-per_column=64
-width=$(view_width)
-make_columns_file moves.wav "$per_column" 2 "$width"
-frames=$((per_column * width))
-launch moves.wav
-load_layout
+launch_columns_file moves.wav 64
 
 # Drags channel $1 from column $2 to column $3 with button $4 while key $5
 # (or none) is held, and checks that it moved by the frames between the two

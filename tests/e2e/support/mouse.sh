@@ -47,19 +47,30 @@ finish_cases() {
     }
 }
 
-# Like lib.sh's expect_state, bounded by the clock rather than by a number
-# of tries (each try starts programs, slow on a loaded machine): waits up to
-# $4 seconds (default 5) for `state_field EXPR` to print EXPECTED.
-#   expect_soon EXPR EXPECTED WHAT [SECONDS]
-expect_soon() {
-    local got="" deadline=$(($(date +%s%N) + ${4:-5} * 1000000000))
-    while :; do
-        got=$(state_field "$1" 2>/dev/null || true)
-        [ "$got" = "$2" ] && return 0
-        [ "$(date +%s%N)" -lt "$deadline" ] || break
+# Runs command $2... again and again until it succeeds, for up to $1
+# seconds; returns 1 when it never does. Bounded by the clock rather than by
+# a number of tries: each try starts programs, slow on a loaded machine.
+retry_for() {
+    local deadline=$(($(date +%s%N) + $1 * 1000000000))
+    shift
+    until "$@"; do
+        [ "$(date +%s%N)" -lt "$deadline" ] || return 1
         sleep 0.1
     done
-    fail "$3: $1 is '$got', expected '$2'"
+}
+
+# Whether `state_field $1` prints $2; sets $got to what it prints.
+state_is() {
+    got=$(state_field "$1" 2>/dev/null || true)
+    [ "$got" = "$2" ]
+}
+
+# Like lib.sh's expect_state, bounded by the clock: waits up to $4 seconds
+# (default 5) for `state_field EXPR` to print EXPECTED.
+#   expect_soon EXPR EXPECTED WHAT [SECONDS]
+expect_soon() {
+    local got=""
+    retry_for "${4:-5}" state_is "$1" "$2" || fail "$3: $1 is '$got', expected '$2'"
 }
 
 # --- Test files ------------------------------------------------------------
@@ -84,6 +95,19 @@ make_columns_file() {
     # The rate is given for the generated input too, or it is made at
     # another rate and resampled to a different length.
     sox -r 44100 -n -r 44100 -c "$channels" -b 16 "$file" synth "$((per_column * width))s" $tones vol 0.5
+}
+
+# Makes file $1 (two channels) of $2 frames per column of a new window's
+# sample views, opens it in the editor and reads the layout. Sets $width
+# and $frames.
+launch_columns_file() {
+    width=$(view_width)
+    frames=$(($2 * width))
+    make_columns_file "$1" "$2" 2 "$width"
+    launch "$1"
+    load_layout
+    [ "$MAP_WIDTH,$MAP_FIRST,$MAP_LAST" = "$width,0,$((frames - 1))" ] \
+        || fail "the window shows frames $MAP_FIRST to $MAP_LAST in $MAP_WIDTH pixels, expected all $frames in $width"
 }
 
 # --- The layout and the frames under the pointer ----------------------------
@@ -225,24 +249,26 @@ for row in sys.argv[2:]:
 ' "$(identify -format %w "$1")" $rows
 }
 
-# Takes screenshot $1 until the only blue columns of row 0 of every
-# channel are the cursor's ($2, a view column; none when empty), for up to
-# three seconds (the window may still be drawing), and fails if they never
-# are.
+# Takes screenshot $1 and tells whether the only blue columns of row 0 of
+# every channel are $2 (space separated view columns); sets $c to the first
+# channel where they are not and $got to its blue columns.
+cursor_columns_are() {
+    screenshot "$1"
+    c=0
+    while IFS= read -r got; do
+        [ "$got" = "$2" ] || break
+        c=$((c + 1))
+    done < <(blue_columns "$1")
+    [ "$c" = "${#VIEW_X[@]}" ]
+}
+
+# Fails unless the only blue columns of row 0 of every channel in
+# screenshot $1 are the cursor's ($2, a view column; none when empty),
+# taking the screenshot again for up to three seconds while the window may
+# still be drawing.
 expect_cursor_columns() {
-    local c got deadline=$(($(date +%s%N) + 3000000000))
-    while :; do
-        screenshot "$1"
-        c=0
-        while IFS= read -r got; do
-            [ "$got" = "$2" ] || break
-            c=$((c + 1))
-        done < <(blue_columns "$1")
-        [ "$c" = "${#VIEW_X[@]}" ] && return 0
-        [ "$(date +%s%N)" -lt "$deadline" ] || break
-        sleep 0.2
-    done
-    fail "$1: blue columns of channel $c are '$got', expected '$2' ($3)"
+    local c got
+    retry_for 3 cursor_columns_are "$1" "$2" || fail "$1: blue columns of channel $c are '$got', expected '$2' ($3)"
 }
 
 # Waits for a pop-up menu of the editor (a visible window of its own other
