@@ -4,10 +4,10 @@
 
 #include <atomic>
 #include <cmath>
-#include <cstring>
 
 #include "playback/AudioProducer.h"
 #include "playback/AudioSystem.h"
+#include "playback/SharedOutput.h"
 #include "support/Diagnostics.h"
 #include "support/SystemTime.h"
 
@@ -25,13 +25,14 @@ unsigned long Hex(status_t status)
 
 }  // namespace
 
-PlaybackGraph::PlaybackGraph(ChannelManager* manager, MessageTarget* window) : manager_(manager), window_(window)
+PlaybackGraph::PlaybackGraph(ChannelManager* manager, MessageTarget* window)
+    : manager_(manager), window_(window), output_(&SharedOutput::Instance())
 {
 }
 
 PlaybackGraph::~PlaybackGraph()
 {
-    CloseDevice();
+    LeaveOutput();
     producer_.reset();
     if (share_)
         AudioSystem::Release();
@@ -86,11 +87,12 @@ status_t PlaybackGraph::SetupNodes()
         char name[kMediaNameLength] = {};
         status = producer_->PrepareToConnect(source_, input, &format, &source, name);
         if (status == B_OK) {
-            status = OpenDevice(format);
-            if (status != B_OK && !fellBack) {
+            status = JoinOutput(format);
+            // An output already playing another format is no driver's fault.
+            if (status != B_OK && status != B_MEDIA_ALREADY_CONNECTED && !fellBack) {
                 fellBack = true;
                 if (FallBack())
-                    status = OpenDevice(format);
+                    status = JoinOutput(format);
             }
             producer_->Connect(status, source, input, format, name,
                 status == B_OK ? producer_->BufferDuration() : 0);
@@ -104,7 +106,8 @@ status_t PlaybackGraph::SetupNodes()
     }
     format_ = format;
     producer_->SetRunMode(B_INCREASE_LATENCY);
-    SDL_PauseAudioDevice(device_, 0);
+    // Connected: from the next period on the output serves the producer.
+    output_->Attach(producer_.get(), &timeSource_);
     return B_OK;
 }
 
@@ -115,54 +118,19 @@ bool PlaybackGraph::FallBack()
     return AudioSystem::SwitchDriver(fallbackDriver_.c_str(), share_, &share_);
 }
 
-status_t PlaybackGraph::OpenDevice(const MediaFormat& format)
+status_t PlaybackGraph::JoinOutput(const MediaFormat& format)
 {
-    const int64_t frames = format.channelCount > 0 ? format.bufferSize / 4 / format.channelCount : 0;
+    const status_t status = output_->Join(format);
+    if (status != B_OK)
+        return status;
+    device_ = output_->Device();
+    driverName_ = output_->DriverName();
+    // The clock starts now; it runs once the producer is attached.
     const long rate = std::lround(format.frameRate);
-    if (frames < 1 || frames > 65535 || rate < 1 || format.channelCount > 8) {
-        SDL_SetError("the format cannot be played");
-        return B_MEDIA_BAD_FORMAT;
-    }
-    SDL_AudioSpec wanted;
-    SDL_zero(wanted);
-    wanted.freq = int(rate);
-    wanted.format = AUDIO_F32SYS;
-    wanted.channels = Uint8(format.channelCount);
-    wanted.samples = Uint16(frames);
-    wanted.callback = &PlaybackGraph::DeviceCallback;
-    wanted.userdata = this;
-    SDL_AudioSpec obtained;
-    SDL_zero(obtained);
-    // No changes allowed: SDL converts and re-blocks to what the producer
-    // negotiated, so each callback is exactly one producer buffer.
     timeSource_.Reset(float(rate));
-    device_ = SDL_OpenAudioDevice(nullptr, 0, &wanted, &obtained, 0);
-    if (device_ == 0)
-        return B_MEDIA_SYSTEM_FAILURE;
-    deviceChannels_ = obtained.channels;
-    driverName_ = SDL_GetCurrentAudioDriver() ? SDL_GetCurrentAudioDriver() : "";
     // What lies downstream of the producer is one device period.
-    producer_->SetBufferDuration(int64_t(frames) * 1000000 / rate);
+    producer_->SetBufferDuration(SharedOutput::PeriodFrames(format) * 1000000 / rate);
     return B_OK;
-}
-
-void PlaybackGraph::DeviceCallback(void* userdata, Uint8* stream, int length)
-{
-    static_cast<PlaybackGraph*>(userdata)->ServeDevice(stream, length);
-}
-
-void PlaybackGraph::ServeDevice(Uint8* stream, int length)
-{
-    // Runs on SDL's audio thread. The device is closed before the producer
-    // goes, so the producer is there whenever this runs.
-    const int frameBytes = deviceChannels_ * int(sizeof(float));
-    if (producer_ == nullptr || deviceChannels_ != 2) {
-        std::memset(stream, 0, size_t(length));
-        return;
-    }
-    const int32_t frames = length / frameBytes;
-    producer_->ServeDevice(reinterpret_cast<float*>(stream), frames, timeSource_.FramesDelivered());
-    timeSource_.Advance(frames, system_time());
 }
 
 status_t PlaybackGraph::GetInitialLatency(int64_t* latency) const
@@ -209,21 +177,22 @@ void PlaybackGraph::StopNodes()
         producer_->Stop(0, true);
         return;
     }
-    // With the device locked no period is being served, so the stop is run
-    // here and now: once this returns nothing more is mixed, and the window
-    // may reset the play position safely.
+    // With the shared device locked no period is being served, so the stop
+    // is run here and now: once this returns nothing more is mixed for this
+    // window, and it may reset the play position safely. Other windows'
+    // producers wait for at most this one event.
     SDL_LockAudioDevice(device_);
     producer_->HandleEvent(MediaEvent{B_STOP, 0}, 0, true);
     SDL_UnlockAudioDevice(device_);
 }
 
-void PlaybackGraph::CloseDevice()
+void PlaybackGraph::LeaveOutput()
 {
     if (device_ == 0)
         return;
-    SDL_CloseAudioDevice(device_);
+    output_->Detach(producer_.get());
+    output_->Leave();
     device_ = 0;
-    deviceChannels_ = 0;
 }
 
 void PlaybackGraph::TearDownNodes()
@@ -231,7 +200,7 @@ void PlaybackGraph::TearDownNodes()
     if (!roster_ || producer_ == nullptr)
         return;
 
-    CloseDevice();
+    LeaveOutput();
     status_t status = B_MEDIA_NOT_CONNECTED;
     if (!(destination_ == MediaDestination::Null())) {
         producer_->Disconnect(source_, destination_);

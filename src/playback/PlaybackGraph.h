@@ -15,20 +15,25 @@ namespace glimmet {
 class AudioProducer;
 class ChannelManager;
 class MessageTarget;
+class SharedOutput;
 
 /// A document window's way to the sound server: its AudioProducer connected
-/// to an SDL audio device, both running on the device's clock.
+/// to the process's SharedOutput, running on a clock of its own that the
+/// output advances by what it plays of this producer.
 ///
 /// SetupNodes registers the producer, negotiates the format with it and
-/// opens the device; StartNodes and StopNodes start and stop the producer;
-/// TearDownNodes closes the device and deletes the producer. Failures are
-/// printed on standard output and returned. When the device cannot be opened
-/// the graph falls back to SDL's dummy driver, saying so in one line, so the
-/// editor keeps working without sound.
+/// joins the output (the first graph to join opens the device);
+/// StartNodes and StopNodes start and stop the producer; TearDownNodes
+/// leaves the output (the last graph to leave closes the device) and
+/// deletes the producer. Failures are printed on standard output and
+/// returned. When the device cannot be opened the graph falls back to SDL's
+/// dummy driver, saying so in one line, so the editor keeps working without
+/// sound.
 ///
 /// Thread use: every operation runs on the window thread, which must not
 /// hold the document lock while calling them (the device's audio thread
-/// takes it to mix).
+/// takes it to mix). Graphs of different windows may be set up, played and
+/// torn down from their own threads at the same time.
 class PlaybackGraph {
 public:
     /// The driver tried when the device cannot be opened.
@@ -55,20 +60,17 @@ public:
     DeviceTimeSource& TimeSource() { return timeSource_; }
     /// The SDL driver the device was opened on, empty before.
     const std::string& DriverName() const { return driverName_; }
+    /// The shared output's device while this graph plays through it, else 0.
     SDL_AudioDeviceID Device() const { return device_; }
 
     /// For tests: the driver tried after a failed open instead of "dummy".
     void SetFallbackDriver(const char* driver) { fallbackDriver_ = driver; }
 
 private:
-    static void DeviceCallback(void* userdata, Uint8* stream, int length);
-    void ServeDevice(Uint8* stream, int length);
-
-    status_t ConnectToDevice(MediaFormat* format);
-    status_t OpenDevice(const MediaFormat& format);
+    status_t JoinOutput(const MediaFormat& format);
     bool FallBack();
     status_t GetInitialLatency(int64_t* latency) const;
-    void CloseDevice();
+    void LeaveOutput();
 
     ChannelManager* manager_;  // not owned
     MessageTarget* window_;    // not owned
@@ -82,8 +84,8 @@ private:
     MediaDestination destination_;
     MediaFormat format_;
     DeviceTimeSource timeSource_;
-    SDL_AudioDeviceID device_ = 0;
-    int deviceChannels_ = 0;
+    SharedOutput* output_;     // not owned
+    SDL_AudioDeviceID device_ = 0;  // set while holding a place on output_
     std::string driverName_;
     std::string fallbackDriver_ = kFallbackDriver;
 };

@@ -7,6 +7,7 @@
 #include <QUuid>
 
 #include <atomic>
+#include <string>
 #include <thread>
 
 #include "AppTestSupport.h"
@@ -113,6 +114,35 @@ TEST(InstanceServer, GarbageOnTheSocketIsIgnored)
     sender.join();
     Drain();
     EXPECT_EQ(fixture.App().CountWindows(), 1);
+}
+
+TEST(InstanceServer, AStateRequestIsAnsweredByTheReporter)
+{
+    AppFixture fixture;
+    const QString name = UniqueName();
+    InstanceServer server(name, &fixture.App());
+    server.SetStateReporter([] { return std::string("{\"title\": \"one\"}\n{\"title\": \"two\"}\n"); });
+    std::atomic<bool> done{false};
+    std::string state;
+    bool answered = false;
+    std::thread asker([&] {
+        answered = InstanceServer::QueryState(name, &state);
+        done = true;
+    });
+    EXPECT_TRUE(QTest::qWaitFor([&] { return done.load(); }, 10000));
+    asker.join();
+    EXPECT_TRUE(answered);
+    EXPECT_EQ(state, "{\"title\": \"one\"}\n{\"title\": \"two\"}\n");
+    // A state request opens nothing.
+    Drain();
+    EXPECT_EQ(fixture.App().CountWindows(), 0);
+}
+
+TEST(InstanceServer, WithoutARunningInstanceTheStateIsNotAnswered)
+{
+    std::string state = "untouched";
+    EXPECT_FALSE(InstanceServer::QueryState(UniqueName(), &state, 200));
+    EXPECT_EQ(state, "untouched");
 }
 
 }  // namespace

@@ -24,14 +24,6 @@ std::vector<ChannelRecipe> Document(int64_t length)
     return {{test::RandomSamples(random, length, 100, 3000), 0, 0, false}};
 }
 
-int CountOccurrences(const std::string& text, const std::string& what)
-{
-    int count = 0;
-    for (size_t at = text.find(what); at != std::string::npos; at = text.find(what, at + 1))
-        count++;
-    return count;
-}
-
 class GraphTest : public ::testing::Test {
 protected:
     void SetUp() override
@@ -66,7 +58,7 @@ TEST_F(GraphTest, SetupConnectsTheProducerToTheDeviceInTheNegotiatedFormat)
     ASSERT_EQ(graph->SetupNodes(), B_OK);
     const std::string printed = capture.Finish();
     EXPECT_EQ(printed.rfind("\tno buffer size provided, suggesting 2048\n\tbuffer-filling took ", 0), 0u) << printed;
-    EXPECT_EQ(CountOccurrences(printed, "\n"), 2) << printed;
+    EXPECT_EQ(test::CountOccurrences(printed, "\n"), 2) << printed;
     EXPECT_EQ(graph->DriverName(), "disk");
     EXPECT_EQ(graph->Format().type, B_MEDIA_RAW_AUDIO);
     EXPECT_EQ(graph->Format().frameRate, 44100.0f);
@@ -199,8 +191,8 @@ TEST_F(GraphTest, ADeviceThatCannotBeOpenedFallsBackToTheDummyDriverWithOneLine)
     ASSERT_EQ(graph->SetupNodes(), B_OK);
     const std::string printed = capture.Finish();
     EXPECT_EQ(graph->DriverName(), "dummy");
-    EXPECT_EQ(CountOccurrences(printed, "No sound device could be opened ("), 1) << printed;
-    EXPECT_EQ(CountOccurrences(printed, "); playing through SDL's dummy driver\n"), 1) << printed;
+    EXPECT_EQ(test::CountOccurrences(printed, "No sound device could be opened ("), 1) << printed;
+    EXPECT_EQ(test::CountOccurrences(printed, "); playing through SDL's dummy driver\n"), 1) << printed;
     EXPECT_EQ(printed.find("\tno buffer size provided"), printed.find('\n') + 1) << printed;
     // The editor plays on, silently.
     ASSERT_EQ(graph->StartNodes(), B_OK);

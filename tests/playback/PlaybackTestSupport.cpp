@@ -336,4 +336,12 @@ int64_t FirstSound(const std::vector<float>& output)
     return -1;
 }
 
+int CountOccurrences(const std::string& text, const std::string& what)
+{
+    int count = 0;
+    for (size_t at = text.find(what); at != std::string::npos; at = text.find(what, at + 1))
+        count++;
+    return count;
+}
+
 }  // namespace glimmet::test

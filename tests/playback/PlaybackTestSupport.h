@@ -166,4 +166,7 @@ private:
 /// first float that is not 0, or -1.
 int64_t FirstSound(const std::vector<float>& output);
 
+/// How many times `what` stands in the text (overlaps counted).
+int CountOccurrences(const std::string& text, const std::string& what);
+
 }  // namespace glimmet::test
