@@ -12,6 +12,15 @@
 MOUSE_FAILED=""
 MOUSE_STARTED=$(date +%s%N)
 
+# A command failing outside the checks ends the script or the case through
+# `set -e` without a word; this says which one.
+mouse_stopped() {
+    echo "FAIL: stopped by a failing command: $1 (status $2, line $3)" >&2
+}
+MOUSE_ERR_TRAP='mouse_stopped "$BASH_COMMAND" "$?" "$LINENO"'
+set -o errtrace
+trap "$MOUSE_ERR_TRAP" ERR
+
 # Tenths of a second since $1 (from date +%s%N), as "S.T s".
 since() {
     local tenths=$((($(date +%s%N) - $1) / 100000000))
@@ -23,12 +32,16 @@ run_case() {
     local status=0 started
     started=$(date +%s%N)
     note "case $1"
+    # The case's own failure is reported below, not as a failing command.
     set +e
+    trap - ERR
     (
+        trap "$MOUSE_ERR_TRAP" ERR
         set -e
         "$1"
     )
     status=$?
+    trap "$MOUSE_ERR_TRAP" ERR
     set -e
     if [ "$status" = 0 ]; then
         note "case $1: ok ($(since "$started"))"
@@ -253,12 +266,14 @@ for row in sys.argv[2:]:
 # every channel are $2 (space separated view columns); sets $c to the first
 # channel where they are not and $got to its blue columns.
 cursor_columns_are() {
+    local columns
     screenshot "$1"
+    columns=$(blue_columns "$1")
     c=0
     while IFS= read -r got; do
         [ "$got" = "$2" ] || break
         c=$((c + 1))
-    done < <(blue_columns "$1")
+    done <<<"$columns"
     [ "$c" = "${#VIEW_X[@]}" ]
 }
 
