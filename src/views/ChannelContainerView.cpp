@@ -205,10 +205,14 @@ void ChannelContainerView::RedrawColumns(SampleView* view, float left, float rig
     view->Update(rect);
 }
 
-void ChannelContainerView::RedrawColumnInAll(float x)
+// A mark at x is drawn in the column whose frames hold it, which can lie one
+// column either side of PosAt's x (PosAt scales by span / (width - 1), the
+// columns by (span + 1) / width). Redrawing the neighbours too leaves no
+// stale mark behind.
+void ChannelContainerView::RedrawMarkInAll(float x)
 {
     for (SampleView* view : sampleViews_)
-        RedrawColumns(view, x, x);
+        RedrawColumns(view, x - 1, x + 1);
 }
 
 void ChannelContainerView::SetCursorFrame(int64_t frame)
@@ -220,8 +224,8 @@ void ChannelContainerView::SetCursorFrame(int64_t frame)
         oldX = 0;
     cursorFrame_ = frame;
     const float newX = PosAt(frame);
-    RedrawColumnInAll(oldX);
-    RedrawColumnInAll(newX);
+    RedrawMarkInAll(oldX);
+    RedrawMarkInAll(newX);
 }
 
 void ChannelContainerView::SetPlaymarkFrame(int64_t frame)
@@ -234,9 +238,9 @@ void ChannelContainerView::SetPlaymarkFrame(int64_t frame)
         playmarkFrame_ = frame;
         const bool newVisible = display_.Contains(frame);
         if (oldVisible)
-            RedrawColumnInAll(oldX);
+            RedrawMarkInAll(oldX);
         if (newVisible)
-            RedrawColumnInAll(PosAt(frame));
+            RedrawMarkInAll(PosAt(frame));
     }
     // The window sends the next play position only after this answer.
     if (window_ != nullptr)

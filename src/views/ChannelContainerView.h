@@ -173,7 +173,7 @@ private:
     void AddChannelAt(Channel* channel, int32_t index);
     void RemoveSampleViewAt(int32_t index);
     void InsertSampleView(SampleView* view, int32_t index);
-    void RedrawColumnInAll(float x);
+    void RedrawMarkInAll(float x);
 
     std::vector<SampleView*> sampleViews_;  // children of this widget
     ZoomSlider* zoomSlider_;

@@ -350,5 +350,22 @@ TEST_F(PartialRedraws, DoubleClickAndPlaymarkSteps)
     ExpectBothRendered();
 }
 
+TEST_F(PartialRedraws, AMarkMovedAwayLeavesNoColumnBehind)
+{
+    // The columns here do not hold whole numbers of frames, so the column a
+    // mark is drawn in is not always the one PosAt names.
+    ChannelContainerView& container = *fixture.container;
+    for (int64_t frame = 0; frame < 6000; frame += 97) {
+        container.SetCursorFrame(frame);
+        container.SetCursorFrame(5000);
+        container.SetPlaymarkFrame(frame);
+        container.SetPlaymarkFrame(4000);
+        SCOPED_TRACE(frame);
+        ExpectBothRendered();
+        if (HasFailure())
+            return;
+    }
+}
+
 }  // namespace
 }  // namespace glimmet::test
