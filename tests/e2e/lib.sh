@@ -51,19 +51,32 @@ e2e_begin() {
     # The editor's own leak check would report the toolkit's lifetime caches.
     export ASAN_OPTIONS="${ASAN_OPTIONS:-}:detect_leaks=0"
 
-    openbox --sm-disable >openbox.log 2>&1 &
-    E2E_PIDS="$E2E_PIDS $!"
+    start_window_manager || start_window_manager || fail "the window manager did not start"
+}
+
+# Starts openbox and waits until it manages the screen; false when it ended.
+start_window_manager() {
+    openbox --sm-disable >>openbox.log 2>&1 &
+    local wm=$!
+    E2E_PIDS="$E2E_PIDS $wm"
     for _ in $(seq 100); do
         xprop -root _NET_SUPPORTING_WM_CHECK 2>/dev/null | grep -q 'window id' && return 0
+        kill -0 "$wm" 2>/dev/null || return 1
         sleep 0.1
     done
-    fail "the window manager did not start"
+    return 1
 }
 
 e2e_cleanup() {
     [ -n "${app:-}" ] && kill "$app" 2>/dev/null || true
     for pid in ${E2E_PIDS:-}; do
         kill "$pid" 2>/dev/null || true
+    done
+    # The X server is gone, its socket and lock file with it, before the
+    # next session picks a display: a server still on its way out would
+    # remove the socket of a new one that took the same number.
+    for pid in ${E2E_PIDS:-}; do
+        wait "$pid" 2>/dev/null || true
     done
 }
 
