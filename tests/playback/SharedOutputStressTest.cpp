@@ -2,6 +2,8 @@
 
 #include <QEventLoop>
 
+#include <SDL.h>
+
 #include <atomic>
 #include <chrono>
 #include <cstdlib>
@@ -74,6 +76,9 @@ void PlayRounds(unsigned seed, Faults* faults)
         window.ProcessPending();
         pause();
     }
+    // SDL keeps state of its own (its error text) for every thread that
+    // calls it; a thread SDL did not start must hand it back itself.
+    SDL_TLSCleanup();
 }
 
 void ExpectNoFaults(const Faults& faults)
