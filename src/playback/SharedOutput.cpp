@@ -215,10 +215,13 @@ void SharedOutput::ServePeriod(float* out, int32_t frames)
 }
 
 // The first producer is copied rather than added to zero, so a lone
-// producer's samples arrive untouched (negative zeros included).
+// producer's samples arrive untouched (negative zeros included); only a sum
+// of several is a mix that needs the clip, and a lone one skips that pass.
 void SharedOutput::Sum(float* out, size_t count) const
 {
     std::copy_n(members_.front().scratch.data(), count, out);
+    if (members_.size() == 1)
+        return;
     for (size_t m = 1; m < members_.size(); m++) {
         const float* in = members_[m].scratch.data();
         for (size_t i = 0; i < count; i++)
