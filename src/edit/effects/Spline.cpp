@@ -1,4 +1,4 @@
-#include "views/Spline.h"
+#include "edit/effects/Spline.h"
 
 #include <algorithm>
 #include <limits>

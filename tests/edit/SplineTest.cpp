@@ -6,8 +6,8 @@
 #include <random>
 #include <vector>
 
-#include "views/Spline.h"
-#include "views/SplineReference.h"
+#include "edit/effects/Spline.h"
+#include "edit/SplineReference.h"
 
 namespace glimmet {
 namespace {
