@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 
 #include "edit/effects/SplineCurve.h"
 
@@ -35,5 +36,23 @@ public:
     /// Closes the dialog for good; it can no longer be locked afterwards.
     virtual void Quit() = 0;
 };
+
+/// For the effects that read their curve again at every redo: hides the
+/// dialog (it stays alive, hidden, for the redos) and returns the curve;
+/// nothing when the dialog cannot be read.
+///
+/// The dialog lives in the same thread as the action, so nothing can change
+/// it while the action runs: one reading per run gives the values a reading
+/// per sample would.
+inline std::optional<effects::SplineCurve> HideAndReadCurve(CurveDialog& dialog)
+{
+    if (!dialog.Lock())
+        return std::nullopt;
+    if (!dialog.IsHidden())
+        dialog.Hide();
+    effects::SplineCurve curve = dialog.Curve();
+    dialog.Unlock();
+    return curve;
+}
 
 }  // namespace glimmet
