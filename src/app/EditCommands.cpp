@@ -7,9 +7,13 @@
 #include "app/ActionRunner.h"
 #include "app/CommandTable.h"
 #include "edit/AddChannelAction.h"
+#include "edit/CompressorAction.h"
 #include "edit/CopyBuffer.h"
+#include "edit/DistortAction.h"
+#include "edit/EnvelopeAction.h"
 #include "edit/FadeInAction.h"
 #include "edit/FadeOutAction.h"
+#include "edit/FilterAction.h"
 #include "edit/MaximizeAction.h"
 #include "edit/MoveSampleAction.h"
 #include "edit/PasteAction.h"
@@ -19,6 +23,11 @@
 #include "edit/RevertPhasesAction.h"
 #include "edit/SelectionCopier.h"
 #include "edit/TruncateAction.h"
+#include "edit/dialogs/CParameterWindow.h"
+#include "edit/dialogs/CurveDialogLink.h"
+#include "edit/dialogs/DParameterWindow.h"
+#include "edit/dialogs/EParameterWindow.h"
+#include "edit/dialogs/FParameterWindow.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "support/MessageCodes.h"
@@ -58,11 +67,40 @@ const std::vector<ActionCommand>& ActionCommands()
     return commands;
 }
 
+using MakeCurveEffect = std::function<std::unique_ptr<Action>(MessageTarget* window, QWidget* dialogParent)>;
+
+/// An effect whose action is made with its dialog open and waiting.
+template <typename EffectAction, typename Dialog>
+MakeCurveEffect CurveEffect()
+{
+    return [](MessageTarget* window, QWidget* dialogParent) {
+        auto* dialog = new Dialog(dialogParent, window);
+        dialog->ShowAtHome();
+        return std::make_unique<EffectAction>(window, std::make_unique<CurveDialogLink>(dialog));
+    };
+}
+
+struct CurveEffectCommand {
+    uint32_t what;
+    MakeCurveEffect make;
+};
+
+const std::vector<CurveEffectCommand>& CurveEffectCommands()
+{
+    static const std::vector<CurveEffectCommand> commands{
+        {kMsgFilter, CurveEffect<FilterAction, FParameterWindow>()},
+        {kMsgDistort, CurveEffect<DistortAction, DParameterWindow>()},
+        {kMsgCompressor, CurveEffect<CompressorAction, CParameterWindow>()},
+        {kMsgEnvelope, CurveEffect<EnvelopeAction, EParameterWindow>()},
+    };
+    return commands;
+}
+
 }  // namespace
 
-EditCommands::EditCommands(MessageTarget& window, ChannelManager& manager, ActionRunner& actions,
-    CopyBuffer* copyBuffer)
-    : window_(window), manager_(manager), actions_(actions), copyBuffer_(copyBuffer)
+EditCommands::EditCommands(MessageTarget& window, QWidget* dialogParent, ChannelManager& manager,
+    ActionRunner& actions, CopyBuffer* copyBuffer)
+    : window_(window), dialogParent_(dialogParent), manager_(manager), actions_(actions), copyBuffer_(copyBuffer)
 {
 }
 
@@ -78,6 +116,7 @@ void EditCommands::AddTo(CommandTable& table)
     table.Add(kMsgPaste, [this] { Paste(); });
     table.Add(kMsgSampleMoved, [this](const Message& message) { SampleMoved(message); });
     AddActionCommands(table);
+    AddCurveEffectCommands(table);
 }
 
 void EditCommands::AddActionCommands(CommandTable& table)
@@ -85,6 +124,14 @@ void EditCommands::AddActionCommands(CommandTable& table)
     for (const ActionCommand& command : ActionCommands()) {
         const MakeAction& make = command.make;
         table.Add(command.what, [this, &make] { actions_.SetupAction(make(&window_)); });
+    }
+}
+
+void EditCommands::AddCurveEffectCommands(CommandTable& table)
+{
+    for (const CurveEffectCommand& command : CurveEffectCommands()) {
+        const MakeCurveEffect& make = command.make;
+        table.Add(command.what, [this, &make] { actions_.SetupAction(make(&window_, dialogParent_)); });
     }
 }
 

@@ -1,5 +1,7 @@
 #pragma once
 
+class QWidget;
+
 namespace glimmet {
 
 class ActionRunner;
@@ -16,10 +18,12 @@ class MessageTarget;
 /// GUI thread only.
 class EditCommands {
 public:
-    /// window is handed to every action for its parameter dialog. copyBuffer
-    /// is the application's, shared by all windows; null copies and pastes
-    /// nothing.
-    EditCommands(MessageTarget& window, ChannelManager& manager, ActionRunner& actions, CopyBuffer* copyBuffer);
+    /// window is handed to every action for its parameter dialog, which
+    /// belongs to dialogParent (the same window as a widget; null in tests
+    /// without one). copyBuffer is the application's, shared by all windows;
+    /// null copies and pastes nothing.
+    EditCommands(MessageTarget& window, QWidget* dialogParent, ChannelManager& manager, ActionRunner& actions,
+        CopyBuffer* copyBuffer);
 
     /// Adds the edit commands to table.
     void AddTo(CommandTable& table);
@@ -32,6 +36,8 @@ public:
 
 private:
     void AddActionCommands(CommandTable& table);
+    /// The effects that ask for a curve in a dialog first.
+    void AddCurveEffectCommands(CommandTable& table);
     void Cut();
     void Paste();
     /// 'smmd' from a channel's view: the drag of one sample, as an action
@@ -39,6 +45,7 @@ private:
     void SampleMoved(const Message& message);
 
     MessageTarget& window_;
+    QWidget* dialogParent_;
     ChannelManager& manager_;
     ActionRunner& actions_;
     CopyBuffer* copyBuffer_;

@@ -74,7 +74,7 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
         [this](const Message& message) { PostToApplication(message); });
     setMenuBar(menus_->Build(this));
     actions_ = std::make_unique<ActionRunner>(*this, *manager_, *containerView_, *history_, *menus_);
-    edits_ = std::make_unique<EditCommands>(*this, *manager_, *actions_, copyBuffer);
+    edits_ = std::make_unique<EditCommands>(*this, this, *manager_, *actions_, copyBuffer);
     saving_ = std::make_unique<SaveFlow>(*this, *this, *manager_, *history_, *menus_->Item(KeptMenuItem::Save));
     FillCommandTable();
 
