@@ -13,6 +13,7 @@
 #include <iostream>
 
 #include "app/ChannelScriptCommands.h"
+#include "app/DialogScriptCommands.h"
 #include "app/DocumentScriptCommands.h"
 #include "app/FileScriptCommands.h"
 #include "app/Quillex.h"
@@ -52,6 +53,7 @@ BatchRunner::BatchRunner(Quillex& application, QuillexWindow* window, std::FILE*
     ViewScriptCommands::AddTo(*this);
     FileScriptCommands::AddTo(*this, application);
     ReportScriptCommands::AddTo(*this, output_);
+    DialogScriptCommands::AddTo(*this, output_);
     // A script cannot click the alert's buttons; it says beforehand what the
     // question is to answer. Until then the default button answers.
     QuillexWindow::SetSaveQuestion([this](QuillexWindow*) { return saveAnswer_; });

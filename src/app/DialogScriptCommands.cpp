@@ -1,0 +1,187 @@
+#include "app/DialogScriptCommands.h"
+
+#include <QImage>
+#include <QPixmap>
+#include <QPushButton>
+
+#include <cmath>
+#include <cstdlib>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "app/BatchRunner.h"
+#include "app/DialogInput.h"
+#include "app/DocumentStateReport.h"
+#include "app/ScriptArguments.h"
+#include "edit/dialogs/CurveParameterWindow.h"
+#include "edit/dialogs/FParameterWindow.h"
+#include "edit/dialogs/SpinButton.h"
+#include "views/SplineControl.h"
+
+namespace glimmet {
+
+using Arguments = BatchRunner::Arguments;
+
+namespace {
+
+/// A finite number written in full, nothing else.
+bool ParseNumber(const std::string& text, double* value)
+{
+    if (text.empty())
+        return false;
+    char* end = nullptr;
+    *value = std::strtod(text.c_str(), &end);
+    return end == text.c_str() + text.size() && std::isfinite(*value);
+}
+
+/// The arguments from first on as numbers; false with the reason when one is
+/// not a finite number.
+bool ParsePoints(const Arguments& arguments, size_t first, std::vector<double>* numbers, std::string* reason)
+{
+    for (size_t i = first; i < arguments.size(); i++) {
+        double value = 0;
+        if (!ParseNumber(arguments[i], &value))
+            return ScriptArguments::Fail(reason, "curve takes normalised coordinates, not " + arguments[i]);
+        numbers->push_back(value);
+    }
+    return true;
+}
+
+std::string DialogJson(CurveParameterWindow* dialog)
+{
+    if (dialog == nullptr)
+        return "{\"title\": null}";
+    std::ostringstream out;
+    out << "{\"title\": " << DocumentStateReport::Quoted(dialog->windowTitle().toStdString()) << ", \"points\": [";
+    const SplineControl* control = dialog->Control();
+    const char* separator = "";
+    for (const QPointF& point : control->ControlPoints()) {
+        out << separator << '[' << DialogInput::ExactNumber(point.x()) << ", " << DialogInput::ExactNumber(point.y())
+            << ']';
+        separator = ", ";
+    }
+    out << ']';
+    if (auto* filter = qobject_cast<FParameterWindow*>(dialog))
+        out << ", \"passes\": " << DialogInput::ExactNumber(filter->PassesField()->value());
+    out << ", \"labels\": [" << DocumentStateReport::Quoted(control->FirstLabel().toStdString()) << ", "
+        << DocumentStateReport::Quoted(control->SecondLabel().toStdString()) << "]}";
+    return out.str();
+}
+
+/// The open dialog, or false with the reason.
+bool RequireDialog(BatchRunner& runner, CurveParameterWindow** dialog, std::string* reason)
+{
+    *dialog = DialogScriptCommands::OpenDialog(runner.Window());
+    if (*dialog == nullptr)
+        return ScriptArguments::Fail(reason, "no parameter dialog is open");
+    return true;
+}
+
+bool RunCurve(BatchRunner& runner, const Arguments& arguments, std::string* reason)
+{
+    const std::string& verb = arguments[0];
+    const size_t wanted = verb == "drag" ? 5 : 3;
+    if ((verb != "click" && verb != "rightclick" && verb != "drag") || arguments.size() != wanted)
+        return ScriptArguments::Fail(reason, "curve takes click X Y, rightclick X Y or drag X0 Y0 X1 Y1");
+    std::vector<double> numbers;
+    if (!ParsePoints(arguments, 1, &numbers, reason))
+        return false;
+    CurveParameterWindow* dialog = nullptr;
+    if (!RequireDialog(runner, &dialog, reason))
+        return false;
+    SplineControl* control = dialog->Control();
+    const QPoint from = DialogInput::CurvePixel(*control, numbers[0], numbers[1]);
+    if (verb == "drag")
+        DialogInput::Drag(control, from, DialogInput::CurvePixel(*control, numbers[2], numbers[3]));
+    else
+        DialogInput::Click(control, from, verb == "click" ? Qt::LeftButton : Qt::RightButton);
+    return true;
+}
+
+}  // namespace
+
+CurveParameterWindow* DialogScriptCommands::OpenDialog(QuillexWindow* window)
+{
+    if (window == nullptr)
+        return nullptr;
+    CurveParameterWindow* open = nullptr;
+    for (CurveParameterWindow* dialog : window->findChildren<CurveParameterWindow*>()) {
+        if (dialog->isVisible())
+            open = dialog;
+    }
+    return open;
+}
+
+void DialogScriptCommands::AddTo(BatchRunner& runner, std::FILE* output)
+{
+    AddCurveCommand(runner);
+    AddButtonCommands(runner);
+    AddFieldCommands(runner, output);
+}
+
+void DialogScriptCommands::AddCurveCommand(BatchRunner& runner)
+{
+    runner.AddCommand("curve", 3, 5, [&runner](const Arguments& arguments, std::string* reason) {
+        return RunCurve(runner, arguments, reason);
+    });
+}
+
+void DialogScriptCommands::AddButtonCommands(BatchRunner& runner)
+{
+    runner.AddCommand("ok", 0, 0, [&runner](const Arguments&, std::string* reason) {
+        CurveParameterWindow* dialog = nullptr;
+        if (!RequireDialog(runner, &dialog, reason))
+            return false;
+        DialogInput::ClickCentre(dialog->OkButton());
+        return true;
+    });
+    runner.AddCommand("cancel", 0, 0, [&runner](const Arguments&, std::string* reason) {
+        CurveParameterWindow* dialog = nullptr;
+        if (!RequireDialog(runner, &dialog, reason))
+            return false;
+        DialogInput::ClickCentre(dialog->CancelButton());
+        return true;
+    });
+    runner.AddCommand("close", 0, 0, [&runner](const Arguments&, std::string* reason) {
+        CurveParameterWindow* dialog = nullptr;
+        if (!RequireDialog(runner, &dialog, reason))
+            return false;
+        // What the close box does: a close request the dialog may refuse.
+        dialog->close();
+        return true;
+    });
+}
+
+void DialogScriptCommands::AddFieldCommands(BatchRunner& runner, std::FILE* output)
+{
+    runner.AddCommand("dialog", 0, 0, [&runner, output](const Arguments&, std::string*) {
+        BatchRunner::DrainEvents();
+        std::fprintf(output, "%s\n", DialogJson(OpenDialog(runner.Window())).c_str());
+        std::fflush(output);
+        return true;
+    });
+    runner.AddCommand("passes", 1, 1, [&runner](const Arguments& arguments, std::string* reason) {
+        CurveParameterWindow* dialog = nullptr;
+        if (!RequireDialog(runner, &dialog, reason))
+            return false;
+        auto* filter = qobject_cast<FParameterWindow*>(dialog);
+        if (filter == nullptr)
+            return ScriptArguments::Fail(reason, "the open dialog has no \"Filter passes:\" field");
+        DialogInput::TypeReplacing(filter->PassesField(), QString::fromStdString(arguments[0]));
+        return true;
+    });
+    runner.AddCommand("dialogshot", 1, 1, [&runner](const Arguments& arguments, std::string* reason) {
+        CurveParameterWindow* dialog = nullptr;
+        if (!RequireDialog(runner, &dialog, reason))
+            return false;
+        BatchRunner::DrainEvents();
+        QImage image = dialog->grab().toImage();
+        image.setDevicePixelRatio(1.0);
+        if (!image.save(QString::fromStdString(arguments[0]), "PNG"))
+            return ScriptArguments::Fail(reason, "cannot write " + arguments[0]);
+        return true;
+    });
+}
+
+}  // namespace glimmet
