@@ -22,6 +22,10 @@ namespace glimmet {
 ///
 /// The first label is drawn horizontally at the bottom right, the second
 /// rotated by 90 degrees along the left edge, reading upwards.
+///
+/// Geometry is fractional (the label room is the font's height); whatever is
+/// drawn lands on the pixel whose centre is nearest, halves going right and
+/// down, so a point's 5 x 5 square sits where its position rounds to.
 class SplineControl : public QWidget {
     Q_OBJECT
 

@@ -241,5 +241,27 @@ TEST(SplineControlPixels, LevelCurveIsOneRow)
     }
 }
 
+// Two points on one x make the spline divide by zero; the control still
+// draws its frame and points, and leaves out what is not a number.
+TEST(SplineControlPixels, CoincidentPointsStillDraw)
+{
+    SplineControl control("curve", "Time", "Gain", 0.25f, 0.75f);
+    control.resize(200, 150);
+    control.show();
+    ASSERT_TRUE(QTest::qWaitForWindowExposed(&control));
+    control.AddControlPoint({0.5, 0.2});
+    control.AddControlPoint({0.5, 0.7});
+    control.AddControlPoint({0.7, 0.4});
+    const QImage image = Render(control, kBackground);
+    const SplineGeometry g(control.font(), 200, 150);
+    EXPECT_EQ(Colour(image.pixel(g.frameLeft, g.frameTop)), Colour(qRgb(194, 194, 194)));
+    EXPECT_EQ(Colour(image.pixel(g.frameRight, g.frameBottom)), Colour(qRgb(255, 255, 255)));
+    EXPECT_EQ(Colour(image.pixel(g.frameLeft + 1, g.frameTop + 1)), Colour(qRgb(108, 108, 108)));
+    for (const QPointF& point : control.ControlPoints()) {
+        const QPointF centre = g.At(point);
+        EXPECT_EQ(Colour(image.pixel(NearestPixel(centre.x()), NearestPixel(centre.y()))), Colour(kRed));
+    }
+}
+
 }  // namespace
 }  // namespace glimmet::test

@@ -16,8 +16,8 @@
 
 namespace glimmet::test {
 
-/// What the curve control is expected to draw, worked out here from the
-/// description of its look rather than from the control's own code.
+/// What the curve control is expected to draw, worked out here on its own
+/// from how the control should look rather than from its code.
 ///
 /// Positions are fractional and pixels whole: a position stands for the pixel
 /// whose centre is nearest, halves going right and down.

@@ -173,6 +173,20 @@ TEST_F(SplineControlTest, CurveAreaLeavesRoomForTheLabels)
     EXPECT_DOUBLE_EQ(control.CurveArea().bottom(), 89.0 - g.room - 4);
 }
 
+TEST_F(SplineControlTest, AnotherFontMovesTheAreaAndTheMinimum)
+{
+    control.resize(200, 150);
+    control.show();
+    ASSERT_TRUE(QTest::qWaitForWindowExposed(&control));
+    QFont font = control.font();
+    font.setPixelSize(23);
+    control.setFont(font);
+    const SplineGeometry g(font, 200, 150);
+    EXPECT_DOUBLE_EQ(control.CurveArea().left(), g.left);
+    EXPECT_DOUBLE_EQ(control.CurveArea().bottom(), g.bottom);
+    EXPECT_EQ(control.minimumSizeHint(), QSize(Least("Time", 27), Least("Gain", 27)));
+}
+
 TEST_F(SplineControlTest, DisablingKeepsTheFlag)
 {
     control.SetEnabled(false);
