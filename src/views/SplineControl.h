@@ -5,6 +5,8 @@
 #include <QString>
 #include <QWidget>
 
+class QPainter;
+
 #include <vector>
 
 #include "edit/effects/Spline.h"
@@ -20,6 +22,10 @@ namespace glimmet {
 ///
 /// The first label is drawn horizontally at the bottom right, the second
 /// rotated by 90 degrees along the left edge, reading upwards.
+///
+/// Geometry is fractional (the label room is the font's height); whatever is
+/// drawn lands on the pixel whose centre is nearest, halves going right and
+/// down, so a point's 5 x 5 square sits where its position rounds to.
 class SplineControl : public QWidget {
     Q_OBJECT
 
@@ -75,16 +81,41 @@ protected:
     void mousePressEvent(QMouseEvent* event) override;
     void mouseMoveEvent(QMouseEvent* event) override;
     void mouseReleaseEvent(QMouseEvent* event) override;
+    /// Qt turns the second press of a double click into this event; for the
+    /// control it is just another press.
+    void mouseDoubleClickEvent(QMouseEvent* event) override;
+    void changeEvent(QEvent* event) override;
 
 private:
-    // (filled in by the implementation)
+    /// Ascent plus descent of the widget's font: the room kept for a label.
+    double LabelRoom() const;
+    void UpdateCurveArea();
+    void UpdateSizeLimits();
+    void GrowWindowIfNarrow();
+    void InvalidateCurve();
+    QPointF Normalised(QPointF position) const;
+
+    void PressPrimary(QPointF position);
+    void PressSecondary(QPointF position);
+    void DragTo(QPointF position);
+
+    // Drawing, in painting order; each later step may cover an earlier one.
+    void DrawStrips(QPainter& painter) const;
+    void DrawLabels(QPainter& painter) const;
+    void DrawFrame(QPainter& painter) const;
+    void DrawCurve(QPainter& painter) const;
+    void DrawControlPoints(QPainter& painter) const;
+
     std::vector<QPointF> points_;
-    int dragged_ = -1;
+    int dragged_ = -1;  // index into points_, -1 when nothing is dragged
     QString firstLabel_;
     QString secondLabel_;
     bool enabled_ = true;
     QRectF area_{QPointF(0, 0), QPointF(-1, -1)};
     Spline spline_;
+    // The spline again, wrapped the way effects read it, so that ValueAt and
+    // Curve share one definition of "outside [0, 1]".
+    effects::SplineCurve curve_;
 };
 
 }  // namespace glimmet
