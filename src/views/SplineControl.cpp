@@ -282,8 +282,10 @@ void SplineControl::GrowWindowIfNarrow()
 
 void SplineControl::InvalidateCurve()
 {
-    update(PixelRect(area_.left() - kFieldInset, area_.top() - kFieldInset, area_.right() + kFieldInset,
-        area_.bottom() + kFieldInset));
+    // The whole control, not just the field: a curve that overshoots is
+    // drawn across the frame and the labels, and redrawing only the field
+    // would leave its old path there.
+    update();
 }
 
 QPointF SplineControl::Normalised(QPointF position) const
