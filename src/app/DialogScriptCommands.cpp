@@ -6,7 +6,6 @@
 
 #include <cmath>
 #include <cstdlib>
-#include <sstream>
 #include <string>
 #include <vector>
 
@@ -46,27 +45,6 @@ bool ParsePoints(const Arguments& arguments, size_t first, std::vector<double>* 
         numbers->push_back(value);
     }
     return true;
-}
-
-std::string DialogJson(CurveParameterWindow* dialog)
-{
-    if (dialog == nullptr)
-        return "{\"title\": null}";
-    std::ostringstream out;
-    out << "{\"title\": " << DocumentStateReport::Quoted(dialog->windowTitle().toStdString()) << ", \"points\": [";
-    const SplineControl* control = dialog->Control();
-    const char* separator = "";
-    for (const QPointF& point : control->ControlPoints()) {
-        out << separator << '[' << DialogInput::ExactNumber(point.x()) << ", " << DialogInput::ExactNumber(point.y())
-            << ']';
-        separator = ", ";
-    }
-    out << ']';
-    if (auto* filter = qobject_cast<FParameterWindow*>(dialog))
-        out << ", \"passes\": " << DialogInput::ExactNumber(filter->PassesField()->value());
-    out << ", \"labels\": [" << DocumentStateReport::Quoted(control->FirstLabel().toStdString()) << ", "
-        << DocumentStateReport::Quoted(control->SecondLabel().toStdString()) << "]}";
-    return out.str();
 }
 
 /// The open dialog, or false with the reason.
@@ -157,7 +135,7 @@ void DialogScriptCommands::AddFieldCommands(BatchRunner& runner, std::FILE* outp
 {
     runner.AddCommand("dialog", 0, 0, [&runner, output](const Arguments&, std::string*) {
         BatchRunner::DrainEvents();
-        std::fprintf(output, "%s\n", DialogJson(OpenDialog(runner.Window())).c_str());
+        std::fprintf(output, "%s\n", DocumentStateReport::DialogJson(OpenDialog(runner.Window())).c_str());
         std::fflush(output);
         return true;
     });

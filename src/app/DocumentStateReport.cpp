@@ -2,19 +2,26 @@
 
 #include <QCheckBox>
 #include <QComboBox>
+#include <QPushButton>
 
 #include <cstdint>
 #include <cstdio>
 #include <mutex>
 #include <sstream>
 
+#include "app/DialogInput.h"
+#include "app/DialogScriptCommands.h"
 #include "app/QuillexWindow.h"
 #include "app/TextControl.h"
 #include "edit/HistoryManager.h"
+#include "edit/dialogs/CurveParameterWindow.h"
+#include "edit/dialogs/FParameterWindow.h"
+#include "edit/dialogs/SpinButton.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "views/ChannelContainerView.h"
 #include "views/SampleView.h"
+#include "views/SplineControl.h"
 
 namespace glimmet {
 
@@ -105,6 +112,40 @@ std::string DocumentStateReport::Json(QuillexWindow& window)
     return out.str();
 }
 
+std::string DocumentStateReport::DialogJson(CurveParameterWindow* dialog, bool onScreen)
+{
+    if (dialog == nullptr)
+        return "{\"title\": null}";
+    std::ostringstream out;
+    out << "{\"title\": " << DocumentStateReport::Quoted(dialog->windowTitle().toStdString()) << ", \"points\": [";
+    const SplineControl* control = dialog->Control();
+    const char* separator = "";
+    for (const QPointF& point : control->ControlPoints()) {
+        out << separator << '[' << DialogInput::ExactNumber(point.x()) << ", " << DialogInput::ExactNumber(point.y())
+            << ']';
+        separator = ", ";
+    }
+    out << ']';
+    if (auto* filter = qobject_cast<FParameterWindow*>(dialog))
+        out << ", \"passes\": " << DialogInput::ExactNumber(filter->PassesField()->value());
+    out << ", \"labels\": [" << DocumentStateReport::Quoted(control->FirstLabel().toStdString()) << ", "
+        << DocumentStateReport::Quoted(control->SecondLabel().toStdString()) << "]";
+    if (onScreen) {
+        const QRectF area = control->CurveArea();
+        const QPointF topLeft = control->mapToGlobal(area.topLeft());
+        const QPointF bottomRight = control->mapToGlobal(area.bottomRight());
+        out << ", \"area\": [" << DialogInput::ExactNumber(topLeft.x()) << ", "
+            << DialogInput::ExactNumber(topLeft.y()) << ", " << DialogInput::ExactNumber(bottomRight.x()) << ", "
+            << DialogInput::ExactNumber(bottomRight.y()) << "]";
+        const QPoint ok = dialog->OkButton()->mapToGlobal(dialog->OkButton()->rect().center());
+        const QPoint cancel = dialog->CancelButton()->mapToGlobal(dialog->CancelButton()->rect().center());
+        out << ", \"ok\": [" << ok.x() << ", " << ok.y() << "], \"cancel\": [" << cancel.x() << ", " << cancel.y()
+            << "]";
+    }
+    out << '}';
+    return out.str();
+}
+
 std::string DocumentStateReport::LiveJson(QuillexWindow& window)
 {
     std::string json = Json(window);
@@ -114,7 +155,8 @@ std::string DocumentStateReport::LiveJson(QuillexWindow& window)
     out << ", \"screen\": [" << screen.x() << ", " << screen.y() << "]"
         << ", \"active\": " << Boolean(window.isActiveWindow()) << ", \"playing\": " << Boolean(window.IsPlaying())
         << ", \"fields\": [" << Quoted(window.RangeStartField()->Text().toStdString()) << ", "
-        << Quoted(window.RangeEndField()->Text().toStdString()) << "]}";
+        << Quoted(window.RangeEndField()->Text().toStdString()) << "]"
+        << ", \"dialog\": " << DialogJson(DialogScriptCommands::OpenDialog(&window), true) << '}';
     return json + out.str();
 }
 

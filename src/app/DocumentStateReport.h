@@ -4,6 +4,7 @@
 
 namespace glimmet {
 
+class CurveParameterWindow;
 class QuillexWindow;
 
 /// The state of a document window as one line of JSON, for scripts that
@@ -23,8 +24,16 @@ public:
     static std::string Json(QuillexWindow& window);
     /// Json, followed by what only a window on a screen has:
     ///   "screen": [X, Y] (the window's top left on the screen),
-    ///   "active": B, "playing": B, "fields": [START TEXT, END TEXT].
+    ///   "active": B, "playing": B, "fields": [START TEXT, END TEXT],
+    ///   "dialog": the open parameter dialog, on screen (see DialogJson).
     static std::string LiveJson(QuillexWindow& window);
+    /// The parameter dialog: {"title": T, "points": [[X, Y], ...],
+    /// "passes": N (FIR only), "labels": [FIRST, SECOND]}, each number
+    /// written so that it reads back as exactly the stored value, or
+    /// {"title": null} for none. onScreen adds "area": the curve area's
+    /// left, top, right and bottom on the screen, and "ok" and "cancel", the
+    /// centres of the two buttons there.
+    static std::string DialogJson(CurveParameterWindow* dialog, bool onScreen = false);
     /// text as a JSON string literal, quotes included.
     static std::string Quoted(const std::string& text);
 };
