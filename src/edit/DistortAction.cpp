@@ -1,7 +1,5 @@
 #include "edit/DistortAction.h"
 
-#include <span>
-
 #include "edit/effects/Distortion.h"
 
 namespace glimmet {
@@ -17,39 +15,19 @@ double Silence(double)
 
 }  // namespace
 
-DistortAction::DistortAction(MessageTarget* window, std::unique_ptr<CurveDialog> dialog)
-    : Action(window), dialog_(std::move(dialog))
-{
-}
-
-DistortAction::~DistortAction()
-{
-    if (dialog_)
-        dialog_->Quit();
-}
-
 status_t DistortAction::Go()
 {
-    if (InitCheck() != B_OK || !dialog_)
-        return B_ERROR;
-    const std::optional<effects::SplineCurve> curve = HideAndReadCurve(*dialog_);
-    return TransformSelectedRanges([&curve](int16_t* samples, int64_t count) {
-        const std::span<int16_t> range(samples, size_t(count));
-        if (curve)
-            effects::Distort(range, *curve);
+    return ShapeSelectedRanges([](std::span<int16_t> samples, const effects::SplineCurve* curve) {
+        if (curve != nullptr)
+            effects::Distort(samples, *curve);
         else
-            effects::Distort(range, Silence);
+            effects::Distort(samples, Silence);
     });
 }
 
 const char* DistortAction::Name()
 {
     return "Distortion";
-}
-
-bool DistortAction::SupportsConfiguration()
-{
-    return true;
 }
 
 }  // namespace glimmet

@@ -1,7 +1,5 @@
 #include "edit/EnvelopeAction.h"
 
-#include <span>
-
 #include "edit/effects/EnvelopeShape.h"
 
 namespace glimmet {
@@ -16,39 +14,19 @@ double Silence(double)
 
 }  // namespace
 
-EnvelopeAction::EnvelopeAction(MessageTarget* window, std::unique_ptr<CurveDialog> dialog)
-    : Action(window), dialog_(std::move(dialog))
-{
-}
-
-EnvelopeAction::~EnvelopeAction()
-{
-    if (dialog_)
-        dialog_->Quit();
-}
-
 status_t EnvelopeAction::Go()
 {
-    if (InitCheck() != B_OK || !dialog_)
-        return B_ERROR;
-    const std::optional<effects::SplineCurve> curve = HideAndReadCurve(*dialog_);
-    return TransformSelectedRanges([&curve](int16_t* samples, int64_t count) {
-        const std::span<int16_t> range(samples, size_t(count));
-        if (curve)
-            effects::ApplyEnvelope(range, *curve);
+    return ShapeSelectedRanges([](std::span<int16_t> samples, const effects::SplineCurve* curve) {
+        if (curve != nullptr)
+            effects::ApplyEnvelope(samples, *curve);
         else
-            effects::ApplyEnvelope(range, Silence);
+            effects::ApplyEnvelope(samples, Silence);
     });
 }
 
 const char* EnvelopeAction::Name()
 {
     return "Envelope";
-}
-
-bool EnvelopeAction::SupportsConfiguration()
-{
-    return true;
 }
 
 }  // namespace glimmet

@@ -11,17 +11,6 @@
 
 namespace glimmet {
 
-FilterAction::FilterAction(MessageTarget* window, std::unique_ptr<CurveDialog> dialog)
-    : Action(window), dialog_(std::move(dialog))
-{
-}
-
-FilterAction::~FilterAction()
-{
-    if (dialog_)
-        dialog_->Quit();
-}
-
 status_t FilterAction::Go()
 {
     if (InitCheck() != B_OK)
@@ -34,13 +23,13 @@ status_t FilterAction::Go()
 
 void FilterAction::ReadDialog()
 {
-    if (!dialog_ || !dialog_->Lock())
+    CurveDialog* dialog = Dialog();
+    if (dialog == nullptr || !dialog->Lock())
         return;
-    const int32_t taps = dialog_->NumPasses();
-    const effects::SplineCurve curve = dialog_->Curve();
-    dialog_->Unlock();
-    dialog_->Quit();
-    dialog_.reset();
+    const int32_t taps = dialog->NumPasses();
+    const effects::SplineCurve curve = dialog->Curve();
+    dialog->Unlock();
+    CloseDialog();
     if (taps > kMaxTaps) {
         Diagnostics::Print("FIR Filter: %d passes are more than the %d a filter may have; nothing was filtered.\n",
             int(taps), int(kMaxTaps));
@@ -80,11 +69,6 @@ status_t FilterAction::FilterSelected()
 const char* FilterAction::Name()
 {
     return "FIR Filter";
-}
-
-bool FilterAction::SupportsConfiguration()
-{
-    return true;
 }
 
 }  // namespace glimmet

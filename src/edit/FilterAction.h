@@ -1,11 +1,9 @@
 #pragma once
 
 #include <cstdint>
-#include <memory>
 #include <vector>
 
-#include "edit/Action.h"
-#include "edit/CurveDialog.h"
+#include "edit/CurveEffectAction.h"
 
 namespace glimmet {
 
@@ -16,16 +14,14 @@ namespace glimmet {
 /// The first run reads the dialog, builds the kernel and closes the dialog;
 /// every redo filters again with that kernel. Undo and redo are the base
 /// ones.
-class FilterAction : public Action {
+class FilterAction : public CurveEffectAction {
 public:
     /// More taps than this are refused with a message, leaving the channels
     /// as they are: each tap costs one multiplication per frame, so a count
     /// typed by mistake could otherwise keep the editor busy for days.
     static constexpr int32_t kMaxTaps = 8192;
 
-    /// dialog is the open "FIR Filter" dialog, answering window; owned.
-    FilterAction(MessageTarget* window, std::unique_ptr<CurveDialog> dialog);
-    ~FilterAction() override;
+    using CurveEffectAction::CurveEffectAction;
 
     /// B_ERROR when the action is not bound. No kernel (a tap count of 0 or
     /// less, too many taps, or a first run whose dialog could not be read)
@@ -33,9 +29,6 @@ public:
     /// the working buffers cannot be had.
     status_t Go() override;
     const char* Name() override;
-    bool SupportsConfiguration() override;
-
-    CurveDialog* Dialog() const { return dialog_.get(); }
     const std::vector<double>& Kernel() const { return kernel_; }
 
 private:
@@ -44,7 +37,6 @@ private:
     void ReadDialog();
     status_t FilterSelected();
 
-    std::unique_ptr<CurveDialog> dialog_;
     std::vector<double> kernel_;
 };
 
