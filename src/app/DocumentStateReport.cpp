@@ -11,9 +11,11 @@
 
 #include "app/DialogInput.h"
 #include "app/DialogScriptCommands.h"
+#include "app/Quillex.h"
 #include "app/QuillexWindow.h"
 #include "app/TextControl.h"
 #include "edit/HistoryManager.h"
+#include "files/panel/SndFilePanel.h"
 #include "edit/dialogs/CurveParameterWindow.h"
 #include "edit/dialogs/FParameterWindow.h"
 #include "edit/dialogs/SpinButton.h"
@@ -146,6 +148,22 @@ std::string DocumentStateReport::DialogJson(CurveParameterWindow* dialog, bool o
     return out.str();
 }
 
+std::string DocumentStateReport::PanelJson(SndFilePanel* panel)
+{
+    if (panel == nullptr || !panel->isVisible())
+        return "null";
+    std::ostringstream out;
+    out << "{\"title\": " << Quoted(panel->windowTitle().toStdString()) << ", \"folder\": "
+        << Quoted(panel->directory().absolutePath().toStdString()) << ", \"listed\": [";
+    const char* separator = "";
+    for (const QString& name : panel->ListedNames()) {
+        out << separator << Quoted(name.toStdString());
+        separator = ", ";
+    }
+    out << "]}";
+    return out.str();
+}
+
 std::string DocumentStateReport::LiveJson(QuillexWindow& window)
 {
     std::string json = Json(window);
@@ -156,7 +174,9 @@ std::string DocumentStateReport::LiveJson(QuillexWindow& window)
         << ", \"active\": " << Boolean(window.isActiveWindow()) << ", \"playing\": " << Boolean(window.IsPlaying())
         << ", \"fields\": [" << Quoted(window.RangeStartField()->Text().toStdString()) << ", "
         << Quoted(window.RangeEndField()->Text().toStdString()) << "]"
-        << ", \"dialog\": " << DialogJson(DialogScriptCommands::OpenDialog(&window), true) << '}';
+        << ", \"dialog\": " << DialogJson(DialogScriptCommands::OpenDialog(&window), true)
+        << ", \"panel\": " << PanelJson(Quillex::Instance() != nullptr ? Quillex::Instance()->OpenPanel() : nullptr)
+        << '}';
     return json + out.str();
 }
 

@@ -6,6 +6,7 @@ namespace glimmet {
 
 class CurveParameterWindow;
 class QuillexWindow;
+class SndFilePanel;
 
 /// The state of a document window as one line of JSON, for scripts that
 /// drive the editor headless and check what it did:
@@ -25,7 +26,8 @@ public:
     /// Json, followed by what only a window on a screen has:
     ///   "screen": [X, Y] (the window's top left on the screen),
     ///   "active": B, "playing": B, "fields": [START TEXT, END TEXT],
-    ///   "dialog": the open parameter dialog, on screen (see DialogJson).
+    ///   "dialog": the open parameter dialog, on screen (see DialogJson),
+    ///   "panel": the open panel (see PanelJson).
     static std::string LiveJson(QuillexWindow& window);
     /// The parameter dialog: {"title": T, "points": [[X, Y], ...],
     /// "passes": N (FIR only), "labels": [FIRST, SECOND]}, each number
@@ -34,6 +36,9 @@ public:
     /// left, top, right and bottom on the screen, and "ok" and "cancel", the
     /// centres of the two buttons there.
     static std::string DialogJson(CurveParameterWindow* dialog, bool onScreen = false);
+    /// The open panel while it is shown: {"title": T, "folder": PATH,
+    /// "listed": [NAME, ...]}; null when it is not.
+    static std::string PanelJson(SndFilePanel* panel);
     /// text as a JSON string literal, quotes included.
     static std::string Quoted(const std::string& text);
 };

@@ -7,6 +7,7 @@
 #include "app/BatchRunner.h"
 #include "app/Quillex.h"
 #include "app/ScriptArguments.h"
+#include "files/panel/SndFilePanel.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
 

@@ -3,13 +3,13 @@
 #include <QCoreApplication>
 #include <QDesktopServices>
 #include <QFileDialog>
-#include <QMimeDatabase>
 #include <QUrl>
 
 #include <algorithm>
 #include <mutex>
 
 #include "app/QuillexWindow.h"
+#include "files/panel/SndFilePanel.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
 
@@ -18,19 +18,6 @@ namespace glimmet {
 namespace {
 
 Quillex* gApplication = nullptr;
-
-/// "Sound files (*.wav *.mp3 ...)" from every audio type the system knows.
-QString SoundFileFilter()
-{
-    QStringList patterns;
-    for (const QMimeType& type : QMimeDatabase().allMimeTypes()) {
-        if (type.name().startsWith(QStringLiteral("audio")))
-            patterns << type.globPatterns();
-    }
-    patterns.removeDuplicates();
-    patterns.sort();
-    return QStringLiteral("Sound files (") + patterns.join(' ') + QStringLiteral(")");
-}
 
 }  // namespace
 
@@ -229,11 +216,7 @@ void Quillex::MessageReceived(const Message& message)
 void Quillex::ShowOpenPanel()
 {
     if (!openPanel_) {
-        openPanel_ = std::make_unique<QFileDialog>();
-        openPanel_->setOption(QFileDialog::DontUseNativeDialog);
-        openPanel_->setFileMode(QFileDialog::ExistingFiles);
-        openPanel_->setAcceptMode(QFileDialog::AcceptOpen);
-        openPanel_->setNameFilters({SoundFileFilter(), QStringLiteral("All files (*)")});
+        openPanel_ = std::make_unique<SndFilePanel>();
         connect(openPanel_.get(), &QFileDialog::filesSelected, this, &Quillex::OpenPanelChose);
         connect(openPanel_.get(), &QFileDialog::rejected, this, [this] { PostMessage(kMsgCancel); });
     } else {

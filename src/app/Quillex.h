@@ -14,9 +14,9 @@
 #include "support/Handler.h"
 #include "support/Locker.h"
 
-class QFileDialog;
-
 namespace glimmet {
+
+class SndFilePanel;
 
 /// The application object: the list of open document windows, the open
 /// panel, and the commands that concern the whole program. There is one per
@@ -79,7 +79,7 @@ public:
     /// The window whose "Open…" is waiting for the open panel, or null.
     QuillexWindow* OpenRequestingWindow() const { return openRequestingWindow_; }
     /// The open panel, made on first use; null before.
-    QFileDialog* OpenPanel() const { return openPanel_.get(); }
+    SndFilePanel* OpenPanel() const { return openPanel_.get(); }
     bool IsBubbleHelpEnabled() const { return bubbleHelpEnabled_; }
 
     /// What ends the event loop once QuitRequested agrees; tests replace it
@@ -102,7 +102,7 @@ private:
     std::vector<QuillexWindow*> windows_;  // guarded by windowLock_
     Locker windowLock_;
     QPointer<QuillexWindow> openRequestingWindow_;
-    std::unique_ptr<QFileDialog> openPanel_;
+    std::unique_ptr<SndFilePanel> openPanel_;
     CopyBuffer copyBuffer_;
     bool bubbleHelpEnabled_ = false;
     std::function<void()> quitHook_;

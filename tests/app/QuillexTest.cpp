@@ -6,6 +6,7 @@
 
 #include "AppTestSupport.h"
 #include "app/MenuTable.h"
+#include "files/panel/SndFilePanel.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet::test {
