@@ -35,7 +35,7 @@ status_t EnvelopeAction::Go()
     return TransformSelectedRanges([&curve](int16_t* samples, int64_t count) {
         const std::span<int16_t> range(samples, size_t(count));
         if (curve)
-            effects::ApplyEnvelope(range, *curve);
+            effects::ApplySplineEnvelope(range, *curve);
         else
             effects::ApplyEnvelope(range, Silence);
     });
