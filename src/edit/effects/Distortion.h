@@ -4,8 +4,8 @@
 #include <concepts>
 #include <cstddef>
 #include <cstdint>
-#include <memory>
 #include <span>
+#include <vector>
 
 #include "edit/effects/EffectStore.h"
 
@@ -48,7 +48,7 @@ public:
     static constexpr size_t kSize = 65536;
 
     template <std::invocable<double> Curve>
-    explicit DistortionTable(Curve& curve)
+    explicit DistortionTable(Curve& curve) : table_(kSize)
     {
         for (size_t i = 0; i < kSize; ++i) {
             table_[i] = DistortSample(int16_t(int32_t(i) - 32768), curve);
@@ -63,7 +63,7 @@ public:
     }
 
 private:
-    int16_t table_[kSize];
+    std::vector<int16_t> table_;
 };
 
 /// DistortSample applied to every sample in place. A buffer shorter than the
@@ -78,8 +78,7 @@ void Distort(std::span<int16_t> samples, Curve&& curve)
         }
         return;
     }
-    const auto table = std::make_unique<DistortionTable>(curve);
-    table->Apply(samples);
+    DistortionTable(curve).Apply(samples);
 }
 
 }  // namespace glimmet::effects
