@@ -7,6 +7,8 @@
 #include <cstdint>
 #include <cstring>
 #include <random>
+#include <span>
+#include <stdexcept>
 #include <vector>
 
 #include "EffectReference.h"
@@ -125,6 +127,34 @@ TEST(EnvelopeGainsTest, GainsOfAnyStretchAreThoseOfTheWholeRange)
         stretches.Compute(first, part);
         ASSERT_TRUE(std::equal(part.begin(), part.end(), whole.begin() + std::ptrdiff_t(first))) << first;
     }
+}
+
+TEST(EnvelopeGainsTest, RangesShapedTogetherAreShapedAsEachAlone)
+{
+    std::mt19937 random(46);
+    for (size_t length : {size_t(1), size_t(2048), size_t(5001)}) {
+        const SplineCurve curve = RandomCurve(random, 7, -0.5, 1.5);
+        std::vector<std::vector<int16_t>> channels;
+        for (uint32_t c = 0; c < 3; ++c) {
+            channels.push_back(test::EffectSamples(47 + c, length));
+            channels.back().resize(length);
+        }
+        std::vector<std::span<int16_t>> ranges;
+        for (std::vector<int16_t>& channel : channels)
+            ranges.emplace_back(channel);
+        const std::vector<std::vector<int16_t>> before = channels;
+        effects::ApplySplineEnvelopeTogether(ranges, curve);
+        for (size_t c = 0; c < channels.size(); ++c)
+            ASSERT_EQ(channels[c], ReferenceEnvelope(before[c], curve)) << "channel " << c << ", " << length;
+    }
+}
+
+TEST(EnvelopeGainsTest, RangesOfDifferentLengthsAreRefused)
+{
+    std::vector<int16_t> a(10, 1);
+    std::vector<int16_t> b(11, 1);
+    const std::vector<std::span<int16_t>> ranges = {a, b};
+    EXPECT_THROW(effects::ApplySplineEnvelopeTogether(ranges, SplineCurve()), std::invalid_argument);
 }
 
 TEST(EnvelopeGainsTest, ApplyGainsStoresLikeOneSidedTruncation)

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <stdexcept>
 
 #include "edit/effects/VectorClones.h"
 
@@ -104,6 +105,29 @@ void ApplySplineEnvelope(std::span<int16_t> samples, const SplineCurve& curve)
         const std::span<double> block(gains.data(), n);
         envelope.Compute(first, block);
         ApplyGains(block, samples.subspan(first, n));
+    }
+}
+
+void ApplySplineEnvelopeTogether(std::span<const std::span<int16_t>> ranges, const SplineCurve& curve)
+{
+    if (ranges.empty()) {
+        return;
+    }
+    const size_t count = ranges.front().size();
+    for (const std::span<int16_t>& range : ranges) {
+        if (range.size() != count) {
+            throw std::invalid_argument("ApplySplineEnvelopeTogether: the ranges differ in length");
+        }
+    }
+    EnvelopeGains envelope(curve, count);
+    std::vector<double> gains(kBlockFrames);
+    for (size_t first = 0; first < count; first += kBlockFrames) {
+        const size_t n = std::min(kBlockFrames, count - first);
+        const std::span<double> block(gains.data(), n);
+        envelope.Compute(first, block);
+        for (const std::span<int16_t>& range : ranges) {
+            ApplyGains(block, range.subspan(first, n));
+        }
     }
 }
 

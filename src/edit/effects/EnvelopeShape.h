@@ -66,4 +66,8 @@ void ApplyGains(std::span<const double> gains, std::span<int16_t> samples);
 /// and ApplyGains.
 void ApplySplineEnvelope(std::span<int16_t> samples, const SplineCurve& curve);
 
+/// ApplySplineEnvelope over several ranges of the same length (the channels
+/// of one selection), each frame's gain computed once for all of them.
+void ApplySplineEnvelopeTogether(std::span<const std::span<int16_t>> ranges, const SplineCurve& curve);
+
 }  // namespace glimmet::effects

@@ -183,14 +183,29 @@ void PeakDistortWithGains(std::span<int16_t> samples, const PeakGains& gains)
 {
     int16_t spare = 0;
     size_t i = 0;
-    while (i < samples.size()) {
-        const SampleRun positive = PositiveRun(samples, i);
-        if (positive.length > 1) {
-            ScaleRun(samples, positive, gains.Of(positive.peak), spare);
+    const size_t n = samples.size();
+    while (i < n) {
+        // A zero starts no run of either sign, so the step from it is one
+        // sample; runs of zeros are common (silence), and the scans are
+        // skipped for them.
+        if (samples[i] == 0) {
+            ++i;
+            continue;
         }
-        const SampleRun negative = NegativeRun(samples, positive.begin + positive.length);
-        if (negative.length > 1) {
-            ScaleRun(samples, negative, gains.Of(negative.peak), spare);
+        SampleRun positive{i, 0, 0};
+        if (samples[i] >= 1) {
+            positive = PositiveRun(samples, i);
+            if (positive.length > 1) {
+                ScaleRun(samples, positive, gains.Of(positive.peak), spare);
+            }
+        }
+        const size_t u = positive.begin + positive.length;
+        SampleRun negative{u, 0, 0};
+        if (u < n && samples[u] <= -1) {
+            negative = NegativeRun(samples, u);
+            if (negative.length > 1) {
+                ScaleRun(samples, negative, gains.Of(negative.peak), spare);
+            }
         }
         i = negative.begin + negative.length + 1;
     }
