@@ -3,10 +3,10 @@
 //
 // Each benchmark times Go() on fresh data (binding and the undo between runs
 // are not timed) and, in the same iteration, a memcpy of the selected bytes;
-// it reports both (mean and best of the runs) and their ratios. The FIR
-// benchmark also runs sox's `fir` with the same coefficients over a WAV of
-// the same hour, in the same process, and reports its time and Go's ratio
-// to it.
+// it reports both (mean and best of the runs, and the CPU time of each) and
+// their ratios. The FIR benchmark also runs sox's `fir` with the same
+// coefficients over a WAV of the same hour, in the same process, and reports
+// its time and Go's ratio to it.
 //
 // After the first run, the output is compared with the effect's arithmetic
 // written out again here (at a few thousand positions, at every distinct
@@ -24,6 +24,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <ctime>
 #include <filesystem>
 #include <functional>
 #include <memory>
@@ -319,6 +320,16 @@ double SoxFilterSeconds(const Document& document)
     return status == 0 ? seconds : -1;
 }
 
+/// CPU seconds of the calling thread: what Go and the memcpy cost
+/// themselves, without the time others' work on a shared machine took from
+/// them.
+double ThreadCpuSeconds()
+{
+    timespec now{};
+    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &now);
+    return double(now.tv_sec) + 1e-9 * double(now.tv_nsec);
+}
+
 using MakeAction = std::function<std::unique_ptr<Action>()>;
 
 template <typename T>
@@ -342,24 +353,30 @@ bool RunEffect(benchmark::State& state, Document& document, const MakeAction& ma
     // The least disturbed run of each, on a machine shared with others.
     double goBest = 0;
     double memcpyBest = 0;
+    double goCpu = 0;
+    double memcpyCpu = 0;
     bool checked = false;
     for (auto _ : state) {
         std::unique_ptr<Action> action = make();
         SampleAllocator::Shared().ReleaseCached();
         action->SetTo(&document.manager, &document.position);
 
+        double cpu = ThreadCpuSeconds();
         auto begin = std::chrono::steady_clock::now();
         action->Go();
         const double go = Seconds(std::chrono::steady_clock::now() - begin);
+        goCpu += ThreadCpuSeconds() - cpu;
         goTotal += go;
         goBest = goBest == 0 ? go : std::min(goBest, go);
         state.SetIterationTime(go);
 
+        cpu = ThreadCpuSeconds();
         begin = std::chrono::steady_clock::now();
         std::memcpy(destination.data(), source.data(), bytes);
         benchmark::DoNotOptimize(destination.data());
         benchmark::ClobberMemory();
         const double copy = Seconds(std::chrono::steady_clock::now() - begin);
+        memcpyCpu += ThreadCpuSeconds() - cpu;
         memcpyTotal += copy;
         memcpyBest = memcpyBest == 0 ? copy : std::min(memcpyBest, copy);
 
@@ -380,6 +397,9 @@ bool RunEffect(benchmark::State& state, Document& document, const MakeAction& ma
     state.counters["go_best_s"] = goBest;
     state.counters["memcpy_best_s"] = memcpyBest;
     state.counters["best_go_over_best_memcpy"] = goBest / memcpyBest;
+    state.counters["go_cpu_s"] = goCpu / runs;
+    state.counters["memcpy_cpu_s"] = memcpyCpu / runs;
+    state.counters["cpu_go_over_memcpy"] = goCpu / memcpyCpu;
     state.counters["selected_MB"] = double(bytes) / 1e6;
     return true;
 }
