@@ -2,8 +2,10 @@
 
 #include <cmath>
 #include <concepts>
+#include <cstddef>
 #include <cstdint>
 #include <span>
+#include <vector>
 
 #include "edit/effects/EffectStore.h"
 
@@ -17,8 +19,9 @@ namespace glimmet::effects {
 ///
 /// The curve is any callable taking and returning a number; it is called
 /// with a double and its result is used as a double, the signature of the
-/// curve control's ValueAt. It is evaluated once per sample, in order,
-/// without tabulation.
+/// curve control's ValueAt. It must depend on its argument alone, as that
+/// control's curve does: over a long buffer Distort evaluates it once per
+/// input value instead of once per sample (see Distort).
 
 /// One sample:
 ///   s < 0:  trunc((1 - curve(|s / 32768|)) * -32768)
@@ -37,13 +40,45 @@ int16_t DistortSample(int16_t sample, Curve& curve)
     return StoreOneSided(32767.0 * (1.0 - value));
 }
 
-/// DistortSample applied to every sample in place, first to last.
+/// DistortSample for all 65,536 sample values. The result depends on the
+/// sample alone, so looking it up here is the same as computing it, and a
+/// lookup costs far less than a spline evaluation.
+class DistortionTable {
+public:
+    static constexpr size_t kSize = 65536;
+
+    template <std::invocable<double> Curve>
+    explicit DistortionTable(Curve& curve) : table_(kSize)
+    {
+        for (size_t i = 0; i < kSize; ++i) {
+            table_[i] = DistortSample(int16_t(int32_t(i) - 32768), curve);
+        }
+    }
+
+    void Apply(std::span<int16_t> samples) const
+    {
+        for (int16_t& sample : samples) {
+            sample = table_[size_t(int32_t(sample) + 32768)];
+        }
+    }
+
+private:
+    std::vector<int16_t> table_;
+};
+
+/// DistortSample applied to every sample in place. A buffer shorter than the
+/// table is computed sample by sample, first to last; a longer one through
+/// a DistortionTable, which costs fewer curve evaluations.
 template <std::invocable<double> Curve>
 void Distort(std::span<int16_t> samples, Curve&& curve)
 {
-    for (int16_t& sample : samples) {
-        sample = DistortSample(sample, curve);
+    if (samples.size() <= DistortionTable::kSize) {
+        for (int16_t& sample : samples) {
+            sample = DistortSample(sample, curve);
+        }
+        return;
     }
+    DistortionTable(curve).Apply(samples);
 }
 
 }  // namespace glimmet::effects

@@ -1,10 +1,14 @@
 #pragma once
 
 #include <concepts>
+#include <cstddef>
 #include <cstdint>
 #include <span>
+#include <vector>
 
 #include "edit/effects/EffectStore.h"
+#include "edit/effects/SplineCurve.h"
+#include "edit/effects/SplineSweep.h"
 
 namespace glimmet::effects {
 
@@ -32,5 +36,38 @@ void ApplyEnvelope(std::span<int16_t> samples, Curve&& curve)
         samples[i] = StoreOneSided((1.0 - value) * 4.0 * double(samples[i]));
     }
 }
+
+/// ApplyEnvelope's gains (1 - curve(i / n)) * 4.0 for a drawn curve, a block
+/// of frames at a time, each the same double ApplyEnvelope multiplies by.
+/// The positions i / n lie in [0, 1), where the curve is the spline itself,
+/// and they increase, so a SplineSweep finds each frame's piece; within one
+/// piece the cubic is evaluated over many frames at once.
+class EnvelopeGains {
+public:
+    /// For a range of n frames.
+    EnvelopeGains(const SplineCurve& curve, size_t n);
+
+    /// The gains of frames first .. first + gains.size() - 1; first +
+    /// gains.size() must not exceed n.
+    void Compute(size_t first, std::span<double> gains);
+
+private:
+    SplineSweep sweep_;
+    double count_;
+    std::vector<double> positions_;
+};
+
+/// samples[i] = StoreOneSided(gains[i] * samples[i]): ApplyEnvelope's
+/// product and store with the gain already formed. The spans must be equally
+/// long.
+void ApplyGains(std::span<const double> gains, std::span<int16_t> samples);
+
+/// ApplyEnvelope for a drawn curve: the same samples, through EnvelopeGains
+/// and ApplyGains.
+void ApplySplineEnvelope(std::span<int16_t> samples, const SplineCurve& curve);
+
+/// ApplySplineEnvelope over several ranges of the same length (the channels
+/// of one selection), each frame's gain computed once for all of them.
+void ApplySplineEnvelopeTogether(std::span<const std::span<int16_t>> ranges, const SplineCurve& curve);
 
 }  // namespace glimmet::effects

@@ -53,4 +53,11 @@ std::vector<double> FirKernel(Curve&& curve, int32_t taps)
 void FirFilter(std::span<const int16_t> input, std::span<const double> kernel,
                std::span<int16_t> output);
 
+/// FirFilter without the copies: samples is the range, filtered where it is,
+/// and history the kernel.size() frames before it, oldest first (otherwise
+/// std::invalid_argument is thrown). The samples become what FirFilter gives
+/// for the input history followed by the samples.
+void FirFilterInPlace(std::span<const int16_t> history, std::span<const double> kernel,
+                      std::span<int16_t> samples);
+
 }  // namespace glimmet::effects

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <span>
+#include <vector>
 
 namespace glimmet::effects {
 
@@ -14,8 +15,10 @@ namespace glimmet::effects {
 /// for negative ones.
 ///
 /// The curve is called with a double and its result used as a double, the
-/// signature of the curve control's ValueAt; it is evaluated once per run of
-/// two or more samples, in order.
+/// signature of the curve control's ValueAt. It must depend on its argument
+/// alone, as that control's curve does: a buffer shorter than a PeakGains
+/// table evaluates it once per run of two or more samples, in order, a longer
+/// one once per possible peak (see PeakDistort).
 
 /// A run of same-signed samples: where it starts, how many samples it has
 /// and its largest magnitude (0 for an empty run).
@@ -45,6 +48,37 @@ double RunGain(double curveValue, double position);
 /// is touched and the caller never sees it.
 void ScaleRun(std::span<int16_t> samples, const SampleRun& run, double gain, int16_t& spare);
 
+/// RunGain for every peak a run can have, so that a run's gain is looked up
+/// instead of evaluated: the gain of a run depends on its peak alone (whose
+/// sign tells the side), so the lookup gives the same double.
+class PeakGains {
+public:
+    static constexpr size_t kSize = 65536;
+
+    template <std::invocable<double> Curve>
+    explicit PeakGains(Curve& curve) : gains_(kSize, 0.0)
+    {
+        for (int32_t peak = -32768; peak <= 32767; ++peak) {
+            if (peak == 0) {
+                continue;  // no run has it
+            }
+            const SampleRun run{0, 0, int16_t(peak)};
+            const double position = PeakPosition(run, peak > 0);
+            gains_[Index(run.peak)] = RunGain(curve(position), position);
+        }
+    }
+
+    double Of(int16_t peak) const { return gains_[Index(peak)]; }
+
+private:
+    static size_t Index(int16_t peak) { return size_t(int32_t(peak) + 32768); }
+
+    std::vector<double> gains_;
+};
+
+/// PeakDistort with every run's gain taken from gains.
+void PeakDistortWithGains(std::span<int16_t> samples, const PeakGains& gains);
+
 /// Peak Distort in place. With i the next unprocessed sample, from 0 while
 /// i < n: the positive run from i, scaled if it has two or more samples;
 /// then the negative run from the sample after it (counted on the samples as
@@ -52,9 +86,16 @@ void ScaleRun(std::span<int16_t> samples, const SampleRun& run, double gain, int
 /// past the sample after the negative run, which therefore never starts a run
 /// of its own. Runs of one sample stay unchanged, so a buffer that changes
 /// sign at every sample is left as it is, and zeros are skipped one at a time.
+///
+/// A buffer longer than the PeakGains table takes its gains from one, which
+/// costs fewer curve evaluations than that many samples' runs would.
 template <std::invocable<double> Curve>
 void PeakDistort(std::span<int16_t> samples, Curve&& curve)
 {
+    if (samples.size() > PeakGains::kSize) {
+        PeakDistortWithGains(samples, PeakGains(curve));
+        return;
+    }
     int16_t spare = 0;
     size_t i = 0;
     while (i < samples.size()) {
