@@ -17,7 +17,7 @@ constexpr size_t kBlockFrames = 2048;
 // positions[j] = double(first + j) / count. The index is formed as
 // double(first) + j, exact for every index below 2^53, so it is the same
 // double as double(first + j); written this way the loop vectorises.
-GLIMMET_VECTOR_CLONES
+GLIMMET_EFFECT_CLONES
 void Positions(size_t first, double count, double* positions, size_t n)
 {
     const double base = double(first);
@@ -27,7 +27,7 @@ void Positions(size_t first, double count, double* positions, size_t n)
 }
 
 // The gains of the frames at positions, all in piece k of the sweep.
-GLIMMET_VECTOR_CLONES
+GLIMMET_EFFECT_CLONES
 void PieceGains(const SplineSweep& sweep, size_t k, const double* positions, double* gains, size_t n)
 {
     const double x = sweep.KnotX(k);
@@ -80,7 +80,7 @@ void EnvelopeGains::Compute(size_t first, std::span<double> gains)
     }
 }
 
-GLIMMET_VECTOR_CLONES
+GLIMMET_EFFECT_CLONES
 void ApplyGains(std::span<const double> gains, std::span<int16_t> samples)
 {
     const double* gain = gains.data();

@@ -123,7 +123,7 @@ using Ints8 = int32_t __attribute__((vector_size(32)));
 // is its current frame. Under the vector path's bound the int32 sum of a
 // clamped value (or the first term) and a term cannot wrap, so it is the
 // plain sum.
-GLIMMET_VECTOR_CLONES
+GLIMMET_EFFECT_CLONES
 void SumTaps(const double* x, std::span<const double> kernel, int32_t* sums, size_t count)
 {
     const size_t taps = kernel.size();
@@ -142,7 +142,7 @@ void SumTaps(const double* x, std::span<const double> kernel, int32_t* sums, siz
     }
 }
 
-GLIMMET_VECTOR_CLONES
+GLIMMET_EFFECT_CLONES
 void ToDoubles(const int16_t* samples, double* out, size_t count)
 {
     for (size_t j = 0; j < count; ++j) {

@@ -81,7 +81,7 @@ bool ScanSteps(std::span<const int16_t> samples, size_t begin, size_t& j, int16_
 // elsewhere (not-a-number included), so the value is chosen before the
 // conversion, which then is always defined; the int16 of an int32 is its low
 // 16 bits.
-GLIMMET_VECTOR_CLONES
+GLIMMET_EFFECT_CLONES
 void ScaleSamples(int16_t* samples, size_t count, double gain)
 {
     for (size_t j = 0; j < count; ++j) {
@@ -98,7 +98,7 @@ constexpr double kLargestPlainGain = 65535.0;
 
 // ScaleSamples for a gain of at most kLargestPlainGain in magnitude, where
 // the out-of-range case cannot arise and the conversion stands alone.
-GLIMMET_VECTOR_CLONES
+GLIMMET_EFFECT_CLONES
 void ScaleSamplesInRange(int16_t* samples, size_t count, double gain)
 {
     for (size_t j = 0; j < count; ++j) {

@@ -8,9 +8,12 @@
 /// into one rounding there, so contraction is turned off for these functions;
 /// then every form does the same IEEE operations in the same order and only
 /// processes more lanes at once.
-#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__)
-#define GLIMMET_VECTOR_CLONES \
+///
+/// Not under ThreadSanitizer: the loader runs the clones' resolvers before
+/// the sanitizer's runtime is up, and the program dies at start-up.
+#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__) && !defined(__SANITIZE_THREAD__)
+#define GLIMMET_EFFECT_CLONES \
     __attribute__((target_clones("avx512f", "avx2", "default"), optimize("fp-contract=off")))
 #else
-#define GLIMMET_VECTOR_CLONES
+#define GLIMMET_EFFECT_CLONES
 #endif
