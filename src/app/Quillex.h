@@ -18,6 +18,8 @@ class QFileDialog;
 
 namespace glimmet {
 
+class BubbleHelper;
+
 /// The application object: the list of open document windows, the open
 /// panel, and the commands that concern the whole program. There is one per
 /// process; Instance() finds it from anywhere in the GUI thread.
@@ -80,7 +82,12 @@ public:
     QuillexWindow* OpenRequestingWindow() const { return openRequestingWindow_; }
     /// The open panel, made on first use; null before.
     QFileDialog* OpenPanel() const { return openPanel_.get(); }
-    bool IsBubbleHelpEnabled() const { return bubbleHelpEnabled_; }
+    bool IsBubbleHelpEnabled() const;
+    /// The one bubble helper, handed to every window for its help texts.
+    BubbleHelper* Helper() const { return bubbleHelper_.get(); }
+
+    /// Opens a new About box, which ends itself.
+    void AboutRequested();
 
     /// What ends the event loop once QuitRequested agrees; tests replace it
     /// so that their own event loops keep running.
@@ -104,7 +111,7 @@ private:
     QPointer<QuillexWindow> openRequestingWindow_;
     std::unique_ptr<QFileDialog> openPanel_;
     CopyBuffer copyBuffer_;
-    bool bubbleHelpEnabled_ = false;
+    std::unique_ptr<BubbleHelper> bubbleHelper_;
     std::function<void()> quitHook_;
 };
 

@@ -19,7 +19,9 @@
 #include <cstdlib>
 
 #include "app/ActionRunner.h"
+#include "app/BubbleHelper.h"
 #include "app/EditCommands.h"
+#include "app/HelpTexts.h"
 #include "app/MenuBuilder.h"
 #include "app/MenuTable.h"
 #include "app/Quillex.h"
@@ -88,6 +90,11 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
     column->addSpacing(5);
     column->addWidget(containerView_, 1);
     setCentralWidget(background);
+
+    if (BubbleHelper* helper = BubbleHelper::Instance()) {
+        helper->SetHelp(containerView_, QString::fromUtf8(help::kChannelContainerView));
+        helper->SetHelp(playModePopup_->parentWidget(), QString::fromUtf8(help::kPlayModePopup));
+    }
 
     playback_ = std::make_unique<PlaybackController>(manager_, this, this);
     playback_->SetUp();
