@@ -64,6 +64,12 @@ void BubbleHelper::SetHelp(QWidget* view, const QString& text)
         helpList_.emplace_back(view, text);
 }
 
+void BubbleHelper::RegisterHelp(QWidget* view, const char* text)
+{
+    if (gInstance != nullptr)
+        gInstance->SetHelp(view, QString::fromUtf8(text));
+}
+
 QString BubbleHelper::GetHelp(const QWidget* view) const
 {
     for (const HelpEntry& entry : helpList_) {

@@ -56,6 +56,9 @@ public:
     /// Gives view a help text, replacing its old one; a null text takes the
     /// view's help away. A null view is ignored.
     void SetHelp(QWidget* view, const QString& text);
+    /// Gives view its help text in the process's helper; nothing happens
+    /// while there is no helper (a window made without the application).
+    static void RegisterHelp(QWidget* view, const char* text);
     /// The view's own text (not its parents'); null when it has none.
     QString GetHelp(const QWidget* view) const;
     /// Switches bubbles on or off for the polls to come. A bubble already on

@@ -91,10 +91,8 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
     column->addWidget(containerView_, 1);
     setCentralWidget(background);
 
-    if (BubbleHelper* helper = BubbleHelper::Instance()) {
-        helper->SetHelp(containerView_, QString::fromUtf8(help::kChannelContainerView));
-        helper->SetHelp(playModePopup_->parentWidget(), QString::fromUtf8(help::kPlayModePopup));
-    }
+    BubbleHelper::RegisterHelp(containerView_, help::kChannelContainerView);
+    BubbleHelper::RegisterHelp(playModePopup_->parentWidget(), help::kPlayModePopup);
 
     playback_ = std::make_unique<PlaybackController>(manager_, this, this);
     playback_->SetUp();

@@ -262,11 +262,15 @@ TEST(AboutView, ThePauseLineShowsNothingAndTheTitleFollowsAtSize16)
     for (int line = 0; line < 6; ++line)
         about.RunLine();
     ASSERT_EQ(about.View().Text(), "");
+    QImage black(400, 50, QImage::Format_RGB32);
+    black.fill(Qt::black);
+    int frames = 0;
     while (about.log.what == kMsgAboutDraw) {
         about.log.Fire();
-        ASSERT_TRUE(about.View().Frame().isNull() == false);
-        EXPECT_EQ(DifferingPixels(about.View().Frame(), ReferenceAboutFrame("", 12, about.View().Smear(), {400, 50})), 0);
+        ++frames;
+        ASSERT_EQ(DifferingPixels(about.View().Frame(), black), 0) << "frame " << frames;
     }
+    EXPECT_EQ(frames, 127);
     about.log.Fire();
     about.FramesUntilPhaseEnds();
     about.log.Fire();

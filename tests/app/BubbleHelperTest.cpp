@@ -142,6 +142,17 @@ TEST(BubbleHelper, SetHelpReplacesAndANullTextRemoves)
     EXPECT_TRUE(polled.helper.GetHelp(nullptr).isNull());
 }
 
+TEST(BubbleHelper, RegisterHelpReachesTheLiveHelperAndIsHarmlessWithout)
+{
+    QWidget view;
+    ASSERT_EQ(BubbleHelper::Instance(), nullptr);
+    BubbleHelper::RegisterHelp(&view, "nobody hears");
+    Polled polled;
+    EXPECT_TRUE(polled.helper.GetHelp(&view).isNull());
+    BubbleHelper::RegisterHelp(&view, "Immediatly stops playback");
+    EXPECT_EQ(polled.helper.GetHelp(&view), "Immediatly stops playback");
+}
+
 TEST(BubbleHelper, TheNearestAncestorWithHelpGivesTheText)
 {
     Polled polled(QStringLiteral("outer"));
