@@ -1,5 +1,6 @@
 #include "app/Quillex.h"
 
+#include <QApplication>
 #include <QCoreApplication>
 #include <QDesktopServices>
 #include <QFileDialog>
@@ -8,6 +9,8 @@
 #include <algorithm>
 #include <mutex>
 
+#include "app/AboutWindow.h"
+#include "app/BubbleHelper.h"
 #include "app/QuillexWindow.h"
 #include "files/panel/SndFilePanel.h"
 #include "support/MessageCodes.h"
@@ -21,9 +24,11 @@ Quillex* gApplication = nullptr;
 
 }  // namespace
 
-Quillex::Quillex() : quitHook_([] { QCoreApplication::exit(0); })
+Quillex::Quillex()
+    : bubbleHelper_(std::make_unique<BubbleHelper>()), quitHook_([] { QCoreApplication::exit(0); })
 {
     windows_.reserve(10);
+    bubbleHelper_->EnableHelp(false);
     gApplication = this;
 }
 
@@ -38,6 +43,11 @@ Quillex::~Quillex()
     }
     for (QuillexWindow* window : remaining)
         delete window;
+    // An About box ends itself when clicked; one still open ends here.
+    for (QWidget* widget : QApplication::topLevelWidgets()) {
+        if (qobject_cast<AboutWindow*>(widget) != nullptr)
+            delete widget;
+    }
     gApplication = nullptr;
 }
 
@@ -203,6 +213,9 @@ void Quillex::MessageReceived(const Message& message)
     case kMsgFeedback:
         SendFeedback();
         break;
+    case kMsgAboutRequested:
+        AboutRequested();
+        break;
     case kMsgQuitRequested:
         if (QuitRequested() && quitHook_)
             quitHook_();
@@ -235,12 +248,23 @@ void Quillex::OpenPanelChose(const QStringList& files)
     PostMessage(refs);
 }
 
+bool Quillex::IsBubbleHelpEnabled() const
+{
+    return bubbleHelper_->IsEnabled();
+}
+
 void Quillex::ToggleBubbleHelp()
 {
-    bubbleHelpEnabled_ = !bubbleHelpEnabled_;
+    const bool enable = !bubbleHelper_->IsEnabled();
+    bubbleHelper_->EnableHelp(enable);
     Message mark(kMsgToggleBubbleHelp);
-    mark.AddBool(kFieldEnable, bubbleHelpEnabled_);
+    mark.AddBool(kFieldEnable, enable);
     BroadcastMessage(mark);
+}
+
+void Quillex::AboutRequested()
+{
+    new AboutWindow();
 }
 
 void Quillex::SendFeedback()

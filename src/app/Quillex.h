@@ -16,6 +16,7 @@
 
 namespace glimmet {
 
+class BubbleHelper;
 class SndFilePanel;
 
 /// The application object: the list of open document windows, the open
@@ -80,7 +81,12 @@ public:
     QuillexWindow* OpenRequestingWindow() const { return openRequestingWindow_; }
     /// The open panel, made on first use; null before.
     SndFilePanel* OpenPanel() const { return openPanel_.get(); }
-    bool IsBubbleHelpEnabled() const { return bubbleHelpEnabled_; }
+    bool IsBubbleHelpEnabled() const;
+    /// The one bubble helper, handed to every window for its help texts.
+    BubbleHelper* Helper() const { return bubbleHelper_.get(); }
+
+    /// Opens a new About box, which ends itself.
+    void AboutRequested();
 
     /// What ends the event loop once QuitRequested agrees; tests replace it
     /// so that their own event loops keep running.
@@ -104,7 +110,7 @@ private:
     QPointer<QuillexWindow> openRequestingWindow_;
     std::unique_ptr<SndFilePanel> openPanel_;
     CopyBuffer copyBuffer_;
-    bool bubbleHelpEnabled_ = false;
+    std::unique_ptr<BubbleHelper> bubbleHelper_;
     std::function<void()> quitHook_;
 };
 

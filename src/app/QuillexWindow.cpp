@@ -19,7 +19,9 @@
 #include <cstdlib>
 
 #include "app/ActionRunner.h"
+#include "app/BubbleHelper.h"
 #include "app/EditCommands.h"
+#include "app/HelpTexts.h"
 #include "app/MenuBuilder.h"
 #include "app/MenuTable.h"
 #include "app/Quillex.h"
@@ -88,6 +90,9 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
     column->addSpacing(5);
     column->addWidget(containerView_, 1);
     setCentralWidget(background);
+
+    BubbleHelper::RegisterHelp(containerView_, help::kChannelContainerView);
+    BubbleHelper::RegisterHelp(playModePopup_->parentWidget(), help::kPlayModePopup);
 
     playback_ = std::make_unique<PlaybackController>(manager_, this, this);
     playback_->SetUp();
