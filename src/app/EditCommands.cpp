@@ -22,12 +22,15 @@
 #include "edit/RevertAction.h"
 #include "edit/RevertPhasesAction.h"
 #include "edit/SelectionCopier.h"
+#include "edit/StretchAction.h"
 #include "edit/TruncateAction.h"
 #include "edit/dialogs/CParameterWindow.h"
 #include "edit/dialogs/CurveDialogLink.h"
 #include "edit/dialogs/DParameterWindow.h"
 #include "edit/dialogs/EParameterWindow.h"
 #include "edit/dialogs/FParameterWindow.h"
+#include "edit/dialogs/TSDialogLink.h"
+#include "edit/dialogs/TSParameterWindow.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "support/MessageCodes.h"
@@ -115,8 +118,18 @@ void EditCommands::AddTo(CommandTable& table)
     table.Add(kMsgCut, [this] { Cut(); });
     table.Add(kMsgPaste, [this] { Paste(); });
     table.Add(kMsgSampleMoved, [this](const Message& message) { SampleMoved(message); });
+    table.Add(kMsgTimeStretch, [this] { TimeStretch(); });
+    table.Add(kMsgStretchFinished, [this] { actions_.FinishStretch(); });
     AddActionCommands(table);
     AddCurveEffectCommands(table);
+}
+
+void EditCommands::TimeStretch()
+{
+    // No menu item leads here: only a message from outside the menus.
+    auto* dialog = new TSParameterWindow(dialogParent_, &window_);
+    dialog->ShowAtHome();
+    actions_.SetupAction(std::make_unique<StretchAction>(&window_, std::make_unique<TSDialogLink>(dialog)));
 }
 
 void EditCommands::AddActionCommands(CommandTable& table)

@@ -38,6 +38,8 @@ private:
     void AddActionCommands(CommandTable& table);
     /// The effects that ask for a curve in a dialog first.
     void AddCurveEffectCommands(CommandTable& table);
+    /// 'tstr': the time stretch with its dialog open.
+    void TimeStretch();
     void Cut();
     void Paste();
     /// 'smmd' from a channel's view: the drag of one sample, as an action

@@ -5,6 +5,7 @@
 #include <mutex>
 #include <new>
 
+#include "edit/vocoder/VocoderState.h"
 #include "edit/vocoder/VocoderStretch.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
@@ -59,11 +60,25 @@ status_t StretchAction::ReadDialog()
     dialog_->Unlock();
     dialog_->Quit();
     dialog_.reset();
+    NoteTargets();
     return B_OK;
+}
+
+void StretchAction::NoteTargets()
+{
+    targets_.clear();
+    if (Manager() == nullptr)
+        return;
+    std::lock_guard guard(Manager()->DocumentLock());
+    for (int32_t c = 0; Channel* channel = Manager()->ChannelAt(c); c++) {
+        if (channel->IsSelected())
+            targets_.push_back(c);
+    }
 }
 
 status_t StretchAction::Compute(const std::atomic<bool>* stop)
 {
+    std::lock_guard vocoder(VocoderState::Shared().Lock());
     status_ = B_NO_INIT;
     outputs_.clear();
     outputs_.resize(SavedChannels().size());
@@ -103,8 +118,8 @@ status_t StretchAction::WriteBack()
 {
     if (status_ == B_OK) {
         std::lock_guard guard(Manager()->DocumentLock());
-        for (int32_t c = 0; Channel* channel = Manager()->ChannelAt(c); c++) {
-            if (channel->IsSelected())
+        for (int32_t c : targets_) {
+            if (Channel* channel = Manager()->ChannelAt(c))
                 WriteChannel(channel, c);
         }
     }

@@ -34,15 +34,17 @@ public:
     const char* Name() override;
     bool SupportsConfiguration() override;
 
-    /// Reads the parameters and closes the dialog. B_NO_INIT, doing
-    /// nothing, when there is no dialog or it cannot be read.
+    /// Reads the parameters, closes the dialog and notes which channels are
+    /// selected: those are the ones written back, whatever happens to the
+    /// selection while the work runs elsewhere. B_NO_INIT, doing nothing,
+    /// when there is no dialog or it cannot be read.
     status_t ReadDialog();
     /// Stretches every snapshot channel into its output buffer and prints
     /// one line per channel. stop, when set, ends the work early with a
     /// failure. Returns the status of the last channel.
     status_t Compute(const std::atomic<bool>* stop = nullptr);
-    /// When the computed status is B_OK, replaces the range of each
-    /// selected channel with the output of the same index among all
+    /// When the computed status is B_OK, replaces the range of each channel
+    /// selected at ReadDialog with the output of the same index among all
     /// channels; frees the outputs. Returns the computed status.
     status_t WriteBack();
 
@@ -62,6 +64,7 @@ public:
     static int16_t ToSample(float x);
 
 private:
+    void NoteTargets();
     status_t StretchRecord(const SavedChannel& record, size_t index, const std::atomic<bool>* stop);
     void WriteChannel(Channel* channel, int32_t index);
 
@@ -71,6 +74,8 @@ private:
     /// not be had.
     std::vector<std::unique_ptr<float[]>> outputs_;
     status_t status_ = B_NO_INIT;
+    /// The channels selected when the dialog was read, by index.
+    std::vector<int32_t> targets_;
 };
 
 }  // namespace glimmet

@@ -1,0 +1,48 @@
+#include "app/StretchWorker.h"
+
+#include "edit/StretchAction.h"
+#include "support/MessageCodes.h"
+#include "support/MessageTarget.h"
+
+namespace glimmet {
+
+StretchWorker::StretchWorker(MessageTarget& window) : window_(window) {}
+
+StretchWorker::~StretchWorker()
+{
+    Stop();
+}
+
+void StretchWorker::Start(StretchAction* action)
+{
+    if (Busy() || action == nullptr)
+        return;
+    action_ = action;
+    stop_ = false;
+    thread_ = std::thread([this, action] {
+        action->Compute(&stop_);
+        window_.PostMessage(kMsgStretchFinished);
+    });
+}
+
+bool StretchWorker::Finish()
+{
+    if (!Busy())
+        return false;
+    thread_.join();
+    StretchAction* action = action_;
+    action_ = nullptr;
+    action->WriteBack();
+    return true;
+}
+
+void StretchWorker::Stop()
+{
+    if (!Busy())
+        return;
+    stop_ = true;
+    thread_.join();
+    action_ = nullptr;
+}
+
+}  // namespace glimmet

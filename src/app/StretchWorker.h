@@ -1,0 +1,45 @@
+#pragma once
+
+#include <atomic>
+#include <thread>
+
+namespace glimmet {
+
+class MessageTarget;
+class StretchAction;
+
+/// Runs the long middle step of a time stretch (StretchAction::Compute) on
+/// a thread of its own, so that every window stays usable meanwhile. When
+/// the work is done it posts 'tsfn' to the window, whose GUI thread then
+/// calls Finish to write the result back under the document lock.
+///
+/// Ending the worker (the window closing, the program quitting) stops the
+/// vocoder at its next frame and waits for the thread; nothing is written
+/// back then.
+class StretchWorker {
+public:
+    /// window receives 'tsfn'; not owned, outlives the worker.
+    explicit StretchWorker(MessageTarget& window);
+    ~StretchWorker();
+    StretchWorker(const StretchWorker&) = delete;
+    StretchWorker& operator=(const StretchWorker&) = delete;
+
+    /// Starts computing action, whose dialog has been read; it must live
+    /// until Finish or Stop. Does nothing while another one runs.
+    void Start(StretchAction* action);
+    /// True from Start until Finish or Stop.
+    bool Busy() const { return action_ != nullptr; }
+    /// Waits for the thread and writes the result back. False when there
+    /// was nothing to finish.
+    bool Finish();
+    /// Stops the work, waits for the thread and drops the result.
+    void Stop();
+
+private:
+    MessageTarget& window_;
+    StretchAction* action_ = nullptr;
+    std::atomic<bool> stop_{false};
+    std::thread thread_;
+};
+
+}  // namespace glimmet
