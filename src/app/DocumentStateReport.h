@@ -6,6 +6,7 @@ namespace glimmet {
 
 class CurveParameterWindow;
 class QuillexWindow;
+class TSParameterWindow;
 
 /// The state of a document window as one line of JSON, for scripts that
 /// drive the editor headless and check what it did:
@@ -34,6 +35,12 @@ public:
     /// left, top, right and bottom on the screen, and "ok" and "cancel", the
     /// centres of the two buttons there.
     static std::string DialogJson(CurveParameterWindow* dialog, bool onScreen = false);
+    /// {"title": "Time Stretch", "fields": {label: text, ...}} in the
+    /// fields' order.
+    static std::string DialogJson(TSParameterWindow* dialog);
+    /// The window's open dialog as above: the time stretch dialog when one
+    /// is open, otherwise the curve dialog on screen (or null).
+    static std::string OpenDialogJson(QuillexWindow& window);
     /// text as a JSON string literal, quotes included.
     static std::string Quoted(const std::string& text);
 };

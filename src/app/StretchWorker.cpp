@@ -6,6 +6,19 @@
 
 namespace glimmet {
 
+std::atomic<int> StretchWorker::running_{0};
+
+int StretchWorker::Running()
+{
+    return running_.load();
+}
+
+void StretchWorker::Release()
+{
+    action_ = nullptr;
+    running_--;
+}
+
 StretchWorker::StretchWorker(MessageTarget& window) : window_(window) {}
 
 StretchWorker::~StretchWorker()
@@ -18,6 +31,7 @@ void StretchWorker::Start(StretchAction* action)
     if (Busy() || action == nullptr)
         return;
     action_ = action;
+    running_++;
     stop_ = false;
     thread_ = std::thread([this, action] {
         action->Compute(&stop_);
@@ -31,8 +45,8 @@ bool StretchWorker::Finish()
         return false;
     thread_.join();
     StretchAction* action = action_;
-    action_ = nullptr;
     action->WriteBack();
+    Release();
     return true;
 }
 
@@ -42,7 +56,7 @@ void StretchWorker::Stop()
         return;
     stop_ = true;
     thread_.join();
-    action_ = nullptr;
+    Release();
 }
 
 }  // namespace glimmet

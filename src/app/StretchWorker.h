@@ -35,7 +35,15 @@ public:
     /// Stops the work, waits for the thread and drops the result.
     void Stop();
 
+    /// How many stretches of all windows are started and not yet written
+    /// back or stopped; scripts wait for this to reach 0.
+    static int Running();
+
 private:
+    void Release();
+
+    static std::atomic<int> running_;
+
     MessageTarget& window_;
     StretchAction* action_ = nullptr;
     std::atomic<bool> stop_{false};
