@@ -62,6 +62,8 @@ public:
     void FinishStretch();
     /// True while a time stretch is being computed.
     bool Stretching() const { return stretch_.Busy(); }
+    /// How far the running time stretch has come, 0 to 1.
+    double StretchProgress() const { return stretch_.Progress(); }
 
     /// Relabels and enables the undo, redo, delete history and save items
     /// from the history.

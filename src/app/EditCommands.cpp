@@ -6,6 +6,7 @@
 
 #include "app/ActionRunner.h"
 #include "app/CommandTable.h"
+#include "app/StretchProgress.h"
 #include "edit/AddChannelAction.h"
 #include "edit/CompressorAction.h"
 #include "edit/CopyBuffer.h"
@@ -103,13 +104,19 @@ const std::vector<CurveEffectCommand>& CurveEffectCommands()
 
 EditCommands::EditCommands(MessageTarget& window, QWidget* dialogParent, ChannelManager& manager,
     ActionRunner& actions, CopyBuffer* copyBuffer)
-    : window_(window), dialogParent_(dialogParent), manager_(manager), actions_(actions), copyBuffer_(copyBuffer)
+    : window_(window), dialogParent_(dialogParent), manager_(manager), actions_(actions), copyBuffer_(copyBuffer),
+      progress_(std::make_unique<StretchProgress>(dialogParent, actions))
 {
 }
 
+EditCommands::~EditCommands() = default;
+
 void EditCommands::AddTo(CommandTable& table)
 {
-    table.Add(kMsgActionGo, [this] { actions_.Go(); });
+    table.Add(kMsgActionGo, [this] {
+        actions_.Go();
+        progress_->Follow();
+    });
     table.Add(kMsgActionCancel, [this] { actions_.Cancel(); });
     table.Add(kMsgUndo, [this] { actions_.Undo(); });
     table.Add(kMsgRedo, [this] { actions_.Redo(); });
@@ -119,7 +126,10 @@ void EditCommands::AddTo(CommandTable& table)
     table.Add(kMsgPaste, [this] { Paste(); });
     table.Add(kMsgSampleMoved, [this](const Message& message) { SampleMoved(message); });
     table.Add(kMsgTimeStretch, [this] { TimeStretch(); });
-    table.Add(kMsgStretchFinished, [this] { actions_.FinishStretch(); });
+    table.Add(kMsgStretchFinished, [this] {
+        actions_.FinishStretch();
+        progress_->Follow();
+    });
     AddActionCommands(table);
     AddCurveEffectCommands(table);
 }

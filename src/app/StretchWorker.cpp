@@ -39,6 +39,11 @@ void StretchWorker::Start(StretchAction* action)
     });
 }
 
+double StretchWorker::Progress() const
+{
+    return Busy() ? action_->Progress() : 0.0;
+}
+
 bool StretchWorker::Finish()
 {
     if (!Busy())

@@ -29,6 +29,8 @@ public:
     void Start(StretchAction* action);
     /// True from Start until Finish or Stop.
     bool Busy() const { return action_ != nullptr; }
+    /// How far the running stretch has come, 0 to 1; 0 when none runs.
+    double Progress() const;
     /// Waits for the thread and writes the result back. False when there
     /// was nothing to finish.
     bool Finish();

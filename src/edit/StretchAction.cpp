@@ -1,5 +1,6 @@
 #include "edit/StretchAction.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstring>
 #include <mutex>
@@ -83,13 +84,26 @@ status_t StretchAction::Compute(const std::atomic<bool>* stop)
     outputs_.clear();
     outputs_.resize(SavedChannels().size());
     for (size_t r = 0; r < SavedChannels().size(); r++) {
+        channelsDone_ = r;
+        channelProgress_ = 0.0;
         status_ = StretchRecord(SavedChannels()[r], r, stop);
         if (status_ == B_OK)
             Diagnostics::Print("stretch on buffer[%ld] done!\n", long(r));
         else
             Diagnostics::Print("Error during time stretch!\n");
     }
+    channelsDone_ = SavedChannels().size();
+    channelProgress_ = 0.0;
     return status_;
+}
+
+double StretchAction::Progress() const
+{
+    const size_t count = SavedChannels().size();
+    if (count == 0)
+        return 0.0;
+    const double within = std::clamp(channelProgress_.load(), 0.0, 1.0);
+    return std::min(1.0, (double(channelsDone_.load()) + within) / double(count));
 }
 
 status_t StretchAction::StretchRecord(const SavedChannel& record, size_t index, const std::atomic<bool>* stop)
@@ -109,7 +123,7 @@ status_t StretchAction::StretchRecord(const SavedChannel& record, size_t index, 
     }
     const StretchParameters& p = parameters_;
     const bool ok = VocoderStretch::Stretch(input.get(), frames, output.get(), outputFrames, p.fftLength,
-        p.windowSize, p.interpolation, float(p.decimation), p.stretch, p.pitch, stop);
+        p.windowSize, p.interpolation, float(p.decimation), p.stretch, p.pitch, stop, &channelProgress_);
     outputs_[index] = std::move(output);
     return ok ? B_OK : B_ERROR;
 }

@@ -49,6 +49,8 @@ public:
     status_t WriteBack();
 
     const StretchParameters& Parameters() const { return parameters_; }
+    /// How far Compute has come, 0 to 1; any thread may ask.
+    double Progress() const;
 
     static bool Stretch(float* input, int64_t inputFrames, float* output, int64_t outputFrames, int32_t N,
         int32_t D, int32_t I, float P, float stretch, float unused);
@@ -76,6 +78,10 @@ private:
     status_t status_ = B_NO_INIT;
     /// The channels selected when the dialog was read, by index.
     std::vector<int32_t> targets_;
+    /// The share done of the channel being stretched, and how many
+    /// channels were done before it.
+    std::atomic<double> channelProgress_{0.0};
+    std::atomic<size_t> channelsDone_{0};
 };
 
 }  // namespace glimmet

@@ -12,6 +12,7 @@
 
 #include "AppTestSupport.h"
 #include "app/DialogScriptCommands.h"
+#include "app/StretchProgress.h"
 #include "app/StretchWorker.h"
 #include "edit/Action.h"
 #include "edit/HistoryManager.h"
@@ -170,6 +171,7 @@ TEST_F(StretchWindowTest, OtherWindowsKeepWorkingWhileAStretchRuns)
     QuillexWindow* other = SelectedWindow(fixture, "b.wav", 1, 44100);
     const std::vector<int16_t> before = SamplesOf(stretching, 0);
     const std::vector<int16_t> otherBefore = SamplesOf(other, 0);
+    const QString title = stretching->windowTitle();
     {
         // Holding the vocoder keeps the worker waiting, however fast the
         // machine, while the test works the windows.
@@ -178,6 +180,10 @@ TEST_F(StretchWindowTest, OtherWindowsKeepWorkingWhileAStretchRuns)
         Drain();
         ASSERT_EQ(StretchWorker::Running(), 1);
         EXPECT_EQ(DialogScriptCommands::OpenStretchDialog(stretching), nullptr);
+        // The stretching window says so; the other one does not.
+        EXPECT_EQ(stretching->windowTitle(), title + " (stretching 0%)");
+        EXPECT_EQ(stretching->cursor().shape(), Qt::BusyCursor);
+        EXPECT_FALSE(other->windowTitle().contains("stretching"));
 
         other->PostMessage(kMsgFadeOut);
         other->PostMessage(kMsgTogglePlay);
@@ -196,8 +202,19 @@ TEST_F(StretchWindowTest, OtherWindowsKeepWorkingWhileAStretchRuns)
     }
     WaitForStretches();
     EXPECT_EQ(StretchWorker::Running(), 0);
+    EXPECT_EQ(stretching->windowTitle(), title);
+    EXPECT_NE(stretching->cursor().shape(), Qt::BusyCursor);
     VocoderState::Shared().Reset();
     EXPECT_EQ(SamplesOf(stretching, 0), Reference(before, 8192, 8192, 2048, 2048, 2.0f));
+}
+
+TEST(StretchProgressTest, TheNoteComesAndGoesWithoutTouchingTheRest)
+{
+    EXPECT_EQ(StretchProgress::TitleWithProgress("Glimmet - a.wav", 0.426), "Glimmet - a.wav (stretching 42%)");
+    EXPECT_EQ(StretchProgress::TitleWithProgress("Glimmet - a.wav (stretching 42%)", 1.0),
+        "Glimmet - a.wav (stretching 100%)");
+    EXPECT_EQ(StretchProgress::PlainTitle("Glimmet - a.wav (stretching 7%)"), "Glimmet - a.wav");
+    EXPECT_EQ(StretchProgress::PlainTitle("Glimmet - (stretching 7%).wav"), "Glimmet - (stretching 7%).wav");
 }
 
 TEST_F(StretchWindowTest, ClosingTheWindowStopsItsStretch)

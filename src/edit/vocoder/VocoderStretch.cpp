@@ -131,7 +131,8 @@ bool VocoderStretch::UsableParameters(int32_t N, float stretch)
 }
 
 bool VocoderStretch::Stretch(const float* input, int64_t inputFrames, float* output, int64_t outputFrames,
-    int32_t N, int32_t D, int32_t I, float P, float stretch, float, const std::atomic<bool>* stop)
+    int32_t N, int32_t D, int32_t I, float P, float stretch, float, const std::atomic<bool>* stop,
+    std::atomic<double>* progress)
 {
     Diagnostics::Print("StretchAction::Stretch()\n");
     if (stretch == 0.0f) {
@@ -147,6 +148,8 @@ bool VocoderStretch::Stretch(const float* input, int64_t inputFrames, float* out
     while (inputFrames > work.pos + kLookAhead) {
         if (stop != nullptr && stop->load())
             return false;
+        if (progress != nullptr)
+            progress->store(double(work.pos) / double(inputFrames - kLookAhead));
         if (first)
             work.FirstFrames(input);
         first = false;

@@ -24,9 +24,11 @@ public:
     /// 0), P the oscillators' pitch factor. False, with a message, for a
     /// stretch factor of 0 and for values the vocoder cannot use. stop, when
     /// given and set, ends the run early (false, as a failure); the program
-    /// uses it only when it quits in the middle of a stretch.
+    /// uses it only when it quits in the middle of a stretch. progress, when
+    /// given, follows the share of the input analysed so far (0 to 1).
     static bool Stretch(const float* input, int64_t inputFrames, float* output, int64_t outputFrames, int32_t N,
-        int32_t D, int32_t I, float P, float stretch, float unused, const std::atomic<bool>* stop = nullptr);
+        int32_t D, int32_t I, float P, float stretch, float unused, const std::atomic<bool>* stop = nullptr,
+        std::atomic<double>* progress = nullptr);
 
     /// dst[k] = src[k] for k < n.
     static void CopyFrame(float* dst, const float* src, int32_t n);
