@@ -152,6 +152,23 @@ TEST_F(StretchActionTest, DecimationZeroResynthesisesByOverlapAdd)
     EXPECT_GT(nonzero, 1000);
 }
 
+TEST_F(StretchActionTest, ALongRangeRunsManyRoundsOverTheSameFirstOutputs)
+{
+    // About 40 frames of analysis and resynthesis, each copied over the
+    // same first 16384 outputs.
+    const std::vector<int16_t> tone = Tone(400000, 523.0);
+    document.AddChannel(tone);
+    document.SetRange(0, 399999);
+    StretchParameters values{8192, 8192, 0, 2048, 2.0f, 0.0f, 0.0f};
+    EXPECT_EQ(Run(Make(values)), B_OK);
+    VocoderState::Shared().Reset();
+    DiagnosticsCapture quiet(Diagnostics::Channel::Error), quietOut;
+    const std::vector<int16_t> expected = ExpectedStretch(tone, values);
+    EXPECT_EQ(Samples(0), expected);
+    ASSERT_EQ(expected.size(), 800000u);
+    EXPECT_EQ(std::vector<int16_t>(expected.begin() + 16384, expected.end()), std::vector<int16_t>(800000 - 16384, 0));
+}
+
 TEST_F(StretchActionTest, PhasesCarryOverFromChannelToChannel)
 {
     const std::vector<int16_t> a = Tone(60000, 440.0), b = Tone(60000, 550.0);
