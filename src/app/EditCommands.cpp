@@ -34,6 +34,7 @@
 #include "edit/dialogs/TSParameterWindow.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "support/Diagnostics.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
 
@@ -136,7 +137,13 @@ void EditCommands::AddTo(CommandTable& table)
 
 void EditCommands::TimeStretch()
 {
-    // No menu item leads here: only a message from outside the menus.
+    // No menu item leads here: only a message from outside the menus. A
+    // window that is still stretching takes no new stretch, and shows no
+    // dialog for one.
+    if (actions_.Stretching()) {
+        Diagnostics::Print("Time stretch in progress: Time Stretch ignored\n");
+        return;
+    }
     auto* dialog = new TSParameterWindow(dialogParent_, &window_);
     dialog->ShowAtHome();
     actions_.SetupAction(std::make_unique<StretchAction>(&window_, std::make_unique<TSDialogLink>(dialog)));

@@ -196,8 +196,11 @@ TEST_F(StretchWindowTest, OtherWindowsKeepWorkingWhileAStretchRuns)
         DiagnosticsCapture out;
         stretching->PostMessage(kMsgFadeOut);
         stretching->PostMessage(kMsgUndo);
+        stretching->PostMessage(kMsgTimeStretch);
         Drain();
-        EXPECT_EQ(out.Finish(), "Time stretch in progress: Fade Out ignored\nTime stretch in progress: undo ignored\n");
+        EXPECT_EQ(out.Finish(), "Time stretch in progress: Fade Out ignored\nTime stretch in progress: undo ignored\n"
+                                "Time stretch in progress: Time Stretch ignored\n");
+        EXPECT_EQ(DialogScriptCommands::OpenStretchDialog(stretching), nullptr);
         EXPECT_EQ(SamplesOf(stretching, 0), before);
     }
     WaitForStretches();
