@@ -7,6 +7,7 @@
 #include "edit/Action.h"
 #include "edit/EditContext.h"
 #include "edit/HistoryManager.h"
+#include "edit/StretchAction.h"
 #include "sound/ChannelManager.h"
 #include "support/Diagnostics.h"
 #include "support/MessageCodes.h"
@@ -28,7 +29,7 @@ void Relabel(QAction* item, const char* verb, const char* name)
 
 ActionRunner::ActionRunner(MessageTarget& window, ChannelManager& manager, EditContext& context,
     HistoryManager& history, const MenuBuilder& menus)
-    : window_(window), manager_(manager), context_(context), history_(history), menus_(menus)
+    : window_(window), manager_(manager), context_(context), history_(history), menus_(menus), stretch_(window)
 {
 }
 
@@ -43,8 +44,18 @@ void ActionRunner::MakePending(std::unique_ptr<Action> action)
     pending_ = std::move(action);
 }
 
+bool ActionRunner::RefusedWhileStretching(const char* what)
+{
+    if (!stretch_.Busy())
+        return false;
+    Diagnostics::Print("Time stretch in progress: %s ignored\n", what);
+    return true;
+}
+
 void ActionRunner::SetupAction(std::unique_ptr<Action> action)
 {
+    if (RefusedWhileStretching(action ? action->Name() : "edit"))
+        return;
     MakePending(std::move(action));
     if (!pending_)
         return;
@@ -59,6 +70,8 @@ void ActionRunner::SetupAction(std::unique_ptr<Action> action)
 
 void ActionRunner::SetupBoundAction(std::unique_ptr<Action> action)
 {
+    if (RefusedWhileStretching(action ? action->Name() : "edit"))
+        return;
     if (!action || action->InitCheck() != B_OK || action->SupportsConfiguration())
         return;
     MakePending(std::move(action));
@@ -73,8 +86,29 @@ void ActionRunner::Go()
     // Refused, it stays ours so that it is freed with the runner.
     if (history_.AddAction(pending_) != B_OK)
         superseded_.push_back(std::move(pending_));
+    if (auto* stretch = dynamic_cast<StretchAction*>(action)) {
+        StartStretch(stretch);
+        return;
+    }
     action->Go();
     Redraw();
+}
+
+void ActionRunner::StartStretch(StretchAction* action)
+{
+    // The dialog is read here, in the GUI thread it belongs to; the vocoder
+    // then runs elsewhere and the result comes back with 'tsfn'.
+    if (action->ReadDialog() != B_OK) {
+        Redraw();
+        return;
+    }
+    stretch_.Start(action);
+}
+
+void ActionRunner::FinishStretch()
+{
+    if (stretch_.Finish())
+        Redraw();
 }
 
 void ActionRunner::Cancel()
@@ -84,6 +118,8 @@ void ActionRunner::Cancel()
 
 void ActionRunner::Undo()
 {
+    if (RefusedWhileStretching("undo"))
+        return;
     const status_t status = history_.Undo();
     if (status != B_OK) {
         Diagnostics::Print("Error doing undo: %s\n", StatusText(status));
@@ -94,6 +130,8 @@ void ActionRunner::Undo()
 
 void ActionRunner::Redo()
 {
+    if (RefusedWhileStretching("redo"))
+        return;
     const status_t status = history_.Redo();
     if (status != B_OK) {
         Diagnostics::Print("Error doing redo: %s\n", StatusText(status));
@@ -104,6 +142,8 @@ void ActionRunner::Redo()
 
 void ActionRunner::DeleteHistory()
 {
+    if (RefusedWhileStretching("delete history"))
+        return;
     history_.Clear();
     UpdateUndoMenu();
 }

@@ -3,6 +3,8 @@
 #include <memory>
 #include <vector>
 
+#include "app/StretchWorker.h"
+
 namespace glimmet {
 
 class Action;
@@ -11,6 +13,7 @@ class EditContext;
 class HistoryManager;
 class MenuBuilder;
 class MessageTarget;
+class StretchAction;
 
 /// The life of a document's edits: the pending action from its setup
 /// through its dialog to the history, and undo, redo and delete history with
@@ -19,6 +22,11 @@ class MessageTarget;
 /// An action runs as the command 'acgo', posted at once by SetupAction or
 /// later by the action's parameter dialog; 'accc' drops it instead. Until
 /// then the runner owns it; from then on the history does.
+///
+/// A time stretch runs its vocoder on a worker thread (StretchWorker);
+/// until its result is written back ('tsfn') the document takes no edits:
+/// new actions, undo, redo and delete history are refused with a line on
+/// standard output.
 ///
 /// GUI thread only.
 class ActionRunner {
@@ -50,6 +58,12 @@ public:
     void Undo();
     void Redo();
     void DeleteHistory();
+    /// 'tsfn': writes a finished time stretch back and redraws.
+    void FinishStretch();
+    /// True while a time stretch is being computed.
+    bool Stretching() const { return stretch_.Busy(); }
+    /// How far the running time stretch has come, 0 to 1.
+    double StretchProgress() const { return stretch_.Progress(); }
 
     /// Relabels and enables the undo, redo, delete history and save items
     /// from the history.
@@ -61,6 +75,9 @@ private:
     /// Replaces the pending action by action.
     void MakePending(std::unique_ptr<Action> action);
     void Redraw();
+    /// Refuses an edit while a time stretch runs; true when refused.
+    bool RefusedWhileStretching(const char* what);
+    void StartStretch(StretchAction* action);
 
     MessageTarget& window_;
     ChannelManager& manager_;
@@ -72,6 +89,9 @@ private:
     /// a dialog may still answer for them, so they live until the runner
     /// ends.
     std::vector<std::unique_ptr<Action>> superseded_;
+    /// Declared last, so that it stops and joins its thread before the
+    /// actions it may be working on go.
+    StretchWorker stretch_;
 };
 
 }  // namespace glimmet

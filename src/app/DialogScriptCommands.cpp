@@ -4,6 +4,9 @@
 #include <QPixmap>
 #include <QPushButton>
 
+#include <QLineEdit>
+#include <QThread>
+
 #include <cmath>
 #include <cstdlib>
 #include <string>
@@ -13,9 +16,11 @@
 #include "app/DialogInput.h"
 #include "app/DocumentStateReport.h"
 #include "app/ScriptArguments.h"
+#include "app/StretchWorker.h"
 #include "edit/dialogs/CurveParameterWindow.h"
 #include "edit/dialogs/FParameterWindow.h"
 #include "edit/dialogs/SpinButton.h"
+#include "edit/dialogs/TSParameterWindow.h"
 #include "views/SplineControl.h"
 
 namespace glimmet {
@@ -56,6 +61,40 @@ bool RequireDialog(BatchRunner& runner, CurveParameterWindow** dialog, std::stri
     return true;
 }
 
+/// The buttons of whichever parameter dialog is open.
+struct OpenButtons {
+    QDialog* dialog = nullptr;
+    QPushButton* ok = nullptr;
+    QPushButton* cancel = nullptr;
+    bool stretch = false;
+};
+
+/// The open dialog's buttons, or false with the reason.
+bool RequireButtons(BatchRunner& runner, OpenButtons* buttons, std::string* reason)
+{
+    if (TSParameterWindow* stretch = DialogScriptCommands::OpenStretchDialog(runner.Window())) {
+        *buttons = OpenButtons{stretch, stretch->OkButton(), stretch->CancelButton(), true};
+        return true;
+    }
+    CurveParameterWindow* curve = nullptr;
+    if (!RequireDialog(runner, &curve, reason))
+        return false;
+    *buttons = OpenButtons{curve, curve->OkButton(), curve->CancelButton(), false};
+    return true;
+}
+
+bool RunField(BatchRunner& runner, const Arguments& arguments, std::string* reason)
+{
+    TSParameterWindow* dialog = DialogScriptCommands::OpenStretchDialog(runner.Window());
+    if (dialog == nullptr)
+        return ScriptArguments::Fail(reason, "no dialog with text fields is open");
+    QLineEdit* field = dialog->FieldLabelled(QString::fromStdString(arguments[0]));
+    if (field == nullptr)
+        return ScriptArguments::Fail(reason, "the open dialog has no field labelled \"" + arguments[0] + "\"");
+    DialogInput::TypeReplacing(field, QString::fromStdString(arguments[1]));
+    return true;
+}
+
 bool RunCurve(BatchRunner& runner, const Arguments& arguments, std::string* reason)
 {
     const std::string& verb = arguments[0];
@@ -91,6 +130,27 @@ CurveParameterWindow* DialogScriptCommands::OpenDialog(QuillexWindow* window)
     return open;
 }
 
+TSParameterWindow* DialogScriptCommands::OpenStretchDialog(QuillexWindow* window)
+{
+    if (window == nullptr)
+        return nullptr;
+    TSParameterWindow* open = nullptr;
+    for (TSParameterWindow* dialog : window->findChildren<TSParameterWindow*>()) {
+        if (dialog->isVisible())
+            open = dialog;
+    }
+    return open;
+}
+
+void DialogScriptCommands::WaitForStretches()
+{
+    BatchRunner::DrainEvents();
+    while (StretchWorker::Running() > 0) {
+        QThread::msleep(2);
+        BatchRunner::DrainEvents();
+    }
+}
+
 void DialogScriptCommands::AddTo(BatchRunner& runner, std::FILE* output)
 {
     AddCurveCommand(runner);
@@ -108,25 +168,27 @@ void DialogScriptCommands::AddCurveCommand(BatchRunner& runner)
 void DialogScriptCommands::AddButtonCommands(BatchRunner& runner)
 {
     runner.AddCommand("ok", 0, 0, [&runner](const Arguments&, std::string* reason) {
-        CurveParameterWindow* dialog = nullptr;
-        if (!RequireDialog(runner, &dialog, reason))
+        OpenButtons buttons;
+        if (!RequireButtons(runner, &buttons, reason))
             return false;
-        DialogInput::ClickCentre(dialog->OkButton());
+        DialogInput::ClickCentre(buttons.ok);
+        if (buttons.stretch)
+            WaitForStretches();
         return true;
     });
     runner.AddCommand("cancel", 0, 0, [&runner](const Arguments&, std::string* reason) {
-        CurveParameterWindow* dialog = nullptr;
-        if (!RequireDialog(runner, &dialog, reason))
+        OpenButtons buttons;
+        if (!RequireButtons(runner, &buttons, reason))
             return false;
-        DialogInput::ClickCentre(dialog->CancelButton());
+        DialogInput::ClickCentre(buttons.cancel);
         return true;
     });
     runner.AddCommand("close", 0, 0, [&runner](const Arguments&, std::string* reason) {
-        CurveParameterWindow* dialog = nullptr;
-        if (!RequireDialog(runner, &dialog, reason))
+        OpenButtons buttons;
+        if (!RequireButtons(runner, &buttons, reason))
             return false;
         // What the close box does: a close request the dialog may refuse.
-        dialog->close();
+        buttons.dialog->close();
         return true;
     });
 }
@@ -135,9 +197,15 @@ void DialogScriptCommands::AddFieldCommands(BatchRunner& runner, std::FILE* outp
 {
     runner.AddCommand("dialog", 0, 0, [&runner, output](const Arguments&, std::string*) {
         BatchRunner::DrainEvents();
-        std::fprintf(output, "%s\n", DocumentStateReport::DialogJson(OpenDialog(runner.Window())).c_str());
+        TSParameterWindow* stretch = OpenStretchDialog(runner.Window());
+        const std::string json = stretch != nullptr ? DocumentStateReport::DialogJson(stretch)
+                                                    : DocumentStateReport::DialogJson(OpenDialog(runner.Window()));
+        std::fprintf(output, "%s\n", json.c_str());
         std::fflush(output);
         return true;
+    });
+    runner.AddCommand("field", 2, 2, [&runner](const Arguments& arguments, std::string* reason) {
+        return RunField(runner, arguments, reason);
     });
     runner.AddCommand("passes", 1, 1, [&runner](const Arguments& arguments, std::string* reason) {
         CurveParameterWindow* dialog = nullptr;

@@ -2,6 +2,7 @@
 
 #include <QCheckBox>
 #include <QComboBox>
+#include <QLineEdit>
 #include <QPushButton>
 
 #include <cstdint>
@@ -19,6 +20,7 @@
 #include "edit/dialogs/CurveParameterWindow.h"
 #include "edit/dialogs/FParameterWindow.h"
 #include "edit/dialogs/SpinButton.h"
+#include "edit/dialogs/TSParameterWindow.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "views/ChannelContainerView.h"
@@ -114,6 +116,20 @@ std::string DocumentStateReport::Json(QuillexWindow& window)
     return out.str();
 }
 
+std::string DocumentStateReport::DialogJson(TSParameterWindow* dialog)
+{
+    if (dialog == nullptr)
+        return "{\"title\": null}";
+    std::ostringstream out;
+    out << "{\"title\": " << Quoted(dialog->windowTitle().toStdString()) << ", \"fields\": {";
+    for (int i = 0; i < TSParameterWindow::kFieldCount; i++) {
+        out << (i == 0 ? "" : ", ") << Quoted(TSParameterWindow::Labels()[size_t(i)].toStdString()) << ": "
+            << Quoted(dialog->Field(i)->text().toStdString());
+    }
+    out << "}}";
+    return out.str();
+}
+
 std::string DocumentStateReport::DialogJson(CurveParameterWindow* dialog, bool onScreen)
 {
     if (dialog == nullptr)
@@ -164,6 +180,13 @@ std::string DocumentStateReport::PanelJson(SndFilePanel* panel)
     return out.str();
 }
 
+std::string DocumentStateReport::OpenDialogJson(QuillexWindow& window)
+{
+    if (TSParameterWindow* stretch = DialogScriptCommands::OpenStretchDialog(&window))
+        return DialogJson(stretch);
+    return DialogJson(DialogScriptCommands::OpenDialog(&window), true);
+}
+
 std::string DocumentStateReport::LiveJson(QuillexWindow& window)
 {
     std::string json = Json(window);
@@ -174,7 +197,7 @@ std::string DocumentStateReport::LiveJson(QuillexWindow& window)
         << ", \"active\": " << Boolean(window.isActiveWindow()) << ", \"playing\": " << Boolean(window.IsPlaying())
         << ", \"fields\": [" << Quoted(window.RangeStartField()->Text().toStdString()) << ", "
         << Quoted(window.RangeEndField()->Text().toStdString()) << "]"
-        << ", \"dialog\": " << DialogJson(DialogScriptCommands::OpenDialog(&window), true)
+        << ", \"dialog\": " << OpenDialogJson(window)
         << ", \"panel\": " << PanelJson(Quillex::Instance() != nullptr ? Quillex::Instance()->OpenPanel() : nullptr)
         << '}';
     return json + out.str();

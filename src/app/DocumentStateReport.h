@@ -7,6 +7,7 @@ namespace glimmet {
 class CurveParameterWindow;
 class QuillexWindow;
 class SndFilePanel;
+class TSParameterWindow;
 
 /// The state of a document window as one line of JSON, for scripts that
 /// drive the editor headless and check what it did:
@@ -39,6 +40,12 @@ public:
     /// The open panel while it is shown: {"title": T, "folder": PATH,
     /// "listed": [NAME, ...]}; null when it is not.
     static std::string PanelJson(SndFilePanel* panel);
+    /// {"title": "Time Stretch", "fields": {label: text, ...}} in the
+    /// fields' order.
+    static std::string DialogJson(TSParameterWindow* dialog);
+    /// The window's open dialog as above: the time stretch dialog when one
+    /// is open, otherwise the curve dialog on screen (or null).
+    static std::string OpenDialogJson(QuillexWindow& window);
     /// text as a JSON string literal, quotes included.
     static std::string Quoted(const std::string& text);
 };

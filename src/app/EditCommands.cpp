@@ -6,6 +6,7 @@
 
 #include "app/ActionRunner.h"
 #include "app/CommandTable.h"
+#include "app/StretchProgress.h"
 #include "edit/AddChannelAction.h"
 #include "edit/CompressorAction.h"
 #include "edit/CopyBuffer.h"
@@ -22,14 +23,18 @@
 #include "edit/RevertAction.h"
 #include "edit/RevertPhasesAction.h"
 #include "edit/SelectionCopier.h"
+#include "edit/StretchAction.h"
 #include "edit/TruncateAction.h"
 #include "edit/dialogs/CParameterWindow.h"
 #include "edit/dialogs/CurveDialogLink.h"
 #include "edit/dialogs/DParameterWindow.h"
 #include "edit/dialogs/EParameterWindow.h"
 #include "edit/dialogs/FParameterWindow.h"
+#include "edit/dialogs/TSDialogLink.h"
+#include "edit/dialogs/TSParameterWindow.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "support/Diagnostics.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
 
@@ -100,13 +105,19 @@ const std::vector<CurveEffectCommand>& CurveEffectCommands()
 
 EditCommands::EditCommands(MessageTarget& window, QWidget* dialogParent, ChannelManager& manager,
     ActionRunner& actions, CopyBuffer* copyBuffer)
-    : window_(window), dialogParent_(dialogParent), manager_(manager), actions_(actions), copyBuffer_(copyBuffer)
+    : window_(window), dialogParent_(dialogParent), manager_(manager), actions_(actions), copyBuffer_(copyBuffer),
+      progress_(std::make_unique<StretchProgress>(dialogParent, actions))
 {
 }
 
+EditCommands::~EditCommands() = default;
+
 void EditCommands::AddTo(CommandTable& table)
 {
-    table.Add(kMsgActionGo, [this] { actions_.Go(); });
+    table.Add(kMsgActionGo, [this] {
+        actions_.Go();
+        progress_->Follow();
+    });
     table.Add(kMsgActionCancel, [this] { actions_.Cancel(); });
     table.Add(kMsgUndo, [this] { actions_.Undo(); });
     table.Add(kMsgRedo, [this] { actions_.Redo(); });
@@ -115,8 +126,27 @@ void EditCommands::AddTo(CommandTable& table)
     table.Add(kMsgCut, [this] { Cut(); });
     table.Add(kMsgPaste, [this] { Paste(); });
     table.Add(kMsgSampleMoved, [this](const Message& message) { SampleMoved(message); });
+    table.Add(kMsgTimeStretch, [this] { TimeStretch(); });
+    table.Add(kMsgStretchFinished, [this] {
+        actions_.FinishStretch();
+        progress_->Follow();
+    });
     AddActionCommands(table);
     AddCurveEffectCommands(table);
+}
+
+void EditCommands::TimeStretch()
+{
+    // No menu item leads here: only a message from outside the menus. A
+    // window that is still stretching takes no new stretch, and shows no
+    // dialog for one.
+    if (actions_.Stretching()) {
+        Diagnostics::Print("Time stretch in progress: Time Stretch ignored\n");
+        return;
+    }
+    auto* dialog = new TSParameterWindow(dialogParent_, &window_);
+    dialog->ShowAtHome();
+    actions_.SetupAction(std::make_unique<StretchAction>(&window_, std::make_unique<TSDialogLink>(dialog)));
 }
 
 void EditCommands::AddActionCommands(CommandTable& table)

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <memory>
+
 class QWidget;
 
 namespace glimmet {
@@ -10,6 +12,7 @@ class CommandTable;
 class CopyBuffer;
 class Message;
 class MessageTarget;
+class StretchProgress;
 
 /// The rows of a document window's command table that edit the document:
 /// copy, the commands that make an action, the action lifecycle, undo and
@@ -24,6 +27,9 @@ public:
     /// null copies and pastes nothing.
     EditCommands(MessageTarget& window, QWidget* dialogParent, ChannelManager& manager, ActionRunner& actions,
         CopyBuffer* copyBuffer);
+    ~EditCommands();
+    EditCommands(const EditCommands&) = delete;
+    EditCommands& operator=(const EditCommands&) = delete;
 
     /// Adds the edit commands to table.
     void AddTo(CommandTable& table);
@@ -38,6 +44,8 @@ private:
     void AddActionCommands(CommandTable& table);
     /// The effects that ask for a curve in a dialog first.
     void AddCurveEffectCommands(CommandTable& table);
+    /// 'tstr': the time stretch with its dialog open.
+    void TimeStretch();
     void Cut();
     void Paste();
     /// 'smmd' from a channel's view: the drag of one sample, as an action
@@ -49,6 +57,7 @@ private:
     ChannelManager& manager_;
     ActionRunner& actions_;
     CopyBuffer* copyBuffer_;
+    std::unique_ptr<StretchProgress> progress_;
 };
 
 }  // namespace glimmet

@@ -1,6 +1,6 @@
 #include "app/ScriptCommandTable.h"
 
-#include <sstream>
+#include <algorithm>
 
 #include "app/ScriptArguments.h"
 #include "support/MessageCodes.h"
@@ -30,17 +30,39 @@ bool IsSkipped(const std::string& line)
     return first == std::string::npos || line[first] == '#';
 }
 
+using Arguments = ScriptCommandTable::Arguments;
+
+// The words of a line, split at blanks; a word that opens with a double
+// quote runs to the next double quote, blanks included, and loses both
+// quotes (so a label such as "Stretch factor:" is one argument).
+Arguments Tokens(const std::string& line)
+{
+    Arguments tokens;
+    size_t at = 0;
+    while (true) {
+        at = line.find_first_not_of(" \t\r\n", at);
+        if (at == std::string::npos)
+            return tokens;
+        if (line[at] == '"') {
+            const size_t close = line.find('"', at + 1);
+            const size_t end = close == std::string::npos ? line.size() : close;
+            tokens.push_back(line.substr(at + 1, end - at - 1));
+            at = close == std::string::npos ? end : close + 1;
+            continue;
+        }
+        const size_t end = std::min(line.find_first_of(" \t\r\n", at), line.size());
+        tokens.push_back(line.substr(at, end - at));
+        at = end;
+    }
+}
+
 }  // namespace
 
 bool ScriptCommandTable::Parse(const std::string& line, std::string* name, Arguments* arguments)
 {
     if (IsSkipped(line))
         return false;
-    std::istringstream words(line);
-    Arguments tokens;
-    std::string token;
-    while (words >> token)
-        tokens.push_back(token);
+    Arguments tokens = Tokens(line);
     *name = tokens.front();
     tokens.erase(tokens.begin());
     *arguments = std::move(tokens);

@@ -61,6 +61,8 @@ inline constexpr uint32_t kMsgDistort = FourCharCode("dist");
 inline constexpr uint32_t kMsgCompressor = FourCharCode("comp");
 inline constexpr uint32_t kMsgEnvelope = FourCharCode("enlp");
 inline constexpr uint32_t kMsgTimeStretch = FourCharCode("tstr");
+// A time stretch's worker has finished; the window writes the result back.
+inline constexpr uint32_t kMsgStretchFinished = FourCharCode("tsfn");
 
 // Channels.
 inline constexpr uint32_t kMsgAddChannel = FourCharCode("addc");
