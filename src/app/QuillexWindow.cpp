@@ -7,8 +7,6 @@
 #include <QComboBox>
 #include <QFileDialog>
 #include <QFrame>
-#include <QHBoxLayout>
-#include <QLabel>
 #include <QMenuBar>
 #include <QMimeData>
 #include <QPalette>
@@ -19,6 +17,7 @@
 #include <cstdlib>
 
 #include "app/ActionRunner.h"
+#include "app/ControlRow.h"
 #include "app/EditCommands.h"
 #include "app/MenuBuilder.h"
 #include "app/MenuTable.h"
@@ -34,6 +33,9 @@
 #include "support/MessageEvent.h"
 #include "support/MessageFields.h"
 #include "views/ChannelContainerView.h"
+#include "views/PlayButton.h"
+#include "views/PlayModeButton.h"
+#include "views/StopButton.h"
 #include "views/ViewColors.h"
 #include "views/ZoomSlider.h"
 
@@ -84,7 +86,8 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
     auto* column = new QVBoxLayout(background);
     column->setContentsMargins(5, 5, 5, 5);
     column->setSpacing(0);
-    column->addWidget(CreateControlRow());
+    controls_ = new ControlRow(this, background);
+    column->addWidget(controls_);
     column->addSpacing(5);
     column->addWidget(containerView_, 1);
     setCentralWidget(background);
@@ -114,49 +117,6 @@ QuillexWindow::~QuillexWindow()
 QAction* QuillexWindow::MenuItem(KeptMenuItem which) const
 {
     return menus_->Item(which);
-}
-
-QWidget* QuillexWindow::CreateControlRow()
-{
-    auto* row = new QWidget;
-    auto* layout = new QHBoxLayout(row);
-    layout->setContentsMargins(0, 0, 0, 0);
-    layout->setSpacing(0);
-
-    layout->addWidget(CreatePlayModePopup());
-    loopBox_ = new QCheckBox(QStringLiteral("Loop"), row);
-    loopBox_->setChecked(true);
-    connect(loopBox_, &QCheckBox::clicked, this, [this] { PostMessage(kMsgLoop); });
-    layout->addWidget(loopBox_);
-
-    layout->addStretch(1);
-
-    const QString digits = QStringLiteral("0123456789-");
-    rangeStartField_ = new TextControl(QStringLiteral("Range Start:"), QStringLiteral("-1"),
-        Message(kMsgSetRangeStart), this, row);
-    rangeStartField_->AllowOnly(digits);
-    layout->addWidget(rangeStartField_);
-    layout->addSpacing(15);
-    rangeEndField_ = new TextControl(QStringLiteral("Range End:"), QStringLiteral("-1"),
-        Message(kMsgSetRangeEnd), this, row);
-    rangeEndField_->AllowOnly(digits);
-    layout->addWidget(rangeEndField_);
-    return row;
-}
-
-QWidget* QuillexWindow::CreatePlayModePopup()
-{
-    auto* popup = new QWidget;
-    auto* layout = new QHBoxLayout(popup);
-    layout->setContentsMargins(0, 0, 0, 0);
-    auto* label = new QLabel(QStringLiteral("Play"), popup);
-    playModePopup_ = new QComboBox(popup);
-    playModePopup_->addItems({QStringLiteral("All"), QStringLiteral("Range"), QStringLiteral("Visible")});
-    label->setBuddy(playModePopup_);
-    connect(playModePopup_, &QComboBox::activated, this, [this] { PostMessage(kMsgPlayMode); });
-    layout->addWidget(label);
-    layout->addWidget(playModePopup_);
-    return popup;
 }
 
 // ---------------------------------------------------------------------------
@@ -255,17 +215,22 @@ void QuillexWindow::SetPlaymarkToCursor()
 
 void QuillexWindow::SetPlayModeButtonMode(int32_t mode)
 {
-    playModeButtonMode_ = mode;
+    controls_->PlayMode()->SetMode(mode);
+}
+
+int32_t QuillexWindow::PlayModeButtonMode() const
+{
+    return controls_->PlayMode()->Mode();
 }
 
 int32_t QuillexWindow::MarkedPlayModeIndex()
 {
-    return int32_t(playModePopup_->currentIndex());
+    return int32_t(controls_->PlayModePopup()->currentIndex());
 }
 
 bool QuillexWindow::IsLoopChecked()
 {
-    return loopBox_->isChecked();
+    return controls_->LoopBox()->isChecked();
 }
 
 void QuillexWindow::HandleSetDisplayRange(const Message& message)
@@ -281,7 +246,7 @@ void QuillexWindow::HandleRangeStartChanged(const Message& message)
     int64_t frame = 0;
     if (message.FindInt64(kFieldRangeStart, &frame) != B_OK)
         return;
-    rangeStartField_->SetText(QString::number(frame));
+    RangeStartField()->SetText(QString::number(frame));
     UpdateZoomRangeItem();
 }
 
@@ -290,27 +255,27 @@ void QuillexWindow::HandleRangeEndChanged(const Message& message)
     int64_t frame = 0;
     if (message.FindInt64(kFieldRangeEnd, &frame) != B_OK)
         return;
-    rangeEndField_->SetText(QString::number(frame));
+    RangeEndField()->SetText(QString::number(frame));
     UpdateZoomRangeItem();
 }
 
 void QuillexWindow::HandleSetRangeStart()
 {
-    manager_->SetRangeStart(RangeFieldValue(rangeStartField_));
+    manager_->SetRangeStart(RangeFieldValue(RangeStartField()));
     containerView_->RangeChanged();
     UpdateZoomRangeItem();
 }
 
 void QuillexWindow::HandleSetRangeEnd()
 {
-    manager_->SetRangeEnd(RangeFieldValue(rangeEndField_));
+    manager_->SetRangeEnd(RangeFieldValue(RangeEndField()));
     containerView_->RangeChanged();
     UpdateZoomRangeItem();
 }
 
 void QuillexWindow::UpdateZoomRangeItem()
 {
-    const bool noRange = RangeFieldValue(rangeStartField_) == -1 && RangeFieldValue(rangeEndField_) == -1;
+    const bool noRange = RangeFieldValue(RangeStartField()) == -1 && RangeFieldValue(RangeEndField()) == -1;
     menus_->Item(KeptMenuItem::ZoomRange)->setEnabled(!noRange);
 }
 
