@@ -24,8 +24,11 @@
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "views/ChannelContainerView.h"
+#include "views/PlayButton.h"
+#include "views/PlayModeButton.h"
 #include "views/SampleView.h"
 #include "views/SplineControl.h"
+#include "views/StopButton.h"
 
 namespace glimmet {
 
@@ -51,6 +54,22 @@ const char* PlayModeName(int index)
     default:
         return "all";
     }
+}
+
+void WriteTransport(std::ostringstream& out, QuillexWindow& window)
+{
+    PlayModeButton* playMode = window.GetPlayModeButton();
+    PlayButton* play = window.GetPlayButton();
+    const bool enabled = playMode->IsEnabled() && play->IsEnabled() && window.GetStopButton()->IsEnabled();
+    out << ", \"transport\": {\"play mode\": " << playMode->Mode() << ", \"play\": " << play->Mode()
+        << ", \"enabled\": " << Boolean(enabled) << '}';
+}
+
+/// The centre of a transport button on the screen.
+void WriteButtonCentre(std::ostringstream& out, const char* name, QWidget* button)
+{
+    const QPoint centre = button->mapToGlobal(button->rect().center());
+    out << '"' << name << "\": [" << centre.x() << ", " << centre.y() << ']';
 }
 
 void WriteChannel(std::ostringstream& out, Channel& channel, SampleView* view, QuillexWindow& window)
@@ -105,8 +124,9 @@ std::string DocumentStateReport::Json(QuillexWindow& window)
         << ", \"cursor\": " << container->CursorFrame() << ", \"playmark\": " << container->PlaymarkFrame()
         << ", \"display\": [" << container->FirstDisplayedFrame() << ", " << container->LastDisplayedFrame() << "]"
         << ", \"playmode\": \"" << PlayModeName(window.PlayModePopup()->currentIndex()) << '"'
-        << ", \"loop\": " << Boolean(window.LoopBox()->isChecked()) << ", \"undo\": " << undo
-        << ", \"redo\": " << redo << ", \"saved\": " << Boolean(saved) << ", \"channels\": [";
+        << ", \"loop\": " << Boolean(window.LoopBox()->isChecked());
+    WriteTransport(out, window);
+    out << ", \"undo\": " << undo << ", \"redo\": " << redo << ", \"saved\": " << Boolean(saved) << ", \"channels\": [";
     for (int32_t index = 0; Channel* channel = manager->ChannelAt(index); ++index) {
         if (index > 0)
             out << ", ";
@@ -199,7 +219,13 @@ std::string DocumentStateReport::LiveJson(QuillexWindow& window)
         << Quoted(window.RangeEndField()->Text().toStdString()) << "]"
         << ", \"dialog\": " << OpenDialogJson(window)
         << ", \"panel\": " << PanelJson(Quillex::Instance() != nullptr ? Quillex::Instance()->OpenPanel() : nullptr)
-        << '}';
+        << ", \"buttons\": {";
+    WriteButtonCentre(out, "play", window.GetPlayButton());
+    out << ", ";
+    WriteButtonCentre(out, "play mode", window.GetPlayModeButton());
+    out << ", ";
+    WriteButtonCentre(out, "stop", window.GetStopButton());
+    out << "}}";
     return json + out.str();
 }
 

@@ -14,7 +14,8 @@ class TSParameterWindow;
 ///
 ///   {"title": ..., "frames": N, "range": [S, E], "cursor": C, "playmark": P,
 ///    "display": [FIRST, LAST], "playmode": "all"|"range"|"visible",
-///    "loop": B, "undo": NAME|null, "redo": NAME|null, "saved": B,
+///    "loop": B, "transport": {"play mode": M, "play": M, "enabled": B},
+///    "undo": NAME|null, "redo": NAME|null, "saved": B,
 ///    "channels": [{"first": F, "frames": N, "muted": B, "pan": P,
 ///                  "selected": B, "focused": B, "view": [X, Y, W, H]}, ...]}
 ///
@@ -28,7 +29,9 @@ public:
     ///   "screen": [X, Y] (the window's top left on the screen),
     ///   "active": B, "playing": B, "fields": [START TEXT, END TEXT],
     ///   "dialog": the open parameter dialog, on screen (see DialogJson),
-    ///   "panel": the open panel (see PanelJson).
+    ///   "panel": the open panel (see PanelJson),
+    ///   "buttons": {"play": [X, Y], "play mode": [X, Y], "stop": [X, Y]},
+    ///   the centres of the transport buttons on the screen.
     static std::string LiveJson(QuillexWindow& window);
     /// The parameter dialog: {"title": T, "points": [[X, Y], ...],
     /// "passes": N (FIR only), "labels": [FIRST, SECOND]}, each number

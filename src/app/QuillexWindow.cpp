@@ -7,8 +7,6 @@
 #include <QComboBox>
 #include <QFileDialog>
 #include <QFrame>
-#include <QHBoxLayout>
-#include <QLabel>
 #include <QMenuBar>
 #include <QMimeData>
 #include <QPalette>
@@ -20,6 +18,7 @@
 
 #include "app/ActionRunner.h"
 #include "app/BubbleHelper.h"
+#include "app/ControlRow.h"
 #include "app/EditCommands.h"
 #include "app/HelpTexts.h"
 #include "app/MenuBuilder.h"
@@ -36,6 +35,9 @@
 #include "support/MessageEvent.h"
 #include "support/MessageFields.h"
 #include "views/ChannelContainerView.h"
+#include "views/PlayButton.h"
+#include "views/PlayModeButton.h"
+#include "views/StopButton.h"
 #include "views/ViewColors.h"
 #include "views/ZoomSlider.h"
 
@@ -86,13 +88,17 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
     auto* column = new QVBoxLayout(background);
     column->setContentsMargins(5, 5, 5, 5);
     column->setSpacing(0);
-    column->addWidget(CreateControlRow());
+    controls_ = new ControlRow(this, background);
+    column->addWidget(controls_);
     column->addSpacing(5);
     column->addWidget(containerView_, 1);
     setCentralWidget(background);
 
     BubbleHelper::RegisterHelp(containerView_, help::kChannelContainerView);
-    BubbleHelper::RegisterHelp(playModePopup_->parentWidget(), help::kPlayModePopup);
+    BubbleHelper::RegisterHelp(PlayModePopup()->parentWidget(), help::kPlayModePopup);
+    BubbleHelper::RegisterHelp(GetPlayButton(), help::kPlayButton);
+    BubbleHelper::RegisterHelp(GetPlayModeButton(), help::kPlayModeButton);
+    BubbleHelper::RegisterHelp(GetStopButton(), help::kStopButton);
 
     playback_ = std::make_unique<PlaybackController>(manager_, this, this);
     playback_->SetUp();
@@ -119,49 +125,6 @@ QuillexWindow::~QuillexWindow()
 QAction* QuillexWindow::MenuItem(KeptMenuItem which) const
 {
     return menus_->Item(which);
-}
-
-QWidget* QuillexWindow::CreateControlRow()
-{
-    auto* row = new QWidget;
-    auto* layout = new QHBoxLayout(row);
-    layout->setContentsMargins(0, 0, 0, 0);
-    layout->setSpacing(0);
-
-    layout->addWidget(CreatePlayModePopup());
-    loopBox_ = new QCheckBox(QStringLiteral("Loop"), row);
-    loopBox_->setChecked(true);
-    connect(loopBox_, &QCheckBox::clicked, this, [this] { PostMessage(kMsgLoop); });
-    layout->addWidget(loopBox_);
-
-    layout->addStretch(1);
-
-    const QString digits = QStringLiteral("0123456789-");
-    rangeStartField_ = new TextControl(QStringLiteral("Range Start:"), QStringLiteral("-1"),
-        Message(kMsgSetRangeStart), this, row);
-    rangeStartField_->AllowOnly(digits);
-    layout->addWidget(rangeStartField_);
-    layout->addSpacing(15);
-    rangeEndField_ = new TextControl(QStringLiteral("Range End:"), QStringLiteral("-1"),
-        Message(kMsgSetRangeEnd), this, row);
-    rangeEndField_->AllowOnly(digits);
-    layout->addWidget(rangeEndField_);
-    return row;
-}
-
-QWidget* QuillexWindow::CreatePlayModePopup()
-{
-    auto* popup = new QWidget;
-    auto* layout = new QHBoxLayout(popup);
-    layout->setContentsMargins(0, 0, 0, 0);
-    auto* label = new QLabel(QStringLiteral("Play"), popup);
-    playModePopup_ = new QComboBox(popup);
-    playModePopup_->addItems({QStringLiteral("All"), QStringLiteral("Range"), QStringLiteral("Visible")});
-    label->setBuddy(playModePopup_);
-    connect(playModePopup_, &QComboBox::activated, this, [this] { PostMessage(kMsgPlayMode); });
-    layout->addWidget(label);
-    layout->addWidget(playModePopup_);
-    return popup;
 }
 
 // ---------------------------------------------------------------------------
@@ -260,17 +223,22 @@ void QuillexWindow::SetPlaymarkToCursor()
 
 void QuillexWindow::SetPlayModeButtonMode(int32_t mode)
 {
-    playModeButtonMode_ = mode;
+    controls_->PlayMode()->SetMode(mode);
+}
+
+int32_t QuillexWindow::PlayModeButtonMode() const
+{
+    return controls_->PlayMode()->Mode();
 }
 
 int32_t QuillexWindow::MarkedPlayModeIndex()
 {
-    return int32_t(playModePopup_->currentIndex());
+    return int32_t(controls_->PlayModePopup()->currentIndex());
 }
 
 bool QuillexWindow::IsLoopChecked()
 {
-    return loopBox_->isChecked();
+    return controls_->LoopBox()->isChecked();
 }
 
 void QuillexWindow::HandleSetDisplayRange(const Message& message)
@@ -286,7 +254,7 @@ void QuillexWindow::HandleRangeStartChanged(const Message& message)
     int64_t frame = 0;
     if (message.FindInt64(kFieldRangeStart, &frame) != B_OK)
         return;
-    rangeStartField_->SetText(QString::number(frame));
+    RangeStartField()->SetText(QString::number(frame));
     UpdateZoomRangeItem();
 }
 
@@ -295,27 +263,27 @@ void QuillexWindow::HandleRangeEndChanged(const Message& message)
     int64_t frame = 0;
     if (message.FindInt64(kFieldRangeEnd, &frame) != B_OK)
         return;
-    rangeEndField_->SetText(QString::number(frame));
+    RangeEndField()->SetText(QString::number(frame));
     UpdateZoomRangeItem();
 }
 
 void QuillexWindow::HandleSetRangeStart()
 {
-    manager_->SetRangeStart(RangeFieldValue(rangeStartField_));
+    manager_->SetRangeStart(RangeFieldValue(RangeStartField()));
     containerView_->RangeChanged();
     UpdateZoomRangeItem();
 }
 
 void QuillexWindow::HandleSetRangeEnd()
 {
-    manager_->SetRangeEnd(RangeFieldValue(rangeEndField_));
+    manager_->SetRangeEnd(RangeFieldValue(RangeEndField()));
     containerView_->RangeChanged();
     UpdateZoomRangeItem();
 }
 
 void QuillexWindow::UpdateZoomRangeItem()
 {
-    const bool noRange = RangeFieldValue(rangeStartField_) == -1 && RangeFieldValue(rangeEndField_) == -1;
+    const bool noRange = RangeFieldValue(RangeStartField()) == -1 && RangeFieldValue(RangeEndField()) == -1;
     menus_->Item(KeptMenuItem::ZoomRange)->setEnabled(!noRange);
 }
 

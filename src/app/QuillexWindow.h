@@ -8,6 +8,7 @@
 #include <optional>
 
 #include "app/CommandTable.h"
+#include "app/ControlRow.h"
 #include "app/SaveFlow.h"
 #include "files/LoadTarget.h"
 #include "playback/PlaybackWindow.h"
@@ -30,9 +31,13 @@ class CopyBuffer;
 class EditCommands;
 class HistoryManager;
 class MenuBuilder;
+class PlayButton;
 class PlaybackController;
-class ZoomSlider;
+class PlayModeButton;
+class StopButton;
 class TextControl;
+class TransportButton;
+class ZoomSlider;
 enum class KeptMenuItem;
 
 /// A document window: one open sound with its channels, history, views,
@@ -124,8 +129,9 @@ public:
     /// The copy buffer the window copies into and pastes from.
     const CopyBuffer* SharedCopyBuffer() const;
     bool IsPlaying() const;
-    /// 0 while playback runs, 1 while it is stopped.
-    int32_t PlayModeButtonMode() const { return playModeButtonMode_; }
+    /// The play mode button's mode: 0 while playback runs, 1 while it is
+    /// stopped.
+    int32_t PlayModeButtonMode() const;
     ChannelContainerView* ContainerView() const { return containerView_; }
     ZoomSlider* GetZoomSlider() const { return zoomSlider_; }
     PlaybackController* Playback() const { return playback_.get(); }
@@ -134,10 +140,16 @@ public:
     const std::optional<std::filesystem::path>& FileEntry() const;
     void SetFileEntry(std::optional<std::filesystem::path> entry);
     QAction* MenuItem(KeptMenuItem which) const;
-    TextControl* RangeStartField() const { return rangeStartField_; }
-    TextControl* RangeEndField() const { return rangeEndField_; }
-    QComboBox* PlayModePopup() const { return playModePopup_; }
-    QCheckBox* LoopBox() const { return loopBox_; }
+    TextControl* RangeStartField() const { return controls_->RangeStartField(); }
+    TextControl* RangeEndField() const { return controls_->RangeEndField(); }
+    QComboBox* PlayModePopup() const { return controls_->PlayModePopup(); }
+    QCheckBox* LoopBox() const { return controls_->LoopBox(); }
+    PlayButton* GetPlayButton() const { return controls_->Play(); }
+    PlayModeButton* GetPlayModeButton() const { return controls_->PlayMode(); }
+    StopButton* GetStopButton() const { return controls_->Stop(); }
+    /// The transport button called name ("play", "play mode", "stop"), or
+    /// null.
+    TransportButton* TransportButtonNamed(const QString& name) const { return controls_->TransportButtonNamed(name); }
     /// The save panel, made on first use; null before.
     QFileDialog* SavePanel() const;
 
@@ -148,8 +160,6 @@ protected:
     void dropEvent(QDropEvent* event) override;
 
 private:
-    QWidget* CreateControlRow();
-    QWidget* CreatePlayModePopup();
     void PostToApplication(const Message& message);
     void FillCommandTable();
 
@@ -181,12 +191,10 @@ private:
     CommandTable commands_;
     /// Playing state, the play mark throttle and the playback graph.
     std::unique_ptr<PlaybackController> playback_;
-    int32_t playModeButtonMode_ = 1;
     bool appendOnLoad_ = false;
-    TextControl* rangeStartField_ = nullptr;
-    TextControl* rangeEndField_ = nullptr;
-    QComboBox* playModePopup_ = nullptr;
-    QCheckBox* loopBox_ = nullptr;
+    /// The transport buttons, the play mode popup, the loop box and the
+    /// range fields.
+    ControlRow* controls_ = nullptr;
 
     Locker windowLock_;
     bool quitting_ = false;

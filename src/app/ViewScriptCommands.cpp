@@ -8,8 +8,10 @@
 #include <vector>
 
 #include "app/BatchRunner.h"
+#include "app/DialogInput.h"
 #include "app/ScriptArguments.h"
 #include "support/MessageCodes.h"
+#include "views/TransportButton.h"
 
 namespace glimmet {
 
@@ -41,6 +43,28 @@ void ViewScriptCommands::AddPlaybackCommands(BatchRunner& runner)
         QCheckBox* box = runner.Window()->LoopBox();
         if (box->isChecked() != (arguments[0] == "on"))
             box->click();
+        return true;
+    });
+    // A press and a release in the middle of the button, as the mouse
+    // delivers them.
+    runner.AddCommand("press", 1, 3, [&runner](const Arguments& arguments, std::string* reason) {
+        std::string name = arguments[0];
+        size_t next = 1;
+        if (name == "play" && arguments.size() > 1 && arguments[1] == "mode") {
+            name = "play mode";
+            next = 2;
+        }
+        TransportButton* button = runner.Window()->TransportButtonNamed(QString::fromStdString(name));
+        if (button == nullptr || arguments.size() > next + 1)
+            return ScriptArguments::Fail(reason, "press takes play, play mode or stop, then left or right");
+        Qt::MouseButton mouseButton = Qt::LeftButton;
+        if (arguments.size() > next) {
+            if (arguments[next] == "right")
+                mouseButton = Qt::RightButton;
+            else if (arguments[next] != "left")
+                return ScriptArguments::Fail(reason, "press takes left or right after the button's name");
+        }
+        DialogInput::Click(button, button->rect().center(), mouseButton);
         return true;
     });
     runner.AddCommand("wait", 1, 1, [](const Arguments& arguments, std::string* reason) {

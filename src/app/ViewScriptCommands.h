@@ -5,7 +5,7 @@ namespace glimmet {
 class BatchRunner;
 
 /// Script commands for the playback controls and the window itself:
-/// playmode, loop, wait, size and snapshot.
+/// playmode, loop, press, wait, size and snapshot.
 class ViewScriptCommands {
 public:
     static void AddTo(BatchRunner& runner);

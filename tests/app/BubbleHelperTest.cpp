@@ -17,6 +17,9 @@
 #include "app/PointerProbe.h"
 #include "support/MessageCodes.h"
 #include "views/ChannelContainerView.h"
+#include "views/PlayButton.h"
+#include "views/PlayModeButton.h"
+#include "views/StopButton.h"
 
 namespace glimmet::test {
 namespace {
@@ -391,6 +394,9 @@ TEST(BubbleHelp, EveryWindowRegistersItsTextsWordForWord)
         "You can pick what part of the sample will be looped.");
     // The popup's parts find the text through their parent.
     EXPECT_TRUE(helper->GetHelp(window->PlayModePopup()).isNull());
+    EXPECT_EQ(helper->GetHelp(window->GetPlayButton()), help::kPlayButton);
+    EXPECT_EQ(helper->GetHelp(window->GetPlayModeButton()), help::kPlayModeButton);
+    EXPECT_EQ(helper->GetHelp(window->GetStopButton()), "Immediatly stops playback");
     // Qt's own tooltips stay out of the way.
     EXPECT_TRUE(window->ContainerView()->toolTip().isEmpty());
     EXPECT_TRUE(window->PlayModePopup()->toolTip().isEmpty());

@@ -9,8 +9,8 @@ e2e_begin "$@"
 
 # The widget the pointer rests on (see widget_point) and the text its
 # bubble shows.
-HELP_WIDGET=play-popup
-HELP_TEXT="You can pick what part of the sample will be looped."
+HELP_WIDGET=stop
+HELP_TEXT="Immediatly stops playback"
 
 MENU_HELP=5
 # "Bubble Help" among the Help menu's items (Index, Send Feedback, Bubble Help).
@@ -22,7 +22,8 @@ widget_point() {
     read -r wx wy <<<"$(window_box)"
     case "$1" in
         # The popup sits right of the "Play" label.
-        play-popup) echo "$((wx + 70)) $((wy + 35))" ;;
+        play-popup) echo "$((wx + 200)) $((wy + 35))" ;;
+        stop) state_field '.buttons.stop | @tsv' ;;
         channel-view) view_point 0 0.5 0.5 ;;
         *) fail "no place known for widget '$1'" ;;
     esac

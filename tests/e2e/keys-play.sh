@@ -77,22 +77,23 @@ after=$(state_field '[.cursor, .range, .display, .channels[0].focused, .undo]')
 [ "$after" = "$before" ] || fail "the arrow keys changed [cursor, range, display, focus, undo] from $before to $after"
 
 note "the play-mode popup"
-# The popup sits right of the "Play" label, the box right of the popup.
-click_at $((wx + 70)) $((wy + 35))
+# The popup sits right of the transport buttons and the "Play" label, the
+# box right of the popup.
+click_at $((wx + 200)) $((wy + 35))
 sleep 0.4
 xdotool key Down Return
 expect_state '.playmode' range "Range chosen from the open popup"
 xdotool key Down
 expect_state '.playmode' visible "Down on the focused popup"
-click_at $((wx + 70)) $((wy + 35))
+click_at $((wx + 200)) $((wy + 35))
 sleep 0.4
 xdotool key Up Up Return
 expect_state '.playmode' all "All chosen from the open popup"
 
 note "the Loop box"
-click_at $((wx + 113)) $((wy + 35))
+click_at $((wx + 243)) $((wy + 35))
 expect_state '.loop' false "a click clears Loop"
-click_at $((wx + 113)) $((wy + 35))
+click_at $((wx + 243)) $((wy + 35))
 expect_state '.loop' true "a second click sets Loop again"
 
 quit_app

@@ -56,13 +56,17 @@ note "Ctrl+E is Envelope…, not Show All"
 xdotool key ctrl+r
 expect_state '.display' "$zoomed" "Ctrl+R zooms in again"
 xdotool key ctrl+e
-settle
+expect_state '.dialog.title' "Envelope" "Ctrl+E opens the Envelope dialog"
 expect_state '[.display, .undo]' "[$zoomed,null]" "Ctrl+E leaves the zoom as it was"
 expect_no_log "Ambiguous" "a shortcut is ambiguous"
+# Escape in the dialog cancels it: nothing recorded.
+xdotool key Escape
+expect_state '[.dialog.title, .undo]' '[null,null]' "Escape in the Envelope dialog"
+xdotool windowactivate --sync "$window" 2>/dev/null || true
 
 note "Ctrl+O is Open…, not Fade Out"
 xdotool key ctrl+o
-[ -n "$(find_window Open)" ] || fail "Ctrl+O showed no open panel"
+[ -n "$(find_window "Select A Sound File")" ] || fail "Ctrl+O showed no open panel"
 expect_state '[.undo, .saved]' '[null,true]' "Ctrl+O fades nothing"
 expect_no_log "Ambiguous" "a shortcut is ambiguous"
 quit_app

@@ -83,7 +83,7 @@ cmp -s gui.wav gui-before.wav && fail "Ctrl+S wrote nothing new"
 
 note "Ctrl+Shift+O appends the channels of the file chosen"
 xdotool key ctrl+shift+o
-choose_in_panel "Open" "$PWD/in.wav"
+choose_in_panel "Select A Sound File" "$PWD/in.wav"
 expect_step "Ctrl+Shift+O appends in.wav"
 reactivate
 

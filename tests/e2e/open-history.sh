@@ -17,7 +17,7 @@ expect_state '.undo' "Fade Out" "Tools > Fade Out"
 
 note "File > Open… b.wav into the same window"
 menu_pick "$MENU_FILE" 1
-choose_in_panel "Open" "$PWD/b.wav"
+choose_in_panel "Select A Sound File" "$PWD/b.wav"
 expect_state '[.title, .frames]' "[\"Glimmet - b.wav\",$b_frames]" "b.wav opens into the window"
 [ "$(window_count)" = 1 ] || fail "b.wav opened another window"
 reactivate

@@ -15,7 +15,7 @@ xdotool key ctrl+n
 second=$(wait_window '^Glimmet$')
 expect_state '.active' true "the new window is active" 1
 menu_pick "$MENU_FILE" 1 1
-choose_in_panel "Open" "$PWD/b.wav"
+choose_in_panel "Select A Sound File" "$PWD/b.wav"
 expect_state '[.title, .frames]' '["Glimmet - b.wav",44100]' "b.wav opens into the second window" 1
 
 note "both play"

@@ -103,7 +103,8 @@ find_window() {
     echo "$id"
 }
 
-# Chooses file $2 in the file panel named $1 ("Open", "Save As") by typing
+# Chooses file $2 in the file panel named $1 ("Select A Sound File", "Save
+# As") by typing
 # its path.
 choose_in_panel() {
     local panel
