@@ -104,8 +104,7 @@ find_window() {
 }
 
 # Chooses file $2 in the file panel named $1 ("Select A Sound File", "Save
-# As") by typing
-# its path.
+# As") by typing its path.
 choose_in_panel() {
     local panel
     panel=$(find_window "$1")
