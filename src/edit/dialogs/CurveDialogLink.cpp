@@ -46,12 +46,8 @@ void CurveDialogLink::Hide()
 
 void CurveDialogLink::Quit()
 {
-    if (dialog_.isNull())
-        return;
-    // Later, not now: the dialog may be in the middle of delivering the
-    // event that led here.
-    dialog_->hide();
-    dialog_->deleteLater();
+    if (!dialog_.isNull())
+        dialog_->QuitLater();
     dialog_.clear();
 }
 

@@ -1,27 +1,21 @@
 #pragma once
 
-#include <QDialog>
 #include <QString>
 
 #include <cstdint>
 
-class QPushButton;
+#include "edit/dialogs/ParameterDialog.h"
+
+class QLayout;
 class QVBoxLayout;
 
 namespace glimmet {
 
-class MessageTarget;
 class SplineControl;
 
-/// A parameter dialog of the curve effects: a curve control above a row of
-/// "Cancel" and "Ok". It is modal for its document window only, so other
-/// document windows keep working while it is open.
-///
-/// It answers the document window, not its action: "Ok" (the default
-/// button) posts 'acgo', "Cancel", the close box and Escape post 'accc'.
-/// Closing it therefore only asks; the window drops the action, and the
-/// action takes the dialog away.
-class CurveParameterWindow : public QDialog {
+/// A parameter dialog of the curve effects: a curve control above the row
+/// of "Cancel" and "Ok".
+class CurveParameterWindow : public ParameterDialog {
     Q_OBJECT
 
 public:
@@ -48,28 +42,14 @@ public:
     virtual int32_t NumPasses() const;
 
     SplineControl* Control() const { return control_; }
-    QPushButton* OkButton() const { return ok_; }
-    QPushButton* CancelButton() const { return cancel_; }
-
-    /// Brings the dialog up at its place on the screen, at least as large as
-    /// its contents need.
-    void ShowAtHome();
 
 protected:
     /// Inserts a row between the curve and the buttons.
     void AddRowAboveButtons(QLayout* row);
 
-    void closeEvent(QCloseEvent* event) override;
-    void reject() override;
-
 private:
-    void Answer(uint32_t what);
-
-    MessageTarget* target_;
     SplineControl* control_;
     QVBoxLayout* column_;
-    QPushButton* cancel_;
-    QPushButton* ok_;
 };
 
 }  // namespace glimmet

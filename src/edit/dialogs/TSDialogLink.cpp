@@ -27,11 +27,8 @@ StretchParameters TSDialogLink::GetParameters()
 
 void TSDialogLink::Quit()
 {
-    if (dialog_.isNull())
-        return;
-    // Later, not now: the dialog may be delivering the event that led here.
-    dialog_->hide();
-    dialog_->deleteLater();
+    if (!dialog_.isNull())
+        dialog_->QuitLater();
     dialog_.clear();
 }
 

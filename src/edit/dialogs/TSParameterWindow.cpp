@@ -1,26 +1,18 @@
 #include "edit/dialogs/TSParameterWindow.h"
 
-#include <QCloseEvent>
 #include <QFormLayout>
 #include <QHBoxLayout>
 #include <QLabel>
 #include <QLineEdit>
-#include <QPushButton>
 #include <QVBoxLayout>
 
 #include <clocale>
 #include <cstdlib>
 #include <locale.h>
 
-#include "support/MessageCodes.h"
-#include "support/MessageTarget.h"
-
 namespace glimmet {
 
 namespace {
-
-constexpr QPoint kHome(200, 200);
-constexpr QSize kStartSize(101, 101);
 
 const std::array<const char*, TSParameterWindow::kFieldCount> kInitialTexts{
     "8192", "8192", "2048", "2048", "2.0", "0.0", "0.0"};
@@ -35,14 +27,9 @@ locale_t CLocale()
 
 }  // namespace
 
-TSParameterWindow::TSParameterWindow(QWidget* parent, MessageTarget* target) : QDialog(parent), target_(target)
+TSParameterWindow::TSParameterWindow(QWidget* parent, MessageTarget* target)
+    : ParameterDialog(parent, target, QStringLiteral("Time Stretch"))
 {
-    setWindowTitle(QStringLiteral("Time Stretch"));
-    setWindowModality(Qt::WindowModal);
-    setWindowFlag(Qt::WindowMaximizeButtonHint, false);
-    setWindowFlag(Qt::WindowContextHelpButtonHint, false);
-    setAttribute(Qt::WA_DeleteOnClose, false);
-
     auto* form = new QFormLayout;
     for (int i = 0; i < kFieldCount; i++) {
         fields_[size_t(i)] = new QLineEdit(QString::fromLatin1(kInitialTexts[size_t(i)]), this);
@@ -50,21 +37,10 @@ TSParameterWindow::TSParameterWindow(QWidget* parent, MessageTarget* target) : Q
         label->setBuddy(fields_[size_t(i)]);
         form->addRow(label, fields_[size_t(i)]);
     }
-    cancel_ = new QPushButton(QStringLiteral("Cancel"), this);
-    ok_ = new QPushButton(QStringLiteral("Ok"), this);
-    ok_->setDefault(true);
-    ok_->setAutoDefault(true);
-    cancel_->setAutoDefault(false);
-    connect(cancel_, &QPushButton::clicked, this, [this] { Answer(kMsgActionCancel); });
-    connect(ok_, &QPushButton::clicked, this, [this] { Answer(kMsgActionGo); });
-
-    auto* buttons = new QHBoxLayout;
-    buttons->addWidget(cancel_, 1);
-    buttons->addWidget(ok_, 1);
     auto* column = new QVBoxLayout(this);
     column->setContentsMargins(5, 5, 5, 5);
     column->addLayout(form);
-    column->addLayout(buttons);
+    column->addLayout(ButtonRow());
 }
 
 TSParameterWindow::~TSParameterWindow() = default;
@@ -121,28 +97,8 @@ StretchParameters TSParameterWindow::Parameters() const
 
 void TSParameterWindow::ShowAtHome()
 {
-    move(kHome);
-    resize(kStartSize.expandedTo(minimumSizeHint()));
-    show();
+    ParameterDialog::ShowAtHome();
     setFixedHeight(height());
-}
-
-void TSParameterWindow::Answer(uint32_t what)
-{
-    if (target_ != nullptr)
-        target_->PostMessage(what);
-}
-
-void TSParameterWindow::closeEvent(QCloseEvent* event)
-{
-    // The close box cancels; the window goes when its action does.
-    event->ignore();
-    Answer(kMsgActionCancel);
-}
-
-void TSParameterWindow::reject()
-{
-    Answer(kMsgActionCancel);
 }
 
 }  // namespace glimmet

@@ -1,28 +1,22 @@
 #pragma once
 
-#include <QDialog>
 #include <QString>
 
 #include <array>
 #include <cstdint>
 
 #include "edit/StretchDialog.h"
+#include "edit/dialogs/ParameterDialog.h"
 
 class QLineEdit;
-class QPushButton;
 
 namespace glimmet {
-
-class MessageTarget;
 
 /// "Time Stretch": seven labelled text fields for the phase vocoder's
 /// parameters above "Cancel" and the default "Ok". Modal for its document
 /// window only, so other windows keep working; it can be made wider but not
 /// taller.
-///
-/// It answers the document window, not its action: "Ok" posts 'acgo';
-/// "Cancel", the close box and Escape post 'accc'.
-class TSParameterWindow : public QDialog {
+class TSParameterWindow : public ParameterDialog {
     Q_OBJECT
 
 public:
@@ -46,9 +40,6 @@ public:
     QLineEdit* Field(int index) const { return fields_[size_t(index)]; }
     /// The field labelled label, or null.
     QLineEdit* FieldLabelled(const QString& label) const;
-    QPushButton* OkButton() const { return ok_; }
-    QPushButton* CancelButton() const { return cancel_; }
-
     /// Brings the dialog up at its place on the screen, as large as its
     /// contents need and no taller.
     void ShowAtHome();
@@ -56,17 +47,8 @@ public:
     static int32_t ParseInteger(const QString& text);
     static float ParseFloat(const QString& text);
 
-protected:
-    void closeEvent(QCloseEvent* event) override;
-    void reject() override;
-
 private:
-    void Answer(uint32_t what);
-
-    MessageTarget* target_;
     std::array<QLineEdit*, kFieldCount> fields_{};
-    QPushButton* cancel_;
-    QPushButton* ok_;
 };
 
 }  // namespace glimmet
