@@ -10,6 +10,7 @@
 #include "playback/PlaybackGraph.h"
 #include "sound/ChannelManager.h"
 #include "support/DiagnosticsCapture.h"
+#include "support/SystemTime.h"
 
 namespace glimmet {
 namespace {
@@ -233,9 +234,13 @@ TEST_F(GraphTest, AFailedConnectionLeavesTheProducerAndAFailedInitialLatencyStil
     EXPECT_EQ(graph->StartNodes(), B_OK);
     EXPECT_EQ(secondCapture.Finish(),
         "Can't get initial latency for audio producer node - Error: Media nodes not connected\n");
-    // The start is queued: the producer takes it at its next period.
+    // The start is queued: the producer takes it at its next period. That
+    // period lies a second ahead of the start's time (the clock counts from
+    // the machine's start, so no fixed frame number is late enough).
     std::vector<float> period(512);
-    producer->ServeDevice(period.data(), 256, 1 << 30);
+    const double rate = producer->Output().format.frameRate;
+    const auto ahead = int64_t(double(system_time() + 1000000) * rate / 1e6);
+    producer->ServeDevice(period.data(), 256, ahead);
     EXPECT_TRUE(producer->IsStarted());
 
     DiagnosticsCapture thirdCapture;
