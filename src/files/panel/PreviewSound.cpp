@@ -16,6 +16,7 @@ namespace {
 // it is that far ahead.
 constexpr double kQueueSeconds = 0.5;
 constexpr std::chrono::milliseconds kNap(10);
+constexpr int kMaxPrefillReads = 512;
 
 }  // namespace
 
@@ -86,7 +87,19 @@ status_t PreviewSound::StartPlaying()
     track_->SeekToFrame(&start);
     stop_ = false;
     feeding_ = true;
-    feeder_ = std::thread([this] { Feed(); });
+    // The first half second is queued before the device starts, so the
+    // start never underruns, however slow the decoder is to get going; a
+    // short sound is then whole in the queue.
+    // Bounded, so a track that keeps giving empty reads cannot hold the
+    // panel.
+    for (int reads = 0; reads < kMaxPrefillReads && SDL_GetQueuedAudioSize(device_) <= QueueLimit(); reads++) {
+        if (!QueueNextFrames()) {
+            feeding_ = false;
+            break;
+        }
+    }
+    if (feeding_)
+        feeder_ = std::thread([this] { Feed(); });
     SDL_PauseAudioDevice(device_, 0);
     return B_OK;
 }
@@ -116,21 +129,32 @@ void PreviewSound::StopFeeding()
     feeding_ = false;
 }
 
-void PreviewSound::Feed()
+Uint32 PreviewSound::QueueLimit() const
 {
     const Uint32 bytesPerSecond = Uint32(rate_) * Uint32(channels_) * sizeof(int16_t);
-    const Uint32 ahead = Uint32(kQueueSeconds * bytesPerSecond);
+    return Uint32(kQueueSeconds * bytesPerSecond);
+}
+
+bool PreviewSound::QueueNextFrames()
+{
+    const int16_t* frames = nullptr;
+    int64_t count = 0;
+    if (track_->ReadFramesInPlace(&frames, &count) != B_OK)
+        return false;
+    if (count > 0)
+        SDL_QueueAudio(device_, frames, Uint32(count) * Uint32(channels_) * sizeof(int16_t));
+    return true;
+}
+
+void PreviewSound::Feed()
+{
     while (!stop_) {
-        if (SDL_GetQueuedAudioSize(device_) > ahead) {
+        if (SDL_GetQueuedAudioSize(device_) > QueueLimit()) {
             std::this_thread::sleep_for(kNap);
             continue;
         }
-        const int16_t* frames = nullptr;
-        int64_t count = 0;
-        if (track_->ReadFramesInPlace(&frames, &count) != B_OK)
+        if (!QueueNextFrames())
             break;
-        if (count > 0)
-            SDL_QueueAudio(device_, frames, Uint32(count) * Uint32(channels_) * sizeof(int16_t));
     }
     feeding_ = false;
 }

@@ -47,6 +47,10 @@ private:
     void StopFeeding();
     /// The decoding thread: reads the track and queues its frames.
     void Feed();
+    /// Queues the track's next frames; false at its end or on an error.
+    bool QueueNextFrames();
+    /// How many bytes the decoder keeps queued ahead of the device.
+    Uint32 QueueLimit() const;
 
     std::unique_ptr<MediaFile> file_;
     MediaTrack* track_ = nullptr;
