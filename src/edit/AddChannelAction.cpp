@@ -19,15 +19,28 @@ status_t AddChannelAction::Go()
 {
     if (Manager() == nullptr || Context() == nullptr)
         return B_ERROR;
-    channel_ = Manager()->AddChannel(std::make_unique<Channel>());
+    Channel* channel = Manager()->AddChannel(std::make_unique<Channel>());
+    channelId_ = channel != nullptr ? channel->Id() : 0;
     return B_OK;
+}
+
+Channel* AddChannelAction::AddedChannel() const
+{
+    if (owned_ != nullptr)
+        return owned_.get();
+    if (Manager() == nullptr || channelId_ == 0)
+        return nullptr;
+    return Manager()->ChannelWithId(channelId_);
 }
 
 status_t AddChannelAction::Undo()
 {
     if (Manager() == nullptr)
         return B_ERROR;
-    owned_ = Manager()->RemoveChannel(channel_);
+    // A channel that has already left the document (it was replaced by an
+    // opened file, say) is not found and nothing is taken out.
+    if (channelId_ != 0)
+        owned_ = Manager()->RemoveChannel(Manager()->ChannelWithId(channelId_));
     return B_OK;
 }
 

@@ -23,10 +23,13 @@ public:
     const char* Name() override;
     const char* PreferredMenu() override;
 
-    Channel* AddedChannel() const { return channel_; }
+    /// The added channel while the document or the action holds it, else
+    /// null.
+    Channel* AddedChannel() const;
 
 private:
-    Channel* channel_ = nullptr;
+    /// The channel by its id, never by a pointer that could outlive it.
+    uint64_t channelId_ = 0;
     /// Holds the channel while it is outside the document.
     std::unique_ptr<Channel> owned_;
 };

@@ -7,7 +7,7 @@ namespace glimmet {
 
 status_t MoveSampleAction::InitCheck()
 {
-    return channel_ != nullptr && Manager() != nullptr ? B_OK : B_ERROR;
+    return channelId_ != 0 && Manager() != nullptr ? B_OK : B_ERROR;
 }
 
 status_t MoveSampleAction::SetTo(ChannelManager*, EditContext*)
@@ -20,7 +20,7 @@ status_t MoveSampleAction::SetTo(ChannelManager* manager, Channel* channel, int6
     if (manager == nullptr || channel == nullptr)
         return B_BAD_VALUE;
     BindDocument(manager, nullptr);
-    channel_ = channel;
+    channelId_ = channel->Id();
     offset_ = offset;
     return B_OK;
 }
@@ -34,8 +34,11 @@ status_t MoveSampleAction::Shift(int64_t frames)
 {
     if (InitCheck() != B_OK)
         return B_ERROR;
-    channel_->SetStartFrameOffset(channel_->FirstFrame() + frames);
-    Manager()->ChannelChanged(channel_);
+    Channel* channel = Manager()->ChannelWithId(channelId_);
+    if (channel == nullptr)
+        return B_ERROR;
+    channel->SetStartFrameOffset(channel->FirstFrame() + frames);
+    Manager()->ChannelChanged(channel);
     return B_OK;
 }
 

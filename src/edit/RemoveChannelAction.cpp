@@ -18,8 +18,8 @@ status_t RemoveChannelAction::SetTo(ChannelManager* manager, EditContext* contex
 
 void RemoveChannelAction::RemoveAtIndex()
 {
-    channel_ = Manager()->ChannelAt(index_);
-    owned_ = Manager()->RemoveChannel(channel_);
+    owned_ = Manager()->RemoveChannel(Manager()->ChannelAt(index_));
+    removedOne_ = true;
 }
 
 status_t RemoveChannelAction::Go()
@@ -51,7 +51,7 @@ status_t RemoveChannelAction::Redo()
 {
     if (Manager() == nullptr || Context() == nullptr)
         return B_ERROR;
-    if (channel_ == nullptr)
+    if (!removedOne_)
         return B_OK;
     RemoveAtIndex();
     return B_OK;

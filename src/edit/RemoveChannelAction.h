@@ -23,13 +23,16 @@ public:
     const char* Name() override;
     const char* PreferredMenu() override;
 
-    Channel* RemovedChannel() const { return channel_; }
+    /// The channel the last Go or Redo took out while the action holds it,
+    /// else null.
+    Channel* RemovedChannel() const { return owned_.get(); }
     int32_t Index() const { return index_; }
 
 private:
     void RemoveAtIndex();
 
-    Channel* channel_ = nullptr;
+    /// Whether Go found a channel to remove; Redo removes again only then.
+    bool removedOne_ = false;
     int32_t index_ = 0;
     /// Holds the channel while it is outside the document, so that it is
     /// freed with the action rather than lost.

@@ -1,6 +1,7 @@
 #include "sound/Channel.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cstring>
 #include <new>
 
@@ -22,9 +23,15 @@ void CopySamples(int16_t* destination, const int16_t* source, int64_t count)
         std::memcpy(destination, source, size_t(count) * sizeof(int16_t));
 }
 
+uint64_t NextChannelId()
+{
+    static std::atomic<uint64_t> next{1};
+    return next.fetch_add(1, std::memory_order_relaxed);
+}
+
 }  // namespace
 
-Channel::Channel() = default;
+Channel::Channel() : id_(NextChannelId()) {}
 Channel::~Channel() = default;
 
 SampleAllocator::Array Channel::Allocate(int64_t count)

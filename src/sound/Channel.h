@@ -24,6 +24,12 @@ public:
 
     Channel();
     ~Channel();
+
+    /// Never shared with another channel while the program runs, so the
+    /// history can refer to a channel by it and find out whether that
+    /// channel is still in the document instead of keeping a pointer that
+    /// may outlive it.
+    uint64_t Id() const { return id_; }
     Channel(const Channel&) = delete;
     Channel& operator=(const Channel&) = delete;
 
@@ -132,7 +138,8 @@ private:
     status_t ReplaceAll(const int16_t* frames, int64_t count, int64_t first);
     int64_t End() const { return first_ + count_; }
 
-    // All fields are guarded by lock_.
+    const uint64_t id_;
+    // All other fields are guarded by lock_.
     SampleArray samples_;
     int64_t count_ = 0;
     int64_t first_ = 0;

@@ -49,6 +49,16 @@ std::unique_ptr<Channel> ChannelManager::AddChannel(std::unique_ptr<Channel> cha
     return nullptr;
 }
 
+Channel* ChannelManager::ChannelWithId(uint64_t id)
+{
+    std::lock_guard guard(lock_);
+    for (const std::unique_ptr<Channel>& channel : channels_) {
+        if (channel->Id() == id)
+            return channel.get();
+    }
+    return nullptr;
+}
+
 std::unique_ptr<Channel> ChannelManager::RemoveChannel(Channel* channel)
 {
     std::unique_ptr<Channel> removed;

@@ -59,6 +59,10 @@ public:
     /// Null when index is out of range.
     Channel* ChannelAt(int32_t index);
     int32_t IndexOf(Channel* channel);
+    /// The document's channel with that Channel::Id, or null when no channel
+    /// of the document has it (it was removed, or belonged to a document
+    /// this one replaced).
+    Channel* ChannelWithId(uint64_t id);
 
     /// The largest first frame + frame count over all channels; 0 without any.
     int64_t FrameCount();
