@@ -2,6 +2,7 @@
 
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "support/FrameArithmetic.h"
 
 namespace glimmet {
 
@@ -30,26 +31,29 @@ status_t MoveSampleAction::Go()
     return B_OK;
 }
 
-status_t MoveSampleAction::Shift(int64_t frames)
+status_t MoveSampleAction::Shift(bool back)
 {
     if (InitCheck() != B_OK)
         return B_ERROR;
     Channel* channel = Manager()->ChannelWithId(channelId_);
     if (channel == nullptr)
         return B_ERROR;
-    channel->SetStartFrameOffset(channel->FirstFrame() + frames);
+    const int64_t first = channel->FirstFrame();
+    // Redo subtracts rather than adding the negated offset, which does not
+    // exist for the most negative one.
+    channel->SetStartFrameOffset(back ? SaturatingAdd(first, offset_) : SaturatingSubtract(first, offset_));
     Manager()->ChannelChanged(channel);
     return B_OK;
 }
 
 status_t MoveSampleAction::Undo()
 {
-    return Shift(offset_);
+    return Shift(true);
 }
 
 status_t MoveSampleAction::Redo()
 {
-    return Shift(-offset_);
+    return Shift(false);
 }
 
 const char* MoveSampleAction::Name()

@@ -27,9 +27,10 @@ public:
     int64_t Offset() const { return offset_; }
 
 private:
-    /// Moves the channel by frames; B_ERROR, changing nothing, when it has
-    /// left the document, and the history then drops the move.
-    status_t Shift(int64_t frames);
+    /// Moves the channel back by the recorded offset (undo) or forward
+    /// again (redo); B_ERROR, changing nothing, when it has left the
+    /// document, and the history then drops the move.
+    status_t Shift(bool back);
 
     /// The moved channel by its id: a pointer could outlive the channel
     /// when the document loses it by a path the history does not see.

@@ -328,7 +328,7 @@ int64_t Channel::FirstFrame()
 void Channel::SetStartFrameOffset(int64_t first)
 {
     std::lock_guard guard(lock_);
-    first_ = std::max<int64_t>(first, 0);
+    first_ = std::clamp<int64_t>(first, 0, kLastFirstFrame);
 }
 
 float Channel::FrameRate()

@@ -60,8 +60,15 @@ public:
     void SetPanPosition(int8_t pan);
 
     int64_t FirstFrame();
-    /// A negative offset is stored as 0.
+    /// A negative offset is stored as 0, one beyond kLastFirstFrame as
+    /// kLastFirstFrame.
     void SetStartFrameOffset(int64_t first);
+
+    /// The latest first frame a channel can have: about 790 years at 44.1 kHz,
+    /// and far enough from the end of int64_t that a channel's end frame,
+    /// the document's length and any range over them can be computed
+    /// without overflow.
+    static constexpr int64_t kLastFirstFrame = int64_t(1) << 40;
     float FrameRate();
     int64_t FrameCount();
     /// First frame + frame count, read under one lock.

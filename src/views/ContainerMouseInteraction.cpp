@@ -6,6 +6,7 @@
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "sound/DocumentWindow.h"
+#include "support/FrameArithmetic.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
 #include "views/ChannelContainerView.h"
@@ -219,7 +220,7 @@ void ContainerMouseInteraction::Moving(float x)
     if (channel != nullptr) {
         {
             std::lock_guard documentLock(manager->DocumentLock());
-            channel->SetStartFrameOffset(frame - grabOffset_);
+            channel->SetStartFrameOffset(SaturatingSubtract(frame, grabOffset_));
         }
         SampleView* view = container_.SampleViewAtIndex(movingChannel_);
         if (view != nullptr && moveRedrawPermission_) {
@@ -243,7 +244,7 @@ void ContainerMouseInteraction::MoveChannel(int32_t index, int64_t frames)
     grabOffset_ = 0;
     {
         std::lock_guard documentLock(manager->DocumentLock());
-        channel->SetStartFrameOffset(moveStartFrame_ + frames);
+        channel->SetStartFrameOffset(SaturatingAdd(moveStartFrame_, frames));
     }
     container_.CheckZoomSlider(false);
     container_.UpdateZoomSlider();

@@ -88,6 +88,7 @@ void ZoomSlider::SetLeft(float left, bool notify)
     if (left == left_)
         return;
     left_ = left;
+    resends_ = 0;
     update();
     if (notify)
         SendMessage();
@@ -98,6 +99,7 @@ void ZoomSlider::SetRight(float right, bool notify)
     if (right == right_)
         return;
     right_ = right;
+    resends_ = 0;
     update();
     if (notify)
         SendMessage();
@@ -109,6 +111,7 @@ void ZoomSlider::SetBoth(float left, float right)
         return;
     left_ = left;
     right_ = right;
+    resends_ = 0;
     update();
     SendMessage();
 }
@@ -130,6 +133,10 @@ void ZoomSlider::SendMessage()
     target_->PostMessage(message);
     armed_ = false;
 }
+
+// One answer that differs settles a rounding; more mean the window cannot
+// take the frames at all.
+const int32_t ZoomSlider::kMaxResends = 2;
 
 // Travel is what the handles can move over once the minimum range is set
 // aside, so that equal handles select exactly the minimum range.
@@ -222,8 +229,10 @@ void ZoomSlider::MessageReceived(const Message& message)
             break;
         // The display follows the slider: tell the window again when the
         // frames it applied are not the ones the handles stand for.
-        if (FirstFrame() != low || LastFrame() != high)
+        if ((FirstFrame() != low || LastFrame() != high) && resends_ < kMaxResends) {
+            resends_++;
             SendMessage();
+        }
         break;
     }
     default:

@@ -102,6 +102,12 @@ private:
     void DrawHandles();
 
     bool armed_ = true;
+    /// Times the slider told the window its frames again since a handle
+    /// last moved. Bounded: where the window cannot show exactly the frames
+    /// the handles stand for (a timeline too long for the handles' float
+    /// precision), telling it again would never end.
+    int32_t resends_ = 0;
+    static const int32_t kMaxResends;
     int32_t dragMode_ = kDragNone;
     bool enabled_ = true;
     int64_t low_;

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <cstdint>
 #include <memory>
 
 #include "TestDocument.h"
@@ -115,6 +116,20 @@ TEST(ChannelLifetimeTest, ChannelsHeldByTheHistoryGoWithIt)
     history.Clear();
     ASSERT_EQ(document.manager.CountChannels(), 1);
     EXPECT_EQ(document.manager.ChannelAt(0)->FrameCount(), 3);
+}
+
+TEST(ChannelLifetimeTest, ShiftsSaturateAtTheTimelinesEnds)
+{
+    TestDocument document;
+    Channel* channel = document.AddChannel({1, 2}, 10);
+    std::unique_ptr<Action> far = BoundMove(document, channel, INT64_MIN);
+    ASSERT_EQ(far->Redo(), B_OK);  // moves by -offset, which does not fit
+    EXPECT_EQ(channel->FirstFrame(), Channel::kLastFirstFrame);
+    ASSERT_EQ(far->Undo(), B_OK);
+    EXPECT_EQ(channel->FirstFrame(), 0);
+    channel->SetStartFrameOffset(INT64_MAX);
+    EXPECT_EQ(channel->FirstFrame(), Channel::kLastFirstFrame);
+    EXPECT_EQ(channel->EndFrame(), Channel::kLastFirstFrame + 2);
 }
 
 TEST(ChannelLifetimeTest, IdsAreNeverShared)

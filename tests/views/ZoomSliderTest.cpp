@@ -329,6 +329,28 @@ TEST_F(ZoomSliderTest, DprsRearmsAndPostsOnlyWhenTheDisplayDiffers)
     EXPECT_EQ(Posted().size(), 1u);
 }
 
+// A window that can never show the handles' frames exactly hears of them
+// twice more, not for ever; moving a handle starts the count again.
+TEST_F(ZoomSliderTest, AWindowThatCannotFollowIsToldTwiceNotForEver)
+{
+    slider.SetBoth(0.25f, 0.5f);
+    window.messages.clear();
+    for (int i = 0; i < 10; i++) {
+        Message differs(kMsgDisplayRangeChanged);
+        differs.AddInt64("low value", slider.FirstFrame() + 1);
+        differs.AddInt64("high value", slider.LastFrame());
+        slider.MessageReceived(differs);
+    }
+    EXPECT_EQ(Posted().size(), 2u);
+    slider.SetLeft(0.3f, true);
+    window.messages.clear();
+    Message differs(kMsgDisplayRangeChanged);
+    differs.AddInt64("low value", slider.FirstFrame() + 1);
+    differs.AddInt64("high value", slider.LastFrame());
+    slider.MessageReceived(differs);
+    EXPECT_EQ(Posted().size(), 1u);
+}
+
 TEST_F(ZoomSliderTest, ClickOnTheBorderOnlyArms)
 {
     slider.SetBoth(0.2f, 0.4f);

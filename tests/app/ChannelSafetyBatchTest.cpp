@@ -31,5 +31,24 @@ TEST_F(BatchTest, UndoOfAMoveAfterItsChannelWasRemovedAndTheRemovalUndone)
     EXPECT_EQ(window_->Manager()->ChannelAt(1)->FirstFrame(), 0) << "the channel came back and moved back";
 }
 
+// A move as far as a 64-bit offset goes ends at the latest first frame a
+// channel can have; undo brings the channel back exactly, and the document's
+// length follows without wrapping.
+TEST_F(BatchTest, AMoveByAnAbsurdOffsetStopsAtTheLatestFirstFrame)
+{
+    const auto file = fixture_.MakeSound("two.wav", 2, 200);
+    ASSERT_EQ(Run("open " + file.string() + "\nmove 1 9223372036854775000\nprint\n"), BatchRunner::kSucceeded)
+        << Errors();
+    EXPECT_EQ(window_->Manager()->ChannelAt(1)->FirstFrame(), Channel::kLastFirstFrame);
+    EXPECT_EQ(window_->Manager()->FrameCount(), Channel::kLastFirstFrame + 200);
+    ASSERT_EQ(Run("move 1 9223372036854775000\nmove 1 -9223372036854775807\n"), BatchRunner::kSucceeded);
+    EXPECT_EQ(window_->Manager()->ChannelAt(1)->FirstFrame(), 0);
+    ASSERT_EQ(Run("undo\n"), BatchRunner::kSucceeded);
+    EXPECT_EQ(window_->Manager()->ChannelAt(1)->FirstFrame(), Channel::kLastFirstFrame);
+    ASSERT_EQ(Run("undo\nundo\n"), BatchRunner::kSucceeded);
+    EXPECT_EQ(window_->Manager()->ChannelAt(1)->FirstFrame(), 0);
+    EXPECT_EQ(window_->Manager()->FrameCount(), 200);
+}
+
 }  // namespace
 }  // namespace glimmet::test
