@@ -37,7 +37,8 @@ status_t PasteAction::Go()
     std::vector<const int16_t*> buffers;
     int32_t count = 0;
     int64_t frames = 0;
-    if (copyBuffer_ != nullptr && copyBuffer_->GetCopyBuffer(buffers, count, frames)) {
+    pasted_ = copyBuffer_ != nullptr && copyBuffer_->GetCopyBuffer(buffers, count, frames);
+    if (pasted_) {
         pastedChannelCount_ = 0;
         if (ReplaceMode())
             PasteOverRange(buffers, frames);
@@ -106,7 +107,11 @@ status_t PasteAction::Undo()
     if (Manager() == nullptr)
         return B_ERROR;
     Manager()->Lock();
-    if (SavedChannelCount() == 0) {
+    if (!pasted_) {
+        // The last Go found nothing to paste and changed no sample: there is
+        // nothing to take back but the range and the selection.
+        RestoreSelection(nullptr);
+    } else if (SavedChannelCount() == 0) {
         RemoveInsertedFrames();
     } else {
         RestoreSelection([this](Channel* channel, size_t record) {

@@ -47,6 +47,10 @@ private:
     int64_t pasteEnd_ = 0;
     int32_t firstChannel_ = -1;
     int32_t pastedChannelCount_ = 0;
+    /// Whether the last Go had a buffer to paste. An empty paste still
+    /// enters the history; its undo must then leave the samples alone
+    /// instead of writing the snapshot over frames it never pasted.
+    bool pasted_ = false;
 };
 
 }  // namespace glimmet

@@ -36,6 +36,9 @@ struct Record {
     int64_t pasteEnd = 0;
     int32_t firstChannel = -1;
     int32_t pasted = 0;
+    // Whether the last Go had a buffer: an empty paste's undo only gives
+    // back the range and the selection.
+    bool hadBuffer = false;
     // Truncate: per selected channel, index, first frame, head and tail.
     struct Kept {
         int32_t index;
@@ -141,6 +144,11 @@ public:
                 if (!kept.tail.empty())
                     ModelChannel::Insert(c, kept.tail, r.end + 1);
             });
+            RestoreRange(r);
+            return;
+        }
+        if (r.kind == Kind::Paste && !r.hadBuffer) {
+            Walk(SnapshotIndexes(r), [](ChannelState&, size_t) {});
             RestoreRange(r);
             return;
         }
@@ -287,7 +295,8 @@ private:
                 break;
             }
         }
-        if (copyBuffer.empty())
+        r.hadBuffer = !copyBuffer.empty();
+        if (!r.hadBuffer)
             return;
         r.pasted = 0;
         const int64_t frames = int64_t(copyBuffer[0].size());
