@@ -34,6 +34,7 @@
 #include "support/MessageCodes.h"
 #include "support/MessageEvent.h"
 #include "support/MessageFields.h"
+#include "support/ScriptLine.h"
 #include "views/ChannelContainerView.h"
 #include "views/PlayButton.h"
 #include "views/PlayModeButton.h"
@@ -45,12 +46,10 @@ namespace glimmet {
 
 namespace {
 
-/// A range field's text as the number it stands for: read like strtol in
-/// base 10, kept to 32 bits and widened again.
+/// A range field's text as the number it stands for.
 int64_t RangeFieldValue(const TextControl* field)
 {
-    const std::string text = field->Text().toStdString();
-    return int64_t(int32_t(std::strtol(text.c_str(), nullptr, 10)));
+    return ScriptLine::RangeFieldNumber(field->Text().toStdString());
 }
 
 }  // namespace

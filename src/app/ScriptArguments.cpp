@@ -1,18 +1,14 @@
 #include "app/ScriptArguments.h"
 
-#include <charconv>
-
 #include "app/QuillexWindow.h"
 #include "sound/ChannelManager.h"
+#include "support/ScriptLine.h"
 
 namespace glimmet {
 
 bool ScriptArguments::ParseInteger(const std::string& text, int64_t* value)
 {
-    const char* begin = text.data();
-    const char* end = begin + text.size();
-    const auto [stop, error] = std::from_chars(begin, end, *value);
-    return error == std::errc() && stop == end && !text.empty();
+    return ScriptLine::ParseInteger(text, value);
 }
 
 bool ScriptArguments::Fail(std::string* reason, const std::string& text)

@@ -4,6 +4,7 @@
 
 #include "app/ScriptArguments.h"
 #include "support/MessageCodes.h"
+#include "support/ScriptLine.h"
 
 namespace glimmet {
 
@@ -24,49 +25,11 @@ const std::vector<uint32_t>& WindowCodes()
     return codes;
 }
 
-bool IsSkipped(const std::string& line)
-{
-    const size_t first = line.find_first_not_of(" \t\r");
-    return first == std::string::npos || line[first] == '#';
-}
-
-using Arguments = ScriptCommandTable::Arguments;
-
-// The words of a line, split at blanks; a word that opens with a double
-// quote runs to the next double quote, blanks included, and loses both
-// quotes (so a label such as "Stretch factor:" is one argument).
-Arguments Tokens(const std::string& line)
-{
-    Arguments tokens;
-    size_t at = 0;
-    while (true) {
-        at = line.find_first_not_of(" \t\r\n", at);
-        if (at == std::string::npos)
-            return tokens;
-        if (line[at] == '"') {
-            const size_t close = line.find('"', at + 1);
-            const size_t end = close == std::string::npos ? line.size() : close;
-            tokens.push_back(line.substr(at + 1, end - at - 1));
-            at = close == std::string::npos ? end : close + 1;
-            continue;
-        }
-        const size_t end = std::min(line.find_first_of(" \t\r\n", at), line.size());
-        tokens.push_back(line.substr(at, end - at));
-        at = end;
-    }
-}
-
 }  // namespace
 
 bool ScriptCommandTable::Parse(const std::string& line, std::string* name, Arguments* arguments)
 {
-    if (IsSkipped(line))
-        return false;
-    Arguments tokens = Tokens(line);
-    *name = tokens.front();
-    tokens.erase(tokens.begin());
-    *arguments = std::move(tokens);
-    return true;
+    return ScriptLine::Parse(line, name, arguments);
 }
 
 bool ScriptCommandTable::WindowCode(const std::string& name, uint32_t* what)
