@@ -33,22 +33,6 @@ std::filesystem::path DirectoryOf(const std::filesystem::path& file)
     return parent.empty() ? std::filesystem::path(".") : parent;
 }
 
-/// A file larger than the process may write (ulimit -f) would kill the
-/// program with SIGXFSZ, losing every open document; ignored, the write
-/// fails with EFBIG like any other failed write. Checked for every file, as
-/// the default may have been put back since; a handler of someone's own is
-/// left in place.
-void IgnoreFileSizeSignal()
-{
-    struct sigaction current {};
-    if (sigaction(SIGXFSZ, nullptr, &current) != 0 || current.sa_handler != SIG_DFL)
-        return;
-    struct sigaction ignore {};
-    ignore.sa_handler = SIG_IGN;
-    sigemptyset(&ignore.sa_mask);
-    sigaction(SIGXFSZ, &ignore, nullptr);
-}
-
 /// The errno a step is to fail with for a test, or 0.
 int InjectedError(WriteFaults::Step step)
 {
@@ -75,6 +59,17 @@ void SyncDirectory(const std::filesystem::path& directory)
 }
 
 }  // namespace
+
+void WavFileWriter::IgnoreFileSizeSignal()
+{
+    struct sigaction current {};
+    if (sigaction(SIGXFSZ, nullptr, &current) != 0 || current.sa_handler != SIG_DFL)
+        return;
+    struct sigaction ignore {};
+    ignore.sa_handler = SIG_IGN;
+    sigemptyset(&ignore.sa_mask);
+    sigaction(SIGXFSZ, &ignore, nullptr);
+}
 
 WavFileWriter::WavFileWriter(const std::filesystem::path& destination, Writeback writeback)
     : destination_(destination), writeback_(writeback)

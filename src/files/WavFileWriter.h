@@ -45,6 +45,13 @@ public:
     WavFileWriter(const WavFileWriter&) = delete;
     WavFileWriter& operator=(const WavFileWriter&) = delete;
 
+    /// A file larger than the process may write (ulimit -f) would kill the
+    /// program with SIGXFSZ, losing every open document; ignored, the write
+    /// fails with EFBIG like any other. Every writer makes sure of it, as the
+    /// default may have been put back since; a handler of someone's own is
+    /// left in place.
+    static void IgnoreFileSizeSignal();
+
     /// B_OK when the temporary file and its track exist.
     status_t InitCheck() const { return openStatus_; }
     /// Writes the header; frames may follow.

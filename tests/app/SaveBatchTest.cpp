@@ -1,11 +1,20 @@
 #include <gtest/gtest.h>
 
+#include <fcntl.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
+#include <QCoreApplication>
+
+#include <csignal>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <string>
+#include <vector>
+#include <algorithm>
 
 #include "BatchTestSupport.h"
 #include "support/DiagnosticsCapture.h"
@@ -61,6 +70,58 @@ TEST_F(SaveBatchTest, AnsweringYesWhenTheSaveFailsKeepsTheWindow)
     EXPECT_EQ(fixture_.App().CountWindows(), 1);
     EXPECT_NE(LastState().find("\"saved\": false"), std::string::npos) << LastState();
     EXPECT_EQ(ReadWav(file)[0][5], int16_t(105));
+}
+
+/// Runs the program on script under a file-size limit of limitBytes, with
+/// SIGXFSZ as a shell leaves it, its standard output into outputFile.
+/// Returns the wait status.
+int RunUnderFileSizeLimit(const std::string& script, const std::string& outputFile, rlim_t limitBytes)
+{
+    const std::string program = (QCoreApplication::applicationDirPath() + "/../glimmet").toStdString();
+    const int output = open(outputFile.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
+    if (output < 0)
+        return -1;
+    const pid_t child = fork();
+    if (child == 0) {
+        std::signal(SIGXFSZ, SIG_DFL);
+        rlimit limit {};
+        getrlimit(RLIMIT_FSIZE, &limit);
+        limit.rlim_cur = limitBytes;
+        setrlimit(RLIMIT_FSIZE, &limit);
+        dup2(output, STDOUT_FILENO);
+        setenv("SDL_AUDIODRIVER", "dummy", 1);
+        execl(program.c_str(), program.c_str(), "--batch", script.c_str(), static_cast<char*>(nullptr));
+        _exit(127);
+    }
+    close(output);
+    int status = -1;
+    if (child > 0)
+        waitpid(child, &status, 0);
+    return status;
+}
+
+TEST(SaveProgram, AFileSizeLimitFailsTheSaveButNotTheProgram)
+{
+    AppFixture fixture;
+    const auto file = fixture.MakeSound("long.wav", 2, 100000);
+    const auto target = fixture.Dir() / "target.wav";
+    { std::ofstream(target) << "the previous recording"; }
+    const auto script = fixture.Dir() / "script.txt";
+    { std::ofstream(script) << "open " << file.string() << "\nSALL\nrvph\nsaveas " << target.string() << "\nprint\n"; }
+    const auto output = fixture.Dir() / "output.txt";
+    // Far less than the 400 KB the save needs, more than the script.
+    const int status = RunUnderFileSizeLimit(script.string(), output.string(), 64 * 1024);
+    ASSERT_TRUE(WIFEXITED(status)) << "killed by signal " << (WIFSIGNALED(status) ? WTERMSIG(status) : 0);
+    EXPECT_EQ(WEXITSTATUS(status), 0);
+    const std::string printed = ReadBytes(output);
+    EXPECT_NE(printed.find("error writing file. (File too large)\n"), std::string::npos) << printed;
+    EXPECT_NE(printed.find("\"saved\": false"), std::string::npos) << printed;
+    EXPECT_EQ(ReadBytes(target), "the previous recording");
+    std::vector<std::string> names;
+    for (const auto& entry : std::filesystem::directory_iterator(fixture.Dir()))
+        names.push_back(entry.path().filename().string());
+    std::sort(names.begin(), names.end());
+    EXPECT_EQ(names, (std::vector<std::string>{"long.wav", "output.txt", "script.txt", "target.wav"}));
 }
 
 }  // namespace
