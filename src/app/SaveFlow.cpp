@@ -45,10 +45,14 @@ void SaveFlow::Save()
         ShowSavePanel();
         return;
     }
-    const status_t status = SaveFile(*fileEntry_);
-    if (status != B_OK) {
+    SaveAndReport(*fileEntry_);
+}
+
+void SaveFlow::SaveAndReport(const std::filesystem::path& file)
+{
+    const status_t status = SaveFile(file);
+    if (status != B_OK)
         Diagnostics::Print("error writing file. (%s)\n", StatusText(status));
-    }
 }
 
 void SaveFlow::ShowSavePanel()
@@ -120,8 +124,13 @@ bool SaveFlow::AgreeToClose(QuillexWindow* window)
     const int answer = question ? question(window) : AskSaveChanges(window);
     if (answer == kDontQuit)
         return false;
-    if (answer == kSave && fileEntry_)
-        SaveFile(*fileEntry_);
+    // A save that did not get the document into the file keeps the window,
+    // and the edits, for another try. (One that only could not label the
+    // file closes: the sound is safe.)
+    if (answer == kSave && fileEntry_) {
+        SaveAndReport(*fileEntry_);
+        return history_.IsSaved();
+    }
     return true;
 }
 

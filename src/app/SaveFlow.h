@@ -56,7 +56,8 @@ public:
     status_t SaveFile(const std::filesystem::path& file);
 
     /// Asks about unsaved changes when there are any, saving when told to.
-    /// False when the answer is not to close.
+    /// False when the answer is not to close, or when the save it was told
+    /// to make failed (reported like "Save").
     bool AgreeToClose(QuillexWindow* window);
 
     /// The "Save changes?" alert with its three buttons; returns the index of
@@ -77,6 +78,8 @@ public:
 
 private:
     void PanelChose(const QString& file);
+    /// Saves to file; a failure prints "error writing file. (%s)\n".
+    void SaveAndReport(const std::filesystem::path& file);
     /// An untitled document closes without a question, however much it was
     /// edited.
     bool IsDocumentSaved();

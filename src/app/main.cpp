@@ -14,6 +14,7 @@
 #include "app/InstanceServer.h"
 #include "app/Quillex.h"
 #include "app/QuillexWindow.h"
+#include "files/WavFileWriter.h"
 
 using glimmet::BatchRunner;
 using glimmet::InstanceServer;
@@ -66,6 +67,10 @@ int main(int argc, char** argv)
     // The sound library would otherwise take over SIGINT and SIGTERM, and
     // the editor could no longer be ended from outside.
     SDL_SetHint(SDL_HINT_NO_SIGNAL_HANDLERS, "1");
+    // Under a file-size limit (ulimit -f) a large write, ours or the sound
+    // server client's, must fail with an error rather than kill the editor
+    // with every open document.
+    glimmet::WavFileWriter::IgnoreFileSizeSignal();
     // A script run is headless and stands alone: no display, no hand-over
     // to a running editor.
     if (argc >= 2 && std::string_view(argv[1]) == "--batch")

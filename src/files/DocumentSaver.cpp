@@ -6,44 +6,51 @@
 #include "edit/HistoryManager.h"
 #include "files/AsyncFrameWriter.h"
 #include "files/FileTypeAttribute.h"
+#include "files/SaveDestination.h"
 #include "files/SaveTarget.h"
 #include "files/WavFileWriter.h"
 #include "sound/ChannelManager.h"
-#include "support/Diagnostics.h"
 
 namespace glimmet {
 
 status_t DocumentSaver::SaveFile(const std::filesystem::path& file, SaveTarget& target)
 {
-    bool created = false;
-    const status_t status = SaveFile(file, target.DocumentManager(), target.DocumentHistory(), &created);
-    if (created)
-        target.SetSaveItemEnabled(false);
+    bool written = false;
+    const status_t status = SaveFile(file, target.DocumentManager(), target.DocumentHistory(), &written);
+    // Until the document is all in the file there is something to save.
+    target.SetSaveItemEnabled(!written);
     return status;
 }
 
 status_t DocumentSaver::SaveFile(const std::filesystem::path& file, ChannelManager* document,
-                                 HistoryManager* history, bool* created)
+                                 HistoryManager* history, bool* written)
 {
-    const std::filesystem::path destination = FollowLinks(file);
-    WavFileWriter writer(destination);
-    if (writer.InitCheck() == B_OK) {
-        if (writer.CommitHeader() == B_OK) {
-            // The file is written on a second thread while the mix goes on.
-            AsyncFrameWriter background(writer);
-            WriteDocument(document, background);
-            background.Close();
-        }
-        if (history != nullptr)
-            history->Save();
-        if (created != nullptr)
-            *created = true;
-    }
-    const status_t released = writer.Finish();
-    if (released != B_OK) {
-        Diagnostics::Print("Error releasing tracks: %s\n", StatusText(released));
-    }
+    if (written != nullptr)
+        *written = false;
+    std::filesystem::path destination;
+    status_t status = SaveDestination::Resolve(file, &destination);
+    if (status == B_OK)
+        status = WriteFile(destination, document);
+    if (status != B_OK)
+        return status;
+    if (history != nullptr)
+        history->Save();
+    if (written != nullptr)
+        *written = true;
     return SetTypeOfSavedFile(destination);
+}
+
+status_t DocumentSaver::WriteFile(const std::filesystem::path& destination, ChannelManager* document)
+{
+    WavFileWriter writer(destination);
+    if (writer.CommitHeader() == B_OK) {
+        // The file is written on a second thread while the mix goes on.
+        AsyncFrameWriter background(writer);
+        WriteDocument(document, background);
+        background.Close();
+    }
+    // The writer remembers its first failure, whichever thread met it.
+    return writer.Finish();
 }
 
 status_t DocumentSaver::SetTypeOfSavedFile(const std::filesystem::path& destination)
@@ -80,15 +87,6 @@ status_t DocumentSaver::WriteDocument(ChannelManager* manager, FrameWriter& writ
         written += frames;
     }
     return B_OK;
-}
-
-std::filesystem::path DocumentSaver::FollowLinks(const std::filesystem::path& file)
-{
-    std::error_code error;
-    if (!std::filesystem::is_symlink(file, error))
-        return file;
-    const std::filesystem::path target = std::filesystem::canonical(file, error);
-    return error ? file : target;
 }
 
 }  // namespace glimmet

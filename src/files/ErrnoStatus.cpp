@@ -24,4 +24,15 @@ status_t StatusFromErrno(int error)
     }
 }
 
+status_t ExactStatusFromErrno(int error)
+{
+    switch (error) {
+        case ENOENT: return B_ENTRY_NOT_FOUND;
+        case EISDIR: return B_IS_A_DIRECTORY;
+        case EACCES: return B_PERMISSION_DENIED;
+        case ENOSPC: return B_DEVICE_FULL;
+        default: return StatusFromSystemError(error);
+    }
+}
+
 }  // namespace glimmet

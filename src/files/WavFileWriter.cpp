@@ -1,12 +1,11 @@
 #include "files/WavFileWriter.h"
 
 #include <fcntl.h>
+#include <signal.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdio>
-#include <random>
 #include <string>
 
 extern "C" {
@@ -17,6 +16,9 @@ extern "C" {
 
 #include "files/ErrnoStatus.h"
 #include "files/FFmpegStatus.h"
+#include "files/SaveDestination.h"
+#include "files/SiblingTemporaryFile.h"
+#include "files/WriteFaults.h"
 
 namespace glimmet {
 
@@ -24,21 +26,26 @@ namespace {
 
 constexpr int kIOBufferSize = 64 * 1024;
 constexpr int kBytesPerFrame = WavFileWriter::kChannelCount * int(sizeof(int16_t));
-// Names tried for the temporary file before giving up.
-constexpr int kTemporaryNameAttempts = 100;
-
-std::string RandomSuffix()
-{
-    static thread_local std::mt19937_64 generator{std::random_device{}()};
-    char text[17];
-    std::snprintf(text, sizeof(text), "%016llx", static_cast<unsigned long long>(generator()));
-    return text;
-}
 
 std::filesystem::path DirectoryOf(const std::filesystem::path& file)
 {
     const std::filesystem::path parent = file.parent_path();
     return parent.empty() ? std::filesystem::path(".") : parent;
+}
+
+/// The errno a step is to fail with for a test, or 0.
+int InjectedError(WriteFaults::Step step)
+{
+    return WriteFaults::ErrorFor(step);
+}
+
+/// FFmpeg's I/O errors are negated errno values: those keep their own text.
+status_t ExactStatusFromAVError(int error)
+{
+    const int system = AVUNERROR(error);
+    if (error < 0 && system > 0 && system < kPosixErrorCount)
+        return ExactStatusFromErrno(system);
+    return StatusFromAVError(error);
 }
 
 /// Makes the rename durable: the directory entry reaches the disk too.
@@ -53,9 +60,21 @@ void SyncDirectory(const std::filesystem::path& directory)
 
 }  // namespace
 
+void WavFileWriter::IgnoreFileSizeSignal()
+{
+    struct sigaction current {};
+    if (sigaction(SIGXFSZ, nullptr, &current) != 0 || current.sa_handler != SIG_DFL)
+        return;
+    struct sigaction ignore {};
+    ignore.sa_handler = SIG_IGN;
+    sigemptyset(&ignore.sa_mask);
+    sigaction(SIGXFSZ, &ignore, nullptr);
+}
+
 WavFileWriter::WavFileWriter(const std::filesystem::path& destination, Writeback writeback)
     : destination_(destination), writeback_(writeback)
 {
+    IgnoreFileSizeSignal();
     openStatus_ = CreateTemporaryFile();
     if (openStatus_ == B_OK)
         openStatus_ = CreateMuxer();
@@ -73,29 +92,17 @@ WavFileWriter::~WavFileWriter()
 
 status_t WavFileWriter::CreateTemporaryFile()
 {
+    bool replacing = false;
     struct stat existing {};
-    const bool replacing = stat(destination_.c_str(), &existing) == 0;
-    if (replacing && S_ISDIR(existing.st_mode))
-        return B_IS_A_DIRECTORY;
-    const std::filesystem::path directory = DirectoryOf(destination_);
-    for (int attempt = 0; attempt < kTemporaryNameAttempts; ++attempt) {
-        std::string name = ".";
-        name += destination_.filename().string();
-        name += ".glimmet-";
-        name += RandomSuffix();
-        const std::filesystem::path candidate = directory / name;
-        fd_ = open(candidate.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
-        if (fd_ >= 0) {
-            temporary_ = candidate;
-            // The new file takes the place of the old one, permissions included.
-            if (replacing)
-                fchmod(fd_, existing.st_mode & 07777);
-            return B_OK;
-        }
-        if (errno != EEXIST)
-            return StatusFromErrno(errno);
-    }
-    return B_ERROR;
+    const status_t allowed = SaveDestination::CheckReplaceable(destination_, &replacing, &existing);
+    if (allowed != B_OK)
+        return allowed;
+    SiblingTemporaryFile::RemoveAbandoned(destination_);
+    const status_t status = SiblingTemporaryFile::Create(destination_, 0666, &fd_, &temporary_);
+    // The new file takes the place of the old one, permissions included.
+    if (status == B_OK && replacing)
+        fchmod(fd_, existing.st_mode & 07777);
+    return status;
 }
 
 status_t WavFileWriter::CreateMuxer()
@@ -181,13 +188,15 @@ status_t WavFileWriter::WriteAt(const char* bytes, size_t size, int64_t offset)
 {
     size_t done = 0;
     while (done < size) {
+        if (const int injected = InjectedError(WriteFaults::Step::Write))
+            return ExactStatusFromErrno(injected);
         const ssize_t written = pwrite(fd_, bytes + done, size - done, off_t(offset + int64_t(done)));
         if (written < 0 && errno == EINTR)
             continue;
         if (written < 0)
-            return StatusFromErrno(errno);
+            return ExactStatusFromErrno(errno);
         if (written == 0)
-            return B_IO_ERROR;
+            return ExactStatusFromErrno(EIO);
         done += size_t(written);
     }
     return B_OK;
@@ -225,7 +234,7 @@ status_t WavFileWriter::WritebackFailure(int error)
         writebackWorks_ = false;
         return B_OK;
     }
-    return StatusFromErrno(error);
+    return ExactStatusFromErrno(error);
 }
 
 status_t WavFileWriter::Finish()
@@ -245,24 +254,47 @@ status_t WavFileWriter::Complete()
     // put at the end of the data written past it.
     const int64_t end = avio_seek(io_, dataStart_ + dataBytes_, SEEK_SET);
     if (end < 0)
-        return StatusFromAVError(int(end));
-    status_t status = StatusFromAVError(av_write_trailer(muxer_));
+        return ExactStatusFromAVError(int(end));
+    status_t status = ExactStatusFromAVError(av_write_trailer(muxer_));
     avio_flush(io_);
     if (status == B_OK)
         status = IOStatus();
-    if (status == B_OK && fsync(fd_) != 0)
-        status = StatusFromErrno(errno);
+    if (status == B_OK)
+        status = Sync();
     if (status != B_OK)
         return status;
+    return Replace();
+}
+
+status_t WavFileWriter::Sync()
+{
+    if (const int injected = InjectedError(WriteFaults::Step::Sync))
+        return ExactStatusFromErrno(injected);
+    return fsync(fd_) == 0 ? B_OK : ExactStatusFromErrno(errno);
+}
+
+status_t WavFileWriter::Replace()
+{
+    // What is there may have changed while the file was written.
+    bool exists = false;
+    status_t status = SaveDestination::CheckReplaceable(destination_, &exists, nullptr);
+    if (status != B_OK)
+        return status;
+    // Renamed while still open and locked, so that no other save takes the
+    // file for one a killed save left behind.
+    if (const int injected = InjectedError(WriteFaults::Step::Rename))
+        return ExactStatusFromErrno(injected);
+    if (rename(temporary_.c_str(), destination_.c_str()) != 0)
+        return ExactStatusFromErrno(errno);
+    temporary_.clear();
     const int closed = close(fd_);
     fd_ = -1;
+    // The data reached the disk with the fsync, so a failed close is only
+    // reported, never undone.
     if (closed != 0)
-        return StatusFromErrno(errno);
-    if (rename(temporary_.c_str(), destination_.c_str()) != 0)
-        return StatusFromErrno(errno);
-    temporary_.clear();
+        status = ExactStatusFromErrno(errno);
     SyncDirectory(DirectoryOf(destination_));
-    return B_OK;
+    return status;
 }
 
 void WavFileWriter::Discard()
@@ -285,7 +317,7 @@ void WavFileWriter::NoteFailure(status_t status)
 
 status_t WavFileWriter::IOStatus() const
 {
-    return io_ == nullptr || io_->error == 0 ? B_OK : StatusFromAVError(io_->error);
+    return io_ == nullptr || io_->error == 0 ? B_OK : ExactStatusFromAVError(io_->error);
 }
 
 int WavFileWriter::WritePacket(void* opaque, uint8_t* buffer, int size)
@@ -293,6 +325,8 @@ int WavFileWriter::WritePacket(void* opaque, uint8_t* buffer, int size)
     auto* writer = static_cast<WavFileWriter*>(opaque);
     int done = 0;
     while (done < size) {
+        if (const int injected = InjectedError(WriteFaults::Step::Write))
+            return AVERROR(injected);
         const ssize_t written = write(writer->fd_, buffer + done, size_t(size - done));
         if (written < 0 && errno == EINTR)
             continue;

@@ -14,8 +14,10 @@ namespace glimmet {
 /// Writes a stereo, signed 16-bit little-endian, 44100 Hz RIFF WAV file with
 /// the canonical 44-byte header, without ever damaging the file it replaces.
 ///
-/// Everything goes to a hidden temporary file beside the destination; Finish
-/// flushes it to disk and renames it over the destination. FFmpeg's muxer
+/// Everything goes to a hidden temporary file beside the destination (see
+/// SiblingTemporaryFile); Finish flushes it to disk and renames it over the
+/// destination. Only a regular file the user may write is replaced (see
+/// SaveDestination), and failures carry the C library's own error. FFmpeg's muxer
 /// writes the header and fills in the sizes at the end; the samples go
 /// straight to the file, and the disk is set to work on them while more are
 /// written. Until then the
@@ -34,11 +36,21 @@ public:
     };
     static constexpr Writeback kDefaultWriteback{int64_t(8) << 20, int64_t(64) << 20};
 
-    /// Creates the temporary file and the one audio track.
+    /// Removes what killed saves to destination left, creates the temporary
+    /// file and the one audio track. Ignores SIGXFSZ in the process from
+    /// then on, so that a file-size limit fails a write instead of killing
+    /// the program.
     explicit WavFileWriter(const std::filesystem::path& destination, Writeback writeback = kDefaultWriteback);
     ~WavFileWriter() override;
     WavFileWriter(const WavFileWriter&) = delete;
     WavFileWriter& operator=(const WavFileWriter&) = delete;
+
+    /// A file larger than the process may write (ulimit -f) would kill the
+    /// program with SIGXFSZ, losing every open document; ignored, the write
+    /// fails with EFBIG like any other. Every writer makes sure of it, as the
+    /// default may have been put back since; a handler of someone's own is
+    /// left in place.
+    static void IgnoreFileSizeSignal();
 
     /// B_OK when the temporary file and its track exist.
     status_t InitCheck() const { return openStatus_; }
@@ -57,6 +69,9 @@ private:
     status_t CreateTemporaryFile();
     status_t CreateMuxer();
     status_t Complete();
+    status_t Sync();
+    /// Renames the finished file over the destination.
+    status_t Replace();
     void Discard();
     void NoteFailure(status_t status);
     status_t IOStatus() const;

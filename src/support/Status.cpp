@@ -1,9 +1,22 @@
 #include "support/Status.h"
 
+#include <cstring>
+
 namespace glimmet {
+
+status_t StatusFromSystemError(int error)
+{
+    if (error == 0)
+        return B_OK;
+    if (error < 0 || error >= kPosixErrorCount)
+        return B_ERROR;
+    return kPosixErrorBase + error;
+}
 
 const char* StatusText(status_t status)
 {
+    if (status > kPosixErrorBase && status < kPosixErrorBase + kPosixErrorCount)
+        return std::strerror(int(status - kPosixErrorBase));
     switch (status) {
         case B_OK: return "No error";
         case B_ERROR: return "General system error";
@@ -20,6 +33,7 @@ const char* StatusText(status_t status)
         case B_ENTRY_NOT_FOUND: return "No such file or directory";
         case B_IS_A_DIRECTORY: return "Is a directory";
         case B_DEVICE_FULL: return "No space left on device";
+        case B_NOT_A_REGULAR_FILE: return "Not a regular file";
         case B_MEDIA_BAD_FORMAT: return "Bad media format";
         case B_MEDIA_NO_HANDLER: return "No handler for this media format";
         case B_LAST_BUFFER_ERROR: return "Last buffer";

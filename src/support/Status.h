@@ -12,6 +12,10 @@ using status_t = int32_t;
 inline constexpr status_t kGeneralErrorBase = INT32_MIN;
 inline constexpr status_t kMediaErrorBase = kGeneralErrorBase + 0x4000;
 inline constexpr status_t kStorageErrorBase = kGeneralErrorBase + 0x6000;
+/// C library errors that have no code of their own below keep their errno
+/// value above this base, so that their text is the C library's own.
+inline constexpr status_t kPosixErrorBase = kGeneralErrorBase + 0x7000;
+inline constexpr int kPosixErrorCount = 0x1000;
 
 inline constexpr status_t B_OK = 0;
 inline constexpr status_t B_ERROR = -1;
@@ -29,6 +33,9 @@ inline constexpr status_t B_BAD_DATA = kGeneralErrorBase + 16;
 inline constexpr status_t B_ENTRY_NOT_FOUND = kStorageErrorBase + 3;
 inline constexpr status_t B_IS_A_DIRECTORY = kStorageErrorBase + 9;
 inline constexpr status_t B_DEVICE_FULL = kStorageErrorBase + 10;
+/// Something other than a regular file (a device, a FIFO, a socket) is where
+/// a file was to be written; it is left alone.
+inline constexpr status_t B_NOT_A_REGULAR_FILE = kStorageErrorBase + 0x40;
 
 inline constexpr status_t B_MEDIA_BAD_FORMAT = kMediaErrorBase + 0x10;
 inline constexpr status_t B_MEDIA_NO_HANDLER = kMediaErrorBase + 0x1a;
@@ -39,6 +46,10 @@ inline constexpr status_t B_MEDIA_SYSTEM_FAILURE = kMediaErrorBase + 0x100;
 inline constexpr status_t B_MEDIA_BAD_SOURCE = kMediaErrorBase + 0x107;
 inline constexpr status_t B_MEDIA_BAD_DESTINATION = kMediaErrorBase + 0x108;
 inline constexpr status_t B_MEDIA_ALREADY_CONNECTED = kMediaErrorBase + 0x109;
+
+/// The status that carries the C library's errno value error unchanged (B_OK
+/// for 0, B_ERROR for a value out of range); its text is strerror's.
+status_t StatusFromSystemError(int error);
 
 /// The human-readable text of a status code, as printed by diagnostics
 /// ("Error doing undo: %s\n"). Never returns null; unknown codes get a

@@ -7,13 +7,18 @@
 #include <QTemporaryDir>
 #include <QWidget>
 
+#include <cerrno>
+#include <fstream>
+#include <iterator>
 #include <memory>
 #include <vector>
 
 #include "PostedMessages.h"
 #include "edit/Action.h"
 #include "edit/HistoryManager.h"
+#include "files/WriteFaults.h"
 #include "sound/ChannelManager.h"
+#include "support/DiagnosticsCapture.h"
 #include "support/Message.h"
 #include "support/MessageCodes.h"
 #include "support/MessageTarget.h"
@@ -113,6 +118,51 @@ TEST_F(SaveFlowTest, UnsavedChangesAskAndTheAnswerDecides)
     EXPECT_TRUE(std::filesystem::exists(Folder() / "kept.wav"));
     EXPECT_TRUE(history.IsSaved());
     EXPECT_FALSE(saveItem.isEnabled());
+}
+
+TEST_F(SaveFlowTest, AYesWhoseSaveFailsKeepsTheWindowAndTheEdits)
+{
+    flow.SetFileEntry(Folder() / "kept.wav");
+    { std::ofstream(Folder() / "kept.wav") << "the previous recording"; }
+    MakeUnsaved();
+    answer = SaveFlow::kSave;
+    DiagnosticsCapture capture;
+    bool closes = true;
+    {
+        ScopedWriteFault fault(WriteFaults::Step::Create, EROFS);
+        closes = flow.AgreeToClose(nullptr);
+    }
+    EXPECT_FALSE(closes);
+    EXPECT_EQ(capture.Finish(), "error writing file. (Read-only file system)\n");
+    EXPECT_FALSE(history.IsSaved());
+    EXPECT_TRUE(saveItem.isEnabled());
+    std::ifstream in(Folder() / "kept.wav");
+    EXPECT_EQ(std::string(std::istreambuf_iterator<char>(in), {}), "the previous recording");
+
+    // Asked again once the disk is back, the same answer saves and closes.
+    EXPECT_TRUE(flow.AgreeToClose(nullptr));
+    EXPECT_EQ(questions, 2);
+    EXPECT_TRUE(history.IsSaved());
+}
+
+TEST_F(SaveFlowTest, AFailedSaveNamesItsCauseAndLeavesSaveEnabled)
+{
+    flow.SetFileEntry(Folder() / "kept.wav");
+    MakeUnsaved();
+    saveItem.setEnabled(false);
+    DiagnosticsCapture capture;
+    {
+        ScopedWriteFault fault(WriteFaults::Step::Sync, EIO);
+        flow.Save();
+    }
+    EXPECT_EQ(capture.Finish(), "error writing file. (Input/output error)\n");
+    EXPECT_FALSE(history.IsSaved());
+    EXPECT_TRUE(saveItem.isEnabled());
+    EXPECT_FALSE(std::filesystem::exists(Folder() / "kept.wav"));
+    // Closing now asks, as the edits are in no file.
+    answer = SaveFlow::kDontQuit;
+    EXPECT_FALSE(flow.AgreeToClose(nullptr));
+    EXPECT_EQ(questions, 1);
 }
 
 }  // namespace
