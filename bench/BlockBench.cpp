@@ -51,7 +51,7 @@ struct Document {
 
     Document()
     {
-        std::vector<int16_t> samples(size_t(kFrames));
+        std::vector<int16_t> samples(static_cast<size_t>(kFrames));
         for (int c = 0; c < kChannels; c++) {
             for (int64_t i = 0; i < kFrames; i++)
                 samples[size_t(i)] = int16_t(i * (c + 3));
