@@ -33,15 +33,15 @@ void ReportScriptCommands::AddTo(BatchRunner& runner, std::FILE* output)
         ChannelManager* manager = runner.Window()->Manager();
         std::lock_guard documentLock(manager->DocumentLock());
         Channel* channel = manager->ChannelAt(index);
-        const int16_t* samples = channel->Data();
-        const int64_t count = samples != nullptr ? channel->FrameCount() : 0;
         // Little-endian whatever the machine.
-        std::vector<char> bytes(size_t(count) * 2);
-        for (int64_t i = 0; i < count; ++i) {
-            const auto value = static_cast<uint16_t>(samples[i]);
-            bytes[size_t(2 * i)] = char(value & 0xff);
-            bytes[size_t(2 * i + 1)] = char(value >> 8);
-        }
+        std::vector<char> bytes;
+        channel->ReadSpans(0, channel->FrameCount(), [&bytes](const SampleSpan& span) {
+            for (int64_t i = 0; i < span.count; ++i) {
+                const auto value = static_cast<uint16_t>(span.samples[i]);
+                bytes.push_back(char(value & 0xff));
+                bytes.push_back(char(value >> 8));
+            }
+        });
         file.write(bytes.data(), std::streamsize(bytes.size()));
         if (!file.flush())
             return ScriptArguments::Fail(reason, "cannot write " + arguments[1]);

@@ -71,18 +71,18 @@ void Action::TakeSnapshot()
 
 void Action::SnapshotChannel(Channel* channel, SavedChannel& record) const
 {
-    record.data = AllocateSamples(frameCount_);
-    // A copy that fails leaves the snapshot as silence.
-    if (record.data != nullptr && !channel->FillBuffer(record.data.get(), rangeStart_, frameCount_))
-        std::memset(record.data.get(), 0, size_t(frameCount_) * sizeof(int16_t));
+    if (frameCount_ < 1)
+        return;
+    // A read that fails leaves the snapshot as silence.
+    record.held = channel->ReadSlice(rangeStart_, frameCount_, &record.data) != B_NO_MEMORY;
 }
 
 int64_t Action::SnapshotBytes() const
 {
     int64_t bytes = 0;
     for (const SavedChannel& record : savedChannels_) {
-        if (record.data != nullptr)
-            bytes += frameCount_ * int64_t(sizeof(int16_t));
+        if (record.held)
+            bytes += record.data.newBytes + (record.data.leading + record.data.trailing) * int64_t(sizeof(int16_t));
     }
     return bytes;
 }
@@ -139,8 +139,8 @@ status_t Action::Undo()
     manager_->Lock();
     RestoreSelection([this](Channel* channel, size_t record) {
         const SavedChannel& saved = savedChannels_[record];
-        if (saved.data != nullptr)
-            channel->ReplaceFrames(saved.data.get(), frameCount_, rangeStart_, rangeEnd_);
+        if (saved.held)
+            channel->ReplaceFrames(saved.data, rangeStart_, rangeEnd_);
     });
     RestoreRange();
     manager_->Unlock();

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "sound/SampleAllocator.h"
+#include "sound/SampleSlice.h"
 #include "support/Status.h"
 
 namespace glimmet {
@@ -59,7 +60,11 @@ public:
     /// Frames in the range as stored at SetTo (range end - range start + 1).
     int64_t FrameCount() const { return frameCount_; }
     int32_t SavedChannelCount() const { return int32_t(savedChannels_.size()); }
-    /// Bytes of sample data the snapshot keeps.
+    /// Bytes of sample data the snapshot keeps beyond what the channels
+    /// share with it: the blocks cut at the range's edges, and the silence
+    /// outside the data at two bytes a frame (it takes no memory, but it is
+    /// what the undo writes back that no channel holds). Blocks the snapshot
+    /// shares with a channel count nothing.
     int64_t SnapshotBytes() const;
 
     /// An uninitialised sample array of count samples, or null when count is
@@ -72,11 +77,13 @@ public:
 protected:
     /// One selected channel's range as it was at SetTo.
     struct SavedChannel {
-        SampleAllocator::Array data;  // null when it could not be had
-        int32_t index = 0;                // position in the manager
+        /// The range as FillBuffer gives it, kept as shared blocks.
+        SampleSlice data;
+        bool held = false;  // false when it could not be had
+        int32_t index = 0;  // position in the manager
     };
 
-    /// Allocates record's array and copies the channel's range into it.
+    /// Keeps the channel's range in record: its blocks, shared.
     void SnapshotChannel(Channel* channel, SavedChannel& record) const;
 
     /// Called for each recorded channel met by WalkRecordedChannels with the

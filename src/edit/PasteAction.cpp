@@ -116,8 +116,8 @@ status_t PasteAction::Undo()
     } else {
         RestoreSelection([this](Channel* channel, size_t record) {
             const SavedChannel& saved = SavedChannels()[record];
-            if (saved.data != nullptr)
-                channel->ReplaceFrames(saved.data.get(), FrameCount(), pasteStart_, pasteEnd_);
+            if (saved.held)
+                channel->ReplaceFrames(saved.data, pasteStart_, pasteEnd_);
         });
     }
     Manager()->SetCurrentFrame(RangeStart());

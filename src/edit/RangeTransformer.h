@@ -4,6 +4,7 @@
 #include <functional>
 #include <memory>
 
+#include "sound/SampleAllocator.h"
 #include "support/Status.h"
 
 namespace glimmet {
@@ -19,14 +20,11 @@ class ChannelManager;
 /// range starting exactly at the end of its data) therefore gets whatever
 /// the previous channel left in the buffer.
 ///
-/// Where the range lies wholly inside a channel's data, copying out and
-/// writing back is the same as rewriting the samples where they are, so
-/// that is done instead (the result is identical and the run does no
-/// allocation). The buffer's contents are then tracked as a pointer to
-/// where they live, and materialised only when a failed copy needs them.
+/// Writing back builds new blocks for the range only: the rest of each
+/// channel keeps its blocks, and the blocks the range had stay with whoever
+/// shares them (the action's undo snapshot).
 ///
-/// Callers hold the document lock for the transformer's whole life: it
-/// reads and writes channel arrays directly.
+/// Callers hold the document lock for the transformer's whole life.
 class RangeTransformer {
 public:
     /// Rewrites count samples.
@@ -49,22 +47,14 @@ public:
     void InspectSelected(const Inspector& inspector);
 
 private:
-    /// The range lies inside the channel's data: it can be used in place.
-    bool InPlace(Channel* channel) const;
-    bool NeedsBuffer() const;
-    /// Copies the channel's range into the buffer; when the copy fails the
-    /// buffer gets its previous contents instead.
-    void Fill(Channel* channel);
-    int16_t* RangeOf(Channel* channel) const;
+    bool AnySelected() const;
 
     ChannelManager* manager_;
     int64_t start_;
     int64_t end_;
     int64_t count_;
-    std::unique_ptr<int16_t[]> buffer_;
-    /// Where the working buffer's contents are: null before anything was
-    /// copied (silence), buffer_ itself, or a channel's range in place.
-    const int16_t* contents_ = nullptr;
+    /// Silence until the first copy; a failed copy leaves it as it was.
+    SampleAllocator::Array buffer_;
     status_t status_ = B_OK;
 };
 

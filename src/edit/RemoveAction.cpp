@@ -34,8 +34,8 @@ status_t RemoveAction::Undo()
     std::lock_guard guard(Manager()->DocumentLock());
     RestoreSelection([this](Channel* channel, size_t record) {
         const SavedChannel& saved = SavedChannels()[record];
-        if (saved.data != nullptr)
-            channel->InsertFrames(saved.data.get(), FrameCount(), RangeStart());
+        if (saved.held)
+            channel->InsertFrames(saved.data, RangeStart());
     });
     RestoreRange();
     return B_OK;

@@ -117,9 +117,12 @@ status_t StretchAction::StretchRecord(const SavedChannel& record, size_t index, 
     std::unique_ptr<float[]> output(new (std::nothrow) float[size_t(outputFrames)]());
     if (!input || !output)
         return B_NO_MEMORY;
-    if (record.data != nullptr) {
-        for (int64_t i = 0; i < frames; i++)
-            input[size_t(i)] = float(record.data[size_t(i)]) * (1.0f / 32768.0f);
+    if (record.held && record.data.Count() == frames) {
+        int64_t i = record.data.leading;
+        record.data.blocks.ForEachSpan(0, record.data.blocks.Count(), [&](const SampleSpan& span) {
+            for (int64_t k = 0; k < span.count; k++)
+                input[size_t(i++)] = float(span.samples[k]) * (1.0f / 32768.0f);
+        });
     }
     const StretchParameters& p = parameters_;
     const bool ok = VocoderStretch::Stretch(input.get(), frames, output.get(), outputFrames, p.fftLength,

@@ -2,7 +2,6 @@
 
 #include <cstring>
 #include <mutex>
-#include <new>
 
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
@@ -11,16 +10,12 @@ namespace glimmet {
 
 namespace {
 
-// An array of count samples (count may be 0), zeroed where a copy into it
-// fails; null only when memory is short or count is out of reach.
-std::unique_ptr<int16_t[]> CopyOf(Channel* channel, int64_t start, int64_t count)
+// The frames as FillBuffer gives them, kept as shared blocks (silence where
+// the read fails); false only when memory is short or count is out of
+// reach.
+bool KeepRange(Channel* channel, int64_t start, int64_t count, SampleSlice* slice)
 {
-    if (count < 0 || count > int64_t(UINT32_MAX))
-        return nullptr;
-    std::unique_ptr<int16_t[]> samples(new (std::nothrow) int16_t[size_t(count)]);
-    if (samples != nullptr && !channel->FillBuffer(samples.get(), start, count))
-        std::memset(samples.get(), 0, size_t(count) * sizeof(int16_t));
-    return samples;
+    return channel->ReadSlice(start, count, slice) != B_NO_MEMORY;
 }
 
 }  // namespace
@@ -47,12 +42,12 @@ TruncateAction::KeptChannel TruncateAction::Record(Channel* channel, int32_t ind
     record.index = index;
     if (record.firstFrame <= RangeStart()) {
         record.headCount = RangeStart() - record.firstFrame;
-        record.head = CopyOf(channel, record.firstFrame, record.headCount);
+        record.hasHead = KeepRange(channel, record.firstFrame, record.headCount, &record.head);
     }
     const int64_t tailCount = record.firstFrame + channel->FrameCount() - RangeEnd() - 1;
     if (tailCount > 0) {
         record.tailCount = tailCount;
-        record.tail = CopyOf(channel, RangeEnd() + 1, tailCount);
+        record.hasTail = KeepRange(channel, RangeEnd() + 1, tailCount, &record.tail);
     }
     return record;
 }
@@ -84,10 +79,10 @@ std::vector<int32_t> TruncateAction::RecordedIndexes() const
 void TruncateAction::PutBack(Channel* channel, const KeptChannel& record)
 {
     channel->SetStartFrameOffset(record.firstFrame);
-    if (record.head != nullptr)
-        channel->InsertFrames(record.head.get(), record.headCount, record.firstFrame);
-    if (record.tail != nullptr)
-        channel->InsertFrames(record.tail.get(), record.tailCount, RangeEnd() + 1);
+    if (record.hasHead)
+        channel->InsertFrames(record.head, record.firstFrame);
+    if (record.hasTail)
+        channel->InsertFrames(record.tail, RangeEnd() + 1);
 }
 
 status_t TruncateAction::Undo()

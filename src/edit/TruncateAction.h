@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "edit/Action.h"
+#include "sound/SampleSlice.h"
 
 namespace glimmet {
 
@@ -28,9 +29,11 @@ public:
 private:
     /// What truncating took from one selected channel.
     struct KeptChannel {
-        std::unique_ptr<int16_t[]> head;  // null when the channel starts after the range start
+        SampleSlice head;  // shared blocks, not copies
+        bool hasHead = false;  // false when the channel starts after the range start
         int64_t headCount = 0;
-        std::unique_ptr<int16_t[]> tail;  // null when nothing follows the range
+        SampleSlice tail;
+        bool hasTail = false;  // false when nothing follows the range
         int64_t tailCount = 0;
         int64_t firstFrame = 0;
         int32_t index = 0;

@@ -6,7 +6,10 @@
 
 #include "files/MediaFormat.h"
 #include "files/MediaTrack.h"
+#include "sound/BlockBuilder.h"
+#include "sound/BlockList.h"
 #include "sound/Channel.h"
+#include "sound/SampleBlock.h"
 
 namespace glimmet {
 
@@ -26,11 +29,29 @@ bool ChannelTrackLoader::Load(Channel& channel, MediaTrack* track, uint32_t inde
     if (!accepted)
         return false;
     channel.SetPanPosition(index % 2 == 1 ? Channel::kPanRight : Channel::kPanLeft);
-    SampleAllocator::Array samples = Channel::Allocate(count);
-    if (samples == nullptr)
+    // Channels hold at most 2^32 - 1 samples.
+    if (count > int64_t(UINT32_MAX))
         return false;
-    ReadTrackChannel(track, index, shape, samples.get(), count);
-    return channel.SetTo(std::move(samples), count);
+    const std::vector<std::shared_ptr<SampleBlock>> blocks = AllocateBlocks(count);
+    if (blocks.empty())
+        return false;
+    ReadTrackChannel(track, index, shape, blocks);
+    BlockList list;
+    for (const std::shared_ptr<SampleBlock>& block : blocks)
+        list.Append(block);
+    return channel.SetTo(std::move(list));
+}
+
+std::vector<std::shared_ptr<SampleBlock>> ChannelTrackLoader::AllocateBlocks(int64_t count)
+{
+    std::vector<std::shared_ptr<SampleBlock>> blocks;
+    for (int64_t made = 0; made < count; made += BlockBuilder::kBlockSamples) {
+        std::shared_ptr<SampleBlock> block = SampleBlock::Allocate(std::min(count - made, BlockBuilder::kBlockSamples));
+        if (block == nullptr)
+            return {};
+        blocks.push_back(std::move(block));
+    }
+    return blocks;
 }
 
 bool ChannelTrackLoader::AcceptTrackFormat(MediaTrack* track, uint32_t index, TrackShape* shape)
@@ -57,22 +78,30 @@ bool ChannelTrackLoader::AcceptTrackFormat(MediaTrack* track, uint32_t index, Tr
 }
 
 void ChannelTrackLoader::ReadTrackChannel(MediaTrack* track, uint32_t index, const TrackShape& shape,
-    int16_t* samples, int64_t count)
+    const std::vector<std::shared_ptr<SampleBlock>>& blocks)
 {
     std::vector<int16_t> buffer(2 * shape.bufferSize / sizeof(int16_t) + 1);
     int64_t seekTo = 0;
     track->SeekToFrame(&seekTo, 0);
-    int64_t stored = 0;
+    size_t block = 0;
+    int64_t stored = 0;  // in blocks[block]
     int64_t framesRead = 0;
     while (track->ReadFrames(buffer.data(), &framesRead) == B_OK) {
         const int64_t available = std::min<int64_t>(framesRead * shape.channels, int64_t(buffer.size()));
-        // Frames beyond the counted length have no place in the array.
-        for (int64_t position = index; position < available && stored < count; position += shape.channels)
-            samples[size_t(stored++)] = buffer[size_t(position)];
+        // Frames beyond the counted length have no place in the blocks.
+        for (int64_t position = index; position < available && block < blocks.size(); position += shape.channels) {
+            blocks[block]->MutableSamples()[stored++] = buffer[size_t(position)];
+            if (stored == blocks[block]->Count()) {
+                ++block;
+                stored = 0;
+            }
+        }
     }
     // A decode that came up short leaves silence, not stale memory.
-    if (count > stored)
-        std::memset(samples + stored, 0, size_t(count - stored) * sizeof(int16_t));
+    for (; block < blocks.size(); ++block, stored = 0) {
+        int16_t* samples = blocks[block]->MutableSamples();
+        std::memset(samples + stored, 0, size_t(blocks[block]->Count() - stored) * sizeof(int16_t));
+    }
 }
 
 }  // namespace glimmet

@@ -2,10 +2,13 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
+#include <vector>
 
 namespace glimmet {
 
 class Channel;
+class SampleBlock;
 class MediaTrack;
 
 /// Fills one Channel from one channel of an audio track. Channels know
@@ -16,7 +19,7 @@ public:
     /// its decoded rate, its samples (signed 16-bit), and the pan of a
     /// stereo pair (odd index right, even index left). False when the track
     /// is missing or not audio, cannot be decoded to 16-bit, has no frames,
-    /// or the array cannot be had; the frame count (and from the decoded
+    /// or the memory cannot be had; the frame count (and from the decoded
     /// format on, the rate) stay stored even then. A decode that yields fewer
     /// frames than counted leaves the rest silent; frames beyond the count
     /// are dropped. Decodes the whole track from its start.
@@ -34,11 +37,13 @@ private:
 
     /// False ends the load; *shape is filled as far as the track got.
     static bool AcceptTrackFormat(MediaTrack* track, uint32_t index, TrackShape* shape);
-    /// Decodes the track from its start into samples, which hold count
-    /// samples: channel index of each frame, silence where the decode ends
-    /// early.
-    static void ReadTrackChannel(MediaTrack* track, uint32_t index, const TrackShape& shape, int16_t* samples,
-        int64_t count);
+    /// Blocks that hold count samples together, all had before any decoding
+    /// starts; empty when the memory cannot be had.
+    static std::vector<std::shared_ptr<SampleBlock>> AllocateBlocks(int64_t count);
+    /// Decodes the track from its start into blocks, one after the other:
+    /// channel index of each frame, silence where the decode ends early.
+    static void ReadTrackChannel(MediaTrack* track, uint32_t index, const TrackShape& shape,
+        const std::vector<std::shared_ptr<SampleBlock>>& blocks);
 };
 
 }  // namespace glimmet

@@ -5,22 +5,20 @@
 #include <cstring>
 #include <new>
 
+#include "sound/BlockBuilder.h"
 #include "support/Diagnostics.h"
 
 namespace glimmet {
 
 namespace {
 
+// Channels hold at most 2^32 - 1 samples.
+constexpr int64_t kLongestData = int64_t(UINT32_MAX);
+
 void FillZeros(int16_t* destination, int64_t count)
 {
     if (count > 0)
         std::memset(destination, 0, size_t(count) * sizeof(int16_t));
-}
-
-void CopySamples(int16_t* destination, const int16_t* source, int64_t count)
-{
-    if (count > 0)
-        std::memcpy(destination, source, size_t(count) * sizeof(int16_t));
 }
 
 uint64_t NextChannelId()
@@ -36,35 +34,49 @@ Channel::~Channel() = default;
 
 SampleAllocator::Array Channel::Allocate(int64_t count)
 {
-    if (count < 0 || count > int64_t(UINT32_MAX))
+    if (count < 0 || count > kLongestData)
         return nullptr;
     return SampleAllocator::Shared().Allocate(size_t(count));
-}
-
-void Channel::Install(SampleArray samples, int64_t count)
-{
-    samples_ = std::move(samples);
-    count_ = count;
 }
 
 bool Channel::SetTo(int16_t* samples, int64_t count)
 {
     if (samples == nullptr || count <= 0)
         return false;
-    std::lock_guard guard(lock_);
-    // A fresh pointer with a fresh deleter: reset() would keep the deleter of
-    // the array it replaces.
-    samples_ = SampleArray(samples, SampleAllocator::Deleter());
-    count_ = count;
-    return true;
+    std::unique_ptr<int16_t[]> adopted(samples);
+    BlockList list;
+    if (count <= BlockBuilder::kBlockSamples) {
+        list.Append(SampleBlock::Adopt(std::move(adopted), count));
+    } else {
+        BlockBuilder builder;
+        builder.AppendSamples(samples, count);
+        list = builder.Finish();
+    }
+    if (list.Count() != count)
+        return false;
+    return SetTo(std::move(list));
 }
 
 bool Channel::SetTo(SampleAllocator::Array samples, int64_t count)
 {
     if (samples == nullptr || count <= 0)
         return false;
+    BlockBuilder builder;
+    builder.AppendSamples(samples.get(), count);
+    samples.reset();
+    if (!builder.Ok())
+        return false;
+    return SetTo(builder.Finish());
+}
+
+bool Channel::SetTo(BlockList blocks)
+{
+    if (blocks.Empty())
+        return false;
     std::lock_guard guard(lock_);
-    Install(std::move(samples), count);
+    count_ = blocks.Count();
+    blocks_ = std::move(blocks);
+    hasData_ = true;
     return true;
 }
 
@@ -73,30 +85,53 @@ bool Channel::FillBuffer(int16_t* buffer, int64_t start, int64_t count)
     std::lock_guard guard(lock_);
     if (buffer == nullptr)
         return false;
-    const int16_t* samples = nullptr;
+    int64_t index = 0;
     int64_t offset = 0;
     int64_t length = 0;
-    if (!FindSamples(start, count, &samples, &offset, &length))
+    if (!FindSamples(start, count, &index, &offset, &length))
         return false;
     FillZeros(buffer, offset);
-    CopySamples(buffer + offset, samples, length);
+    if (length > 0)
+        blocks_.CopyOut(index, length, buffer + offset);
     FillZeros(buffer + offset + length, count - offset - length);
     return true;
 }
 
-bool Channel::FindSamples(int64_t start, int64_t count, const int16_t** samples, int64_t* offset,
-    int64_t* length) const
+status_t Channel::ReadSlice(int64_t start, int64_t count, SampleSlice* slice)
 {
-    *samples = nullptr;
+    std::lock_guard guard(lock_);
+    *slice = SampleSlice();
+    if (count < 0 || count > kLongestData)
+        return B_NO_MEMORY;
+    int64_t index = 0;
+    int64_t offset = 0;
+    int64_t length = 0;
+    if (!FindSamples(start, count, &index, &offset, &length)) {
+        slice->leading = count;
+        return B_ERROR;
+    }
+    BlockBuilder builder;
+    builder.AppendRange(blocks_, index, length);
+    if (!builder.Ok())
+        return B_NO_MEMORY;
+    slice->leading = offset;
+    slice->blocks = builder.Finish();
+    slice->trailing = count - offset - length;
+    slice->newBytes = builder.NewBytes();
+    return B_OK;
+}
+
+bool Channel::FindSamples(int64_t start, int64_t count, int64_t* index, int64_t* offset, int64_t* length) const
+{
+    *index = 0;
     *offset = 0;
     *length = 0;
     const int64_t end = End();
     const int64_t last = start + count - 1;
-    int64_t index = 0;
     if (start >= first_ && start < end) {
         // A request running past the data reads silence there, one ending
         // exactly one frame past it included.
-        index = start - first_;
+        *index = start - first_;
     } else if (start >= first_ && start > end) {
         return true;
     } else if (start == end) {
@@ -109,140 +144,150 @@ bool Channel::FindSamples(int64_t start, int64_t count, const int16_t** samples,
     } else {
         *offset = first_ - start;
     }
-    if (samples_ == nullptr)
-        return true;
-    *length = std::max<int64_t>(0, std::min(count - *offset, count_ - index));
-    if (*length > 0)
-        *samples = samples_.get() + index;
+    *length = std::max<int64_t>(0, std::min(count - *offset, blocks_.Count() - *index));
     return true;
+}
+
+status_t Channel::Rebuild(int64_t length, int64_t first, const std::function<void(BlockBuilder&)>& build,
+    status_t failure)
+{
+    if (length < 0 || length > kLongestData)
+        return failure;
+    BlockBuilder builder;
+    build(builder);
+    if (!builder.Ok())
+        return failure;
+    BlockList fresh = builder.Finish();
+    // The old blocks are let go of after the swap; those the new list
+    // shares live on.
+    std::swap(blocks_, fresh);
+    count_ = length;
+    hasData_ = true;
+    first_ = first;
+    return B_OK;
 }
 
 status_t Channel::InsertFrames(const int16_t* frames, int64_t count, int64_t at)
 {
     if (frames == nullptr || count <= 0)
         return B_BAD_VALUE;
+    return Insert([frames, count](BlockBuilder& builder) { builder.AppendSamples(frames, count); }, count, at);
+}
+
+status_t Channel::InsertFrames(const SampleSlice& frames, int64_t at)
+{
+    const int64_t count = frames.Count();
+    if (count <= 0)
+        return B_BAD_VALUE;
+    return Insert([&frames](BlockBuilder& builder) {
+        builder.AppendZeros(frames.leading);
+        builder.AppendRange(frames.blocks, 0, frames.blocks.Count());
+        builder.AppendZeros(frames.trailing);
+    }, count, at);
+}
+
+status_t Channel::Insert(const Source& frames, int64_t count, int64_t at)
+{
     std::lock_guard guard(lock_);
-    if (samples_ == nullptr)
-        return ReplaceAll(frames, count, at);
+    if (!hasData_)
+        return Rebuild(count, at, frames);
     return InsertIntoData(frames, count, at);
 }
 
-status_t Channel::InsertIntoData(const int16_t* frames, int64_t count, int64_t at)
+status_t Channel::InsertIntoData(const Source& frames, int64_t count, int64_t at)
 {
     const int64_t end = End();
     if (at >= first_ && at < end) {
-        SampleArray fresh = Allocate(count_ + count);
-        if (fresh == nullptr)
-            return B_NO_MEMORY;
         const int64_t head = at - first_;
-        CopySamples(fresh.get(), samples_.get(), head);
-        CopySamples(fresh.get() + head, frames, count);
-        CopySamples(fresh.get() + head + count, samples_.get() + head, count_ - head);
-        Install(std::move(fresh), count_ + count);
-    } else if (at >= end) {
-        const int64_t length = (at - first_) + count;
-        SampleArray fresh = Allocate(length);
-        if (fresh == nullptr)
-            return B_NO_MEMORY;
-        CopySamples(fresh.get(), samples_.get(), count_);
-        FillZeros(fresh.get() + count_, at - end);
-        CopySamples(fresh.get() + (at - first_), frames, count);
-        Install(std::move(fresh), length);
-    } else {
-        // Inserting before the data: the gap in front of the old data moves
-        // right together with it.
-        const int64_t gap = first_ - at;
-        const int64_t length = gap + count + count_;
-        SampleArray fresh = Allocate(length);
-        if (fresh == nullptr)
-            return B_NO_MEMORY;
-        CopySamples(fresh.get(), frames, count);
-        FillZeros(fresh.get() + count, gap);
-        CopySamples(fresh.get() + count + gap, samples_.get(), count_);
-        Install(std::move(fresh), length);
-        first_ = at;
+        return Rebuild(count_ + count, first_, [&](BlockBuilder& builder) {
+            builder.AppendRange(blocks_, 0, head);
+            frames(builder);
+            builder.AppendRange(blocks_, head, count_ - head);
+        });
     }
-    return B_OK;
-}
-
-status_t Channel::ReplaceAll(const int16_t* frames, int64_t count, int64_t first)
-{
-    SampleArray fresh = Allocate(count);
-    if (fresh == nullptr)
-        return B_NO_MEMORY;
-    CopySamples(fresh.get(), frames, count);
-    Install(std::move(fresh), count);
-    first_ = first;
-    return B_OK;
+    if (at >= end) {
+        return Rebuild((at - first_) + count, first_, [&](BlockBuilder& builder) {
+            builder.AppendRange(blocks_, 0, count_);
+            builder.AppendZeros(at - end);
+            frames(builder);
+        });
+    }
+    // Inserting before the data: the gap in front of the old data moves
+    // right together with it.
+    const int64_t gap = first_ - at;
+    return Rebuild(gap + count + count_, at, [&](BlockBuilder& builder) {
+        frames(builder);
+        builder.AppendZeros(gap);
+        builder.AppendRange(blocks_, 0, count_);
+    });
 }
 
 status_t Channel::ReplaceFrames(const int16_t* frames, int64_t count, int64_t from, int64_t to)
 {
     if (frames == nullptr || count <= 0 || from > to || from < 0)
         return B_BAD_VALUE;
+    return Replace([frames, count](BlockBuilder& builder) { builder.AppendSamples(frames, count); }, count, from,
+        to);
+}
+
+status_t Channel::ReplaceFrames(const SampleSlice& frames, int64_t from, int64_t to)
+{
+    const int64_t count = frames.Count();
+    if (count <= 0 || from > to || from < 0)
+        return B_BAD_VALUE;
+    return Replace([&frames](BlockBuilder& builder) {
+        builder.AppendZeros(frames.leading);
+        builder.AppendRange(frames.blocks, 0, frames.blocks.Count());
+        builder.AppendZeros(frames.trailing);
+    }, count, from, to);
+}
+
+status_t Channel::Replace(const Source& frames, int64_t count, int64_t from, int64_t to)
+{
     std::lock_guard guard(lock_);
-    if (samples_ == nullptr)
-        return ReplaceAll(frames, count, from);
+    if (!hasData_)
+        return Rebuild(count, from, frames);
     return ReplaceInData(frames, count, from, to);
 }
 
-status_t Channel::ReplaceInData(const int16_t* frames, int64_t count, int64_t from, int64_t to)
+status_t Channel::ReplaceInData(const Source& frames, int64_t count, int64_t from, int64_t to)
 {
     const int64_t end = End();
     if (from >= first_ && from < end) {
         const int64_t head = from - first_;
-        if (to >= end) {
+        if (to >= end)
             Diagnostics::Print("  ending outside data\n");
-        }
         const int64_t tailIndex = std::min(to - first_ + 1, count_);
         const int64_t tail = count_ - tailIndex;
-        const int64_t length = head + count + tail;
-        SampleArray fresh = Allocate(length);
-        if (fresh == nullptr)
-            return B_NO_MEMORY;
-        CopySamples(fresh.get(), samples_.get(), head);
-        CopySamples(fresh.get() + head, frames, count);
-        CopySamples(fresh.get() + head + count, samples_.get() + tailIndex, tail);
-        Install(std::move(fresh), length);
-        return B_OK;
+        return Rebuild(head + count + tail, first_, [&](BlockBuilder& builder) {
+            builder.AppendRange(blocks_, 0, head);
+            frames(builder);
+            builder.AppendRange(blocks_, tailIndex, tail);
+        });
     }
     if (from >= end) {
-        const int64_t length = from - first_ + count;
-        SampleArray fresh = Allocate(length);
-        if (fresh == nullptr)
-            return B_NO_MEMORY;
-        CopySamples(fresh.get(), samples_.get(), count_);
-        FillZeros(fresh.get() + count_, from - end);
-        CopySamples(fresh.get() + (from - first_), frames, count);
-        Install(std::move(fresh), length);
-        return B_OK;
+        return Rebuild(from - first_ + count, first_, [&](BlockBuilder& builder) {
+            builder.AppendRange(blocks_, 0, count_);
+            builder.AppendZeros(from - end);
+            frames(builder);
+        });
     }
     // from lies before the data.
     if (to >= end)
-        return ReplaceAll(frames, count, from);
+        return Rebuild(count, from, frames);
     if (to >= first_) {
         const int64_t tailIndex = to - first_ + 1;
-        const int64_t length = count + count_ - tailIndex;
-        SampleArray fresh = Allocate(length);
-        if (fresh == nullptr)
-            return B_NO_MEMORY;
-        CopySamples(fresh.get(), frames, count);
-        CopySamples(fresh.get() + count, samples_.get() + tailIndex, count_ - tailIndex);
-        Install(std::move(fresh), length);
-        first_ = from;
-        return B_OK;
+        return Rebuild(count + count_ - tailIndex, from, [&](BlockBuilder& builder) {
+            frames(builder);
+            builder.AppendRange(blocks_, tailIndex, count_ - tailIndex);
+        });
     }
     const int64_t gap = first_ - to - 1;
-    const int64_t length = count + gap + count_;
-    SampleArray fresh = Allocate(length);
-    if (fresh == nullptr)
-        return B_NO_MEMORY;
-    CopySamples(fresh.get(), frames, count);
-    FillZeros(fresh.get() + count, gap);
-    CopySamples(fresh.get() + count + gap, samples_.get(), count_);
-    Install(std::move(fresh), length);
-    first_ = from;
-    return B_OK;
+    return Rebuild(count + gap + count_, from, [&](BlockBuilder& builder) {
+        frames(builder);
+        builder.AppendZeros(gap);
+        builder.AppendRange(blocks_, 0, count_);
+    });
 }
 
 status_t Channel::RemoveFrames(int64_t from, int64_t to)
@@ -256,30 +301,25 @@ status_t Channel::RemoveFrames(int64_t from, int64_t to)
     if (to >= end)
         to = end - 1;
     if (first_ <= from) {
-        // With from == end the range is empty after clamping and the array is
+        // With from == end the range is empty after clamping and the data is
         // merely rebuilt at the same length.
         const int64_t head = from - first_;
         const int64_t tailIndex = std::max(to - first_ + 1, head);
-        const int64_t length = head + (count_ - tailIndex);
-        SampleArray fresh = Allocate(length);
-        if (fresh == nullptr)
-            return B_ERROR;
-        CopySamples(fresh.get(), samples_.get(), head);
-        CopySamples(fresh.get() + head, samples_.get() + tailIndex, count_ - tailIndex);
-        Install(std::move(fresh), length);
-    } else if (to >= first_) {
-        // The head goes, but the kept part starts at the sample at `to`
-        // itself: the last old sample does not fit the new array and is lost.
-        const int64_t length = count_ - (to - first_ + 1);
-        SampleArray fresh = Allocate(length);
-        if (fresh == nullptr)
-            return B_NO_MEMORY;
-        CopySamples(fresh.get(), samples_.get() + (to - first_), length);
-        Install(std::move(fresh), length);
-        first_ = from;
-    } else {
-        first_ -= to - from + 1;
+        return Rebuild(head + (count_ - tailIndex), first_, [&](BlockBuilder& builder) {
+            builder.AppendRange(blocks_, 0, head);
+            builder.AppendRange(blocks_, tailIndex, count_ - tailIndex);
+        }, B_ERROR);
     }
+    if (to >= first_) {
+        // The head goes, but the kept part starts at the sample at `to`
+        // itself: the last old sample does not fit the new length and is
+        // lost.
+        const int64_t length = count_ - (to - first_ + 1);
+        return Rebuild(length, from, [&](BlockBuilder& builder) {
+            builder.AppendRange(blocks_, to - first_, length);
+        });
+    }
+    first_ -= to - from + 1;
     return B_OK;
 }
 
@@ -346,8 +386,10 @@ void Channel::SetFrameRate(float rate)
 void Channel::SetFrameCount(int64_t count)
 {
     std::lock_guard guard(lock_);
-    if (count != count_)
-        samples_.reset();
+    if (count != count_) {
+        blocks_.Clear();
+        hasData_ = false;
+    }
     count_ = count;
 }
 
@@ -373,7 +415,19 @@ void Channel::GetMixSettings(bool* muted, int8_t* pan)
 int16_t* Channel::Data()
 {
     std::lock_guard guard(lock_);
-    return samples_.get();
+    if (!hasData_ || blocks_.Empty())
+        return nullptr;
+    // A block only this channel holds may be written: nobody else sees it.
+    if (blocks_.BlockCount() == 1 && blocks_.BlockAt(0).use_count() == 1)
+        return const_cast<SampleBlock*>(blocks_.BlockAt(0).get())->MutableSamples();
+    std::shared_ptr<SampleBlock> whole = SampleBlock::Allocate(blocks_.Count());
+    if (whole == nullptr)
+        return nullptr;
+    blocks_.CopyOut(0, blocks_.Count(), whole->MutableSamples());
+    int16_t* samples = whole->MutableSamples();
+    blocks_.Clear();
+    blocks_.Append(std::move(whole));
+    return samples;
 }
 
 }  // namespace glimmet

@@ -1,21 +1,28 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <mutex>
 
+#include "sound/BlockList.h"
 #include "sound/SampleAllocator.h"
+#include "sound/SampleSlice.h"
 #include "support/Locker.h"
 #include "support/Status.h"
 
 namespace glimmet {
 
+class BlockBuilder;
+
 /// One mono track of the document: signed 16-bit samples placed on the
 /// timeline at a first frame, with its own mute flag, selection flag and pan.
 ///
 /// Every operation takes the channel's own lock, so the audio thread may read
-/// a channel while the GUI thread edits it. Edits that change the amount of
-/// data build a new array and swap it in; nothing is resized in place.
+/// a channel while the GUI thread edits it. The samples live in a list of
+/// immutable shared blocks: an edit builds a new list that shares every
+/// block it leaves alone, copies only the blocks it cuts, and swaps the list
+/// in. Nothing is ever written in place.
 class Channel {
 public:
     static constexpr int8_t kPanLeft = -128;
@@ -33,14 +40,19 @@ public:
     Channel(const Channel&) = delete;
     Channel& operator=(const Channel&) = delete;
 
-    /// Adopts samples (allocated with new[]) as this channel's data; false,
+    /// Takes samples (allocated with new[]) as this channel's data; false,
     /// changing nothing, for a null pointer or a count below 1. Meant for a
-    /// freshly made channel: the first frame is left as it is.
+    /// freshly made channel: the first frame is left as it is. An array of
+    /// up to a block is kept as it is; a longer one is cut into blocks and
+    /// freed.
     bool SetTo(int16_t* samples, int64_t count);
-    /// Adopts an array from a SampleAllocator, which takes it back when the
-    /// channel lets go of it; otherwise as above (a null array or a count
-    /// below 1 changes nothing and frees the array).
+    /// Takes an array from a SampleAllocator: cut into blocks, then given
+    /// back; otherwise as above (a null array or a count below 1 changes
+    /// nothing and frees the array).
     bool SetTo(SampleAllocator::Array samples, int64_t count);
+    /// Takes blocks as this channel's data, as the loader builds them; false,
+    /// changing nothing, for an empty list.
+    bool SetTo(BlockList blocks);
 
     /// Writes count samples of the channel's timeline from start into buffer:
     /// zeros where the channel is silent. False for a null buffer, and for a
@@ -50,6 +62,30 @@ public:
     status_t InsertFrames(const int16_t* frames, int64_t count, int64_t at);
     status_t ReplaceFrames(const int16_t* frames, int64_t count, int64_t from, int64_t to);
     status_t RemoveFrames(int64_t from, int64_t to);
+
+    /// The same edits with kept samples: the slice's blocks are shared, not
+    /// copied, and its silence is written as silence. The result is that of
+    /// the array versions with the slice's samples laid out in an array.
+    status_t InsertFrames(const SampleSlice& frames, int64_t at);
+    status_t ReplaceFrames(const SampleSlice& frames, int64_t from, int64_t to);
+
+    /// What FillBuffer would write for the same request, kept as shared
+    /// blocks (only the blocks cut at the edges are new). B_ERROR, after
+    /// printing what FillBuffer prints, when FillBuffer would fail: *slice
+    /// is then silence, as a buffer cleared beforehand would be.
+    /// B_NO_MEMORY when a block cannot be had or count is not a length a
+    /// channel can hold (0 to 2^32 - 1).
+    status_t ReadSlice(int64_t start, int64_t count, SampleSlice* slice);
+
+    /// Calls f(const SampleSpan&) for the samples of data index index ..
+    /// index + count - 1 (clipped to the data), in order, while holding the
+    /// lock. The spans stay valid only during the call.
+    template <typename F>
+    void ReadSpans(int64_t index, int64_t count, F&& f)
+    {
+        std::lock_guard guard(lock_);
+        blocks_.ForEachSpan(index, count, f);
+    }
 
     bool IsMuted();
     void SetMuted(bool muted);
@@ -78,25 +114,31 @@ public:
     void GetMixSettings(bool* muted, int8_t* pan);
 
     /// What a mix takes from the channel for one request, read under one
-    /// hold of the lock.
+    /// hold of the lock. The samples arrive in pieces, one per block.
     struct MixSource {
         bool muted = false;
         int8_t pan = kPanMiddle;
-        /// The samples FillBuffer would copy for the same request, which
-        /// belong at index offset of the request on; every other index is
-        /// silence. Null, with length 0, when nothing would be copied.
+        /// Samples FillBuffer would copy for the same request, which belong
+        /// at index offset of the request on; every index outside the
+        /// pieces is silence. Null, with length 0, when nothing would be
+        /// copied.
         const int16_t* samples = nullptr;
         int64_t offset = 0;
         int64_t length = 0;
-        /// How many samples of the array follow the copied ones.
+        /// How many samples of the same block follow the piece.
         int64_t following = 0;
+        /// The request's first and last piece (both for a request that
+        /// copies nothing).
+        bool firstPiece = true;
+        bool lastPiece = true;
     };
 
-    /// Calls mix(const MixSource&) for count frames of the timeline from
-    /// start while holding the channel's lock, so the samples stay valid and
-    /// unchanged during the call: the mixer sums them where they lie instead
-    /// of copying them out. Returns what FillBuffer would return for the
-    /// request, and prints what it would print.
+    /// Calls mix(const MixSource&) for each piece of count frames of the
+    /// timeline from start, in order, while holding the channel's lock, so
+    /// the samples stay valid and unchanged during the call: the mixer sums
+    /// them where they lie instead of copying them out. No reference count
+    /// is touched and nothing is allocated. Returns what FillBuffer would
+    /// return for the request, and prints what it would print.
     template <typename Mix>
     bool ReadForMix(int64_t start, int64_t count, Mix&& mix)
     {
@@ -104,15 +146,33 @@ public:
         MixSource source;
         source.muted = muted_;
         source.pan = pan_;
-        const bool filled = FindSamples(start, count, &source.samples, &source.offset, &source.length);
-        if (source.length > 0)
-            source.following = samples_.get() + count_ - (source.samples + source.length);
-        mix(static_cast<const MixSource&>(source));
+        int64_t index = 0;
+        int64_t length = 0;
+        const bool filled = FindSamples(start, count, &index, &source.offset, &length);
+        if (length <= 0) {
+            mix(static_cast<const MixSource&>(source));
+            return filled;
+        }
+        int64_t done = 0;
+        blocks_.ForEachSpan(index, length, [&](const SampleSpan& span) {
+            source.samples = span.samples;
+            source.length = span.count;
+            source.following = span.block->Count() - span.offset - span.count;
+            source.firstPiece = done == 0;
+            done += span.count;
+            source.lastPiece = done == length;
+            mix(static_cast<const MixSource&>(source));
+            source.offset += span.count;
+        });
         return filled;
     }
 
-    /// The sample array itself, valid only while no edit runs (callers hold
-    /// the document lock). Null for a channel that never held data.
+    /// The samples as one writable array, for tests and tools that want to
+    /// look at or poke a channel directly; the program itself reads through
+    /// ReadSpans. Gathers the data into one block of the channel's own when
+    /// it is spread over several or shared (a copy), so later calls are
+    /// cheap until the next edit. Null for a channel without data, and for
+    /// one longer than a block may be.
     int16_t* Data();
 
     /// An uninitialised array of count samples from the shared allocator, or
@@ -129,25 +189,32 @@ public:
     void SetFrameCount(int64_t count);
 
 private:
-    /// Frees through the deleter that knows where the memory came from: the
-    /// shared SampleAllocator, or delete[] for adopted arrays.
-    using SampleArray = SampleAllocator::Array;
+    /// Appends the new samples of an insert or replace to a builder.
+    using Source = std::function<void(BlockBuilder&)>;
 
     /// Which samples a request of count frames of the timeline from start
-    /// copies: *length samples from *samples on go to index *offset of the
-    /// request, the rest of it is silence. False, after printing "what
-    /// the....?", for a request that starts exactly at the end of the data.
-    /// The lock is held.
-    bool FindSamples(int64_t start, int64_t count, const int16_t** samples, int64_t* offset, int64_t* length) const;
-    void Install(SampleArray samples, int64_t count);
-    status_t InsertIntoData(const int16_t* frames, int64_t count, int64_t at);
-    status_t ReplaceInData(const int16_t* frames, int64_t count, int64_t from, int64_t to);
-    status_t ReplaceAll(const int16_t* frames, int64_t count, int64_t first);
+    /// copies: *length samples from data index *index on go to index
+    /// *offset of the request, the rest of it is silence. False, after
+    /// printing "what the....?", for a request that starts exactly at the
+    /// end of the data. The lock is held.
+    bool FindSamples(int64_t start, int64_t count, int64_t* index, int64_t* offset, int64_t* length) const;
+    /// Builds the new data of length samples with build and installs it
+    /// with first frame first; failure, changing nothing, when length is
+    /// not one a channel can hold or a block cannot be had.
+    status_t Rebuild(int64_t length, int64_t first, const std::function<void(BlockBuilder&)>& build,
+        status_t failure = B_NO_MEMORY);
+    status_t Insert(const Source& frames, int64_t count, int64_t at);
+    status_t Replace(const Source& frames, int64_t count, int64_t from, int64_t to);
+    status_t InsertIntoData(const Source& frames, int64_t count, int64_t at);
+    status_t ReplaceInData(const Source& frames, int64_t count, int64_t from, int64_t to);
     int64_t End() const { return first_ + count_; }
 
     const uint64_t id_;
-    // All other fields are guarded by lock_.
-    SampleArray samples_;
+    // All other fields are guarded by lock_. hasData_ tells an empty channel from
+    // one whose data was cut down to nothing; without data blocks_ is empty
+    // (count_ may still hold a length loading counted).
+    BlockList blocks_;
+    bool hasData_ = false;
     int64_t count_ = 0;
     int64_t first_ = 0;
     float frameRate_ = 0;

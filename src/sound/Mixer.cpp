@@ -153,6 +153,18 @@ bool Mixer::FillBuffer(int16_t* out, int64_t* frames)
     return true;
 }
 
+namespace {
+
+void AddOrCopy(const Channel::MixSource& source, bool copy, int32_t* sums)
+{
+    if (copy)
+        mix::CopySamples(source.samples, source.length, sums + source.offset);
+    else
+        mix::AddSamples(source.samples, source.length, sums + source.offset);
+}
+
+}  // namespace
+
 void Mixer::AddChannels(int32_t channelCount, const Part& part, bool firstPart)
 {
     int32_t* left = integerLeft_.data() + part.offset;
@@ -161,38 +173,49 @@ void Mixer::AddChannels(int32_t channelCount, const Part& part, bool firstPart)
     // samples, zeros around them) instead of adding to zeros.
     bool leftSet = false;
     bool rightSet = false;
-    auto addTo = [&part](int32_t* sums, bool* set, const Channel::MixSource& source) {
-        if (*set) {
-            mix::AddSamples(source.samples, source.length, sums + source.offset);
-            return;
-        }
-        std::fill_n(sums, source.offset, 0);
-        mix::CopySamples(source.samples, source.length, sums + source.offset);
-        const int64_t after = source.offset + source.length;
-        std::fill_n(sums + after, part.count - after, 0);
-        *set = true;
-    };
     for (int32_t c = 0; c < channelCount; ++c) {
         uint8_t& heard = sides_[size_t(c)];
+        // The first channel heard on a side sets the sums of the part (its
+        // samples, zeros around them) instead of adding to zeros; its
+        // samples may come in several pieces, one per block.
+        bool copyLeft = false;
+        bool copyRight = false;
         // A request the channel refuses adds nothing, but the channel still
         // counts as heard on its sides.
         manager_->ChannelAtLocked(c)->ReadForMix(part.from, part.count, [&](const Channel::MixSource& source) {
             // The sides are read once per buffer: a buffer that wraps around
             // the loop hears each channel on the same sides in both parts.
-            if (firstPart)
+            if (firstPart && source.firstPiece)
                 heard = mix::HeardSides(source.muted, source.pan);
             if (source.length <= 0)
                 return;
-            if (heard == (kHeardLeft | kHeardRight) && leftSet && rightSet) {
+            if (source.firstPiece) {
+                copyLeft = (heard & kHeardLeft) != 0 && !leftSet;
+                copyRight = (heard & kHeardRight) != 0 && !rightSet;
+                if (copyLeft)
+                    std::fill_n(left, source.offset, 0);
+                if (copyRight)
+                    std::fill_n(right, source.offset, 0);
+            }
+            if (heard == (kHeardLeft | kHeardRight) && !copyLeft && !copyRight) {
                 mix::AddSamplesToBoth(source.samples, source.length, left + source.offset, right + source.offset);
             } else {
                 if ((heard & kHeardLeft) != 0)
-                    addTo(left, &leftSet, source);
+                    AddOrCopy(source, copyLeft, left);
                 if ((heard & kHeardRight) != 0)
-                    addTo(right, &rightSet, source);
+                    AddOrCopy(source, copyRight, right);
             }
             mix::PrefetchSamples(
                 source.samples + source.length, std::min({source.following, source.length, mix::kPrefetchLimit}));
+            if (source.lastPiece) {
+                const int64_t after = source.offset + source.length;
+                if (copyLeft)
+                    std::fill_n(left + after, part.count - after, 0);
+                if (copyRight)
+                    std::fill_n(right + after, part.count - after, 0);
+                leftSet = leftSet || copyLeft;
+                rightSet = rightSet || copyRight;
+            }
         });
     }
     if (!leftSet)

@@ -33,6 +33,13 @@ std::shared_ptr<SampleBlock> SampleBlock::Allocate(int64_t count)
     return std::shared_ptr<SampleBlock>(new (std::nothrow) SampleBlock(std::move(samples), count));
 }
 
+std::shared_ptr<SampleBlock> SampleBlock::Adopt(std::unique_ptr<int16_t[]> samples, int64_t count)
+{
+    if (samples == nullptr || count < 1 || count > kMaxSamples)
+        return nullptr;
+    return std::shared_ptr<SampleBlock>(new (std::nothrow) SampleBlock(std::move(samples), count));
+}
+
 std::shared_ptr<const SampleBlock> SampleBlock::CopyOf(const int16_t* samples, int64_t count)
 {
     if (samples == nullptr)

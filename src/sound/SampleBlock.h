@@ -28,6 +28,10 @@ public:
     /// A block holding a copy of count samples, or null as for Allocate.
     static std::shared_ptr<const SampleBlock> CopyOf(const int16_t* samples, int64_t count);
 
+    /// A block made of samples (from new[]) as they are, without a copy;
+    /// null, freeing them, under the same conditions as Allocate.
+    static std::shared_ptr<SampleBlock> Adopt(std::unique_ptr<int16_t[]> samples, int64_t count);
+
     /// The largest block: blocks are meant to be tens of thousands of
     /// samples, this only bounds what a caller may ask for.
     static constexpr int64_t kMaxSamples = int64_t(1) << 24;

@@ -130,7 +130,8 @@ void SampleView::Update(ViewRect rect)
         scene.selected = channel_->IsSelected();
         scene.channelFirstFrame = channel_->FirstFrame();
         scene.channelFrameCount = channel_->FrameCount();
-        scene.samples = channel_->Data();
+        channel_->ReadSpans(0, scene.channelFrameCount,
+            [&scene](const SampleSpan& span) { scene.spans.push_back(span); });
         scene.framesPerColumn = float(scene.lastFrame - scene.firstFrame + 1) / (bounds.Width() + 1);
         const int32_t rows = int32_t(bounds.Height() + 1);
         WaveformRenderer renderer(bitmap_, rowTable_.data(), rows, scene);

@@ -77,7 +77,7 @@ bool WaveformRenderer::IsOutsideData(int64_t f0, int64_t f1) const
 {
     const int64_t first = scene_.channelFirstFrame;
     const int64_t count = scene_.channelFrameCount;
-    return f0 - first < 0 || f0 - first >= count || f1 - first >= count || f1 < f0 || scene_.samples == nullptr;
+    return f0 - first < 0 || f0 - first >= count || f1 - first >= count || f1 < f0 || scene_.spans.empty();
 }
 
 void WaveformRenderer::FillColumn(int32_t column, ColumnState state)
@@ -121,8 +121,6 @@ void WaveformRenderer::RenderDataColumn(int32_t column, int64_t f0, int64_t f1, 
 // 16-bit counter per row would hold.
 void WaveformRenderer::CountSamples(int64_t f0, int64_t f1)
 {
-    const int16_t* sample = scene_.samples + (f0 - scene_.channelFirstFrame);
-    const int64_t count = f1 - f0 + 1;
     const size_t rowSlots = histogram_.size();
     const size_t lastSlot = rowSlots - 1;
     partials_.assign(4 * rowSlots, 0);
@@ -130,15 +128,31 @@ void WaveformRenderer::CountSamples(int64_t f0, int64_t f1)
     const auto slotOf = [&](int16_t value) {
         return std::min(size_t(rowTable_[(int32_t(value) + 32768) >> 3]), lastSlot);
     };
-    int64_t i = 0;
-    for (; i + 4 <= count; i += 4) {
-        ++partial[slotOf(sample[i])];
-        ++partial[rowSlots + slotOf(sample[i + 1])];
-        ++partial[2 * rowSlots + slotOf(sample[i + 2])];
-        ++partial[3 * rowSlots + slotOf(sample[i + 3])];
+    // The column's samples may lie in several blocks; which partial counts
+    // a sample does not matter to the sum.
+    int64_t index = f0 - scene_.channelFirstFrame;
+    int64_t remaining = f1 - f0 + 1;
+    for (const SampleSpan& span : scene_.spans) {
+        if (remaining <= 0)
+            break;
+        if (index >= span.count) {
+            index -= span.count;
+            continue;
+        }
+        const int16_t* sample = span.samples + index;
+        const int64_t count = std::min(span.count - index, remaining);
+        index = 0;
+        remaining -= count;
+        int64_t i = 0;
+        for (; i + 4 <= count; i += 4) {
+            ++partial[slotOf(sample[i])];
+            ++partial[rowSlots + slotOf(sample[i + 1])];
+            ++partial[2 * rowSlots + slotOf(sample[i + 2])];
+            ++partial[3 * rowSlots + slotOf(sample[i + 3])];
+        }
+        for (; i < count; ++i)
+            ++partial[slotOf(sample[i])];
     }
-    for (; i < count; ++i)
-        ++partial[slotOf(sample[i])];
     for (size_t row = 0; row < rowSlots; ++row)
         histogram_[row] = uint16_t(partial[row] + partial[rowSlots + row] + partial[2 * rowSlots + row] + partial[3 * rowSlots + row]);
 }

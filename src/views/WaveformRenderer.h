@@ -5,6 +5,8 @@
 
 #include <QImage>
 
+#include "sound/SampleBlock.h"
+
 namespace glimmet {
 
 /// What one render of a channel's columns needs to know: the container's
@@ -19,7 +21,8 @@ struct WaveformScene {
     bool selected = false;
     int64_t channelFirstFrame = 0;
     int64_t channelFrameCount = 0;
-    const int16_t* samples = nullptr;
+    /// The channel's data in order, one span per block; empty without data.
+    std::vector<SampleSpan> spans;
     /// (last - first + 1) / (view width in pixels), single precision.
     float framesPerColumn = 0;
 };
