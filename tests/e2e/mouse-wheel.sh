@@ -56,7 +56,7 @@ wheel() {
 # view's column 200 is the mapping's 201).
 ctrl_wheel_zooms_around_the_pointer() {
     local before under old_span
-    for column in 200 60 500; do
+    for column in 200 60; do
         before=$(display)
         old_span=$(span)
         under=$(frame_map frame $((column + 1)))
