@@ -16,6 +16,7 @@
 #include "app/DialogScriptCommands.h"
 #include "app/DocumentScriptCommands.h"
 #include "app/FileScriptCommands.h"
+#include "app/LoadQueue.h"
 #include "app/Quillex.h"
 #include "app/ReportScriptCommands.h"
 #include "app/ScriptArguments.h"
@@ -128,12 +129,21 @@ bool BatchRunner::RequireWindow(std::string* reason) const
 
 void BatchRunner::DrainEvents()
 {
-    QElapsedTimer timer;
-    timer.start();
+    // A file a line opened is in the document before the next line runs,
+    // however long it takes to decode, so that a script does the same thing
+    // on a slow machine as on a fast one.
+    bool loading = false;
     do {
-        QCoreApplication::sendPostedEvents();
-        QCoreApplication::processEvents(QEventLoop::AllEvents);
-    } while (MessageEvent::CountPendingFromMainThread() > 0 && timer.elapsed() < kDrainLimitMilliseconds);
+        QElapsedTimer timer;
+        timer.start();
+        do {
+            QCoreApplication::sendPostedEvents();
+            QCoreApplication::processEvents(QEventLoop::AllEvents);
+        } while (MessageEvent::CountPendingFromMainThread() > 0 && timer.elapsed() < kDrainLimitMilliseconds);
+        loading = LoadQueue::CountInFlight() > 0;
+        if (loading)
+            QCoreApplication::processEvents(QEventLoop::WaitForMoreEvents, LoadQueue::kPollMilliseconds);
+    } while (loading);
     QCoreApplication::sendPostedEvents(nullptr, QEvent::DeferredDelete);
 }
 

@@ -24,6 +24,7 @@
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "views/ChannelContainerView.h"
+#include "views/ZoomSlider.h"
 #include "views/PlayButton.h"
 #include "views/PlayModeButton.h"
 #include "views/SampleView.h"
@@ -123,6 +124,8 @@ std::string DocumentStateReport::Json(QuillexWindow& window)
         << ", \"range\": [" << manager->RangeStart() << ", " << manager->RangeEnd() << "]"
         << ", \"cursor\": " << container->CursorFrame() << ", \"playmark\": " << container->PlaymarkFrame()
         << ", \"display\": [" << container->FirstDisplayedFrame() << ", " << container->LastDisplayedFrame() << "]"
+        << ", \"slider\": [" << window.GetZoomSlider()->FirstFrame() << ", " << window.GetZoomSlider()->LastFrame()
+        << "]"
         << ", \"playmode\": \"" << PlayModeName(window.PlayModePopup()->currentIndex()) << '"'
         << ", \"loop\": " << Boolean(window.LoopBox()->isChecked());
     WriteTransport(out, window);

@@ -102,7 +102,7 @@ void Quillex::RefsReceived(const Message& message)
 void Quillex::LoadInto(QuillexWindow* window, const std::filesystem::path& path)
 {
     window->LockWindow();
-    window->SetTo(path);
+    window->OpenFile(path);
     window->UnlockWindow();
 }
 

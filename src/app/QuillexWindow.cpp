@@ -21,6 +21,7 @@
 #include "app/ControlRow.h"
 #include "app/EditCommands.h"
 #include "app/HelpTexts.h"
+#include "app/LoadQueue.h"
 #include "app/MenuBuilder.h"
 #include "app/MenuTable.h"
 #include "app/Quillex.h"
@@ -99,6 +100,8 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
     BubbleHelper::RegisterHelp(GetPlayModeButton(), help::kPlayModeButton);
     BubbleHelper::RegisterHelp(GetStopButton(), help::kStopButton);
 
+    loads_ = std::make_unique<LoadQueue>(*this, windowLock_, containerView_);
+
     playback_ = std::make_unique<PlaybackController>(manager_, this, this);
     playback_->SetUp();
 
@@ -111,6 +114,9 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
 
 QuillexWindow::~QuillexWindow()
 {
+    // A load still running is given up; its worker ends before the document
+    // it would have filled goes.
+    loads_.reset();
     playback_->TearDown();
     playback_.reset();
     // The views point into the document; they go before it does.
@@ -350,7 +356,7 @@ void QuillexWindow::HandleDrop(const Message& message)
     if (message.FindInt32(kFieldModifiers, &modifiers) != B_OK)
         modifiers = int32_t(QGuiApplication::keyboardModifiers().toInt());
     appendOnLoad_ = (modifiers & Qt::ShiftModifier) != 0;
-    SetTo(first);
+    OpenFile(first);
 }
 
 void QuillexWindow::dragEnterEvent(QDragEnterEvent* event)
@@ -376,6 +382,16 @@ void QuillexWindow::dropEvent(QDropEvent* event)
 status_t QuillexWindow::SetTo(const std::filesystem::path& file)
 {
     return DocumentLoader::Load(file, *this);
+}
+
+void QuillexWindow::OpenFile(const std::filesystem::path& file)
+{
+    loads_->Open(file, appendOnLoad_, manager_ != nullptr);
+}
+
+bool QuillexWindow::IsLoading() const
+{
+    return loads_->IsLoading();
 }
 
 status_t QuillexWindow::SaveFile(const std::filesystem::path& file)

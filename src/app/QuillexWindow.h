@@ -30,6 +30,7 @@ class ChannelManager;
 class CopyBuffer;
 class EditCommands;
 class HistoryManager;
+class LoadQueue;
 class MenuBuilder;
 class PlayButton;
 class PlaybackController;
@@ -114,6 +115,14 @@ public:
     /// Loads a sound file: replaces the document's channels, or adds to them
     /// when append on load is set. The result of the reader.
     status_t SetTo(const std::filesystem::path& file);
+    /// SetTo without waiting: the file decodes on a worker thread while the
+    /// window shows how far it got, and the document takes its channels when
+    /// they are complete. Files opened while one loads follow in order, each
+    /// with the append flag of the moment it was opened.
+    void OpenFile(const std::filesystem::path& file);
+    /// Files opened with OpenFile that are not in the document yet.
+    bool IsLoading() const;
+    LoadQueue* Loads() const { return loads_.get(); }
     /// Writes the document as a WAV file and marks the history saved.
     status_t SaveFile(const std::filesystem::path& file);
 
@@ -192,6 +201,7 @@ private:
     /// Playing state, the play mark throttle and the playback graph.
     std::unique_ptr<PlaybackController> playback_;
     bool appendOnLoad_ = false;
+    std::unique_ptr<LoadQueue> loads_;
     /// The transport buttons, the play mode popup, the loop box and the
     /// range fields.
     ControlRow* controls_ = nullptr;

@@ -13,6 +13,7 @@ extern "C" {
 }
 
 #include "files/FFmpegStatus.h"
+#include "files/LoadProgress.h"
 
 namespace glimmet {
 
@@ -72,6 +73,7 @@ status_t MediaDemuxer::Open(const std::filesystem::path& path)
     int error = avio_open2(&io_, url.c_str(), AVIO_FLAG_READ, nullptr, nullptr);
     if (error < 0)
         return StatusFromAVError(error);
+    LoadProgress::PassStarted();
 
     context_ = avformat_alloc_context();
     if (context_ == nullptr)
@@ -153,6 +155,12 @@ bool MediaDemuxer::ReadPacket(int32_t stream, AVPacket* packet)
             continue;
         if (error < 0)
             return false;
+        // A load given up on reads as the end of the file, so whatever pass
+        // is running ends at once.
+        if (!LoadProgress::Report(avio_tell(io_), FileSize())) {
+            av_packet_unref(packet);
+            return false;
+        }
         if (packet->stream_index == stream)
             return true;
         av_packet_unref(packet);

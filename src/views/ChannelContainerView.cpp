@@ -4,6 +4,7 @@
 
 #include <QFontMetricsF>
 #include <QPainter>
+#include <QWheelEvent>
 
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
@@ -14,6 +15,7 @@
 #include "views/PixelCanvas.h"
 #include "views/SampleView.h"
 #include "views/ViewColors.h"
+#include "views/WheelNavigator.h"
 #include "views/ZoomSlider.h"
 
 namespace glimmet {
@@ -485,6 +487,13 @@ void ChannelContainerView::DrawEmptyState(QPainter& painter)
     const qreal baseline = (bounds.top + bottom) / 2;
     painter.setPen(Qt::black);
     painter.drawText(QPointF(x, baseline), text);
+}
+
+void ChannelContainerView::wheelEvent(QWheelEvent* event)
+{
+    const bool ctrl = (event->modifiers() & Qt::ControlModifier) != 0;
+    WheelNavigator(*this).Wheel(event->position(), event->angleDelta(), event->pixelDelta(), ctrl);
+    event->accept();
 }
 
 }  // namespace glimmet

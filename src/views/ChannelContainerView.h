@@ -158,6 +158,8 @@ public:
 protected:
     void paintEvent(QPaintEvent* event) override;
     void resizeEvent(QResizeEvent* event) override;
+    /// Scrolls and zooms through the zoom slider (WheelNavigator).
+    void wheelEvent(QWheelEvent* event) override;
 
 private:
     float Width() const;

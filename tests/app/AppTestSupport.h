@@ -1,7 +1,9 @@
 #pragma once
 
 #include <QCoreApplication>
+#include <QElapsedTimer>
 #include <QEvent>
+#include <QEventLoop>
 #include <QTemporaryDir>
 
 #include <cstdint>
@@ -10,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "app/LoadQueue.h"
 #include "app/Quillex.h"
 #include "app/QuillexWindow.h"
 
@@ -17,13 +20,25 @@ namespace glimmet::test {
 
 /// Delivers everything posted so far, including deferred deletions, until
 /// nothing new turns up.
-inline void Drain()
+inline void DrainPosted()
 {
     for (int round = 0; round < 20; ++round) {
         QCoreApplication::sendPostedEvents();
         QCoreApplication::sendPostedEvents(nullptr, QEvent::DeferredDelete);
         QCoreApplication::processEvents();
     }
+}
+
+/// DrainPosted, and first every file a window was asked to open is put in
+/// its document (windows load on worker threads).
+inline void Drain(int64_t loadLimitMilliseconds = 30000)
+{
+    DrainPosted();
+    QElapsedTimer timer;
+    timer.start();
+    while (LoadQueue::CountInFlight() > 0 && timer.elapsed() < loadLimitMilliseconds)
+        QCoreApplication::processEvents(QEventLoop::WaitForMoreEvents, LoadQueue::kPollMilliseconds);
+    DrainPosted();
 }
 
 /// Records an edit in the window's history that the document has not

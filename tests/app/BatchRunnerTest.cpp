@@ -29,7 +29,7 @@ TEST_F(BatchTest, PrintOfAnEmptyWindowGivesEveryKey)
     ASSERT_EQ(Run("print\n"), BatchRunner::kSucceeded);
     EXPECT_EQ(Output(),
         "{\"title\": \"Glimmet\", \"frames\": 0, \"range\": [-1, -1], \"cursor\": 0, \"playmark\": -1, "
-        "\"display\": [0, -1], \"playmode\": \"all\", \"loop\": true, "
+        "\"display\": [0, -1], \"slider\": [0, 0], \"playmode\": \"all\", \"loop\": true, "
         "\"transport\": {\"play mode\": 1, \"play\": 0, \"enabled\": true}, \"undo\": null, \"redo\": null, "
         "\"saved\": true, \"channels\": []}\n");
     EXPECT_EQ(Errors(), "");

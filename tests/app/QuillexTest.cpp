@@ -55,6 +55,7 @@ TEST(Quillex, TwoValidPathsAndOneInvalidGiveTwoLoadedWindows)
         QString::fromStdString((fixture.Dir() / "nowhere" / "missing.wav").string()),
         QString::fromStdString(second.string())});
     fixture.App().ReadyToRun();
+    Drain();
     ASSERT_EQ(fixture.App().CountWindows(), 2);
     EXPECT_EQ(Title(fixture.App().WindowAt(0)), "Glimmet - first.wav");
     EXPECT_EQ(Title(fixture.App().WindowAt(1)), "Glimmet - second.wav");
@@ -70,6 +71,7 @@ TEST(Quillex, RelativeArgumentsAreResolved)
     std::filesystem::current_path(fixture.Dir());
     fixture.App().ArgvReceived({"glimmet", "relative.wav"});
     std::filesystem::current_path(previous);
+    Drain();
     ASSERT_EQ(fixture.App().CountWindows(), 1);
     EXPECT_EQ(fixture.App().WindowAt(0)->FileEntry(), file);
 }
