@@ -67,10 +67,17 @@ void SampleView::resizeEvent(QResizeEvent* event)
         FrameResized(Bounds().Width(), Bounds().Height());
 }
 
+// A layout that keeps the size keeps the image and its row table: only the
+// columns whose frames changed with the layout are rendered again.
 void SampleView::FrameResized(float width, float height)
 {
     const int columns = PixelCanvas::RoundToPixel(width) + 1;
     const int rows = PixelCanvas::RoundToPixel(height) + 1;
+    if (!bitmap_.isNull() && bitmap_.width() == columns && bitmap_.height() == rows) {
+        Update(Bounds());
+        return;
+    }
+    drawn_.clear();
     if (columns > 0 && rows > 0)
         bitmap_ = QImage(columns, rows, QImage::Format_RGB32);
     else
@@ -96,6 +103,7 @@ int32_t SampleView::RowOf(int16_t sample) const
 
 void SampleView::Update()
 {
+    drawn_.clear();
     Update(Bounds());
 }
 
@@ -119,26 +127,40 @@ void SampleView::Update(ViewRect rect)
     if (rect.bottom < bounds.top)
         return;
 
-    if (!bitmap_.isNull()) {
-        WaveformScene scene;
-        scene.firstFrame = container_->FirstDisplayedFrame();
-        scene.lastFrame = container_->LastDisplayedFrame();
-        scene.rangeStart = container_->RangeStart();
-        scene.rangeEnd = container_->RangeEnd();
-        scene.cursorFrame = container_->CursorFrame();
-        scene.playmarkFrame = container_->PlaymarkFrame();
-        scene.selected = channel_->IsSelected();
-        scene.channelFirstFrame = channel_->FirstFrame();
-        scene.channelFrameCount = channel_->FrameCount();
-        scene.samples = channel_->Data();
-        scene.framesPerColumn = float(scene.lastFrame - scene.firstFrame + 1) / (bounds.Width() + 1);
-        const int32_t rows = int32_t(bounds.Height() + 1);
-        WaveformRenderer renderer(bitmap_, rowTable_.data(), rows, scene);
-        renderer.RenderColumns(rect.left, int32_t(rect.right - rect.left + 1));
-    }
+    if (!bitmap_.isNull())
+        RenderColumns(rect);
     const int left = int(std::floor(rect.left));
     const int top = int(std::floor(rect.top));
     update(QRect(QPoint(left, top), QPoint(int(std::ceil(rect.right)), int(std::ceil(rect.bottom)))));
+}
+
+void SampleView::RenderColumns(const ViewRect& rect)
+{
+    const ViewRect bounds = Bounds();
+    WaveformScene scene;
+    scene.firstFrame = container_->FirstDisplayedFrame();
+    scene.lastFrame = container_->LastDisplayedFrame();
+    scene.rangeStart = container_->RangeStart();
+    scene.rangeEnd = container_->RangeEnd();
+    scene.cursorFrame = container_->CursorFrame();
+    scene.playmarkFrame = container_->PlaymarkFrame();
+    scene.selected = channel_->IsSelected();
+    scene.channelFirstFrame = channel_->FirstFrame();
+    scene.channelFrameCount = channel_->FrameCount();
+    // The whole array as one span without a block: shaded from the samples.
+    const SampleSpan whole{channel_->Data(), channel_->FrameCount(), nullptr, 0};
+    if (whole.samples != nullptr)
+        scene.spans = std::span<const SampleSpan>(&whole, 1);
+    scene.framesPerColumn = float(scene.lastFrame - scene.firstFrame + 1) / (bounds.Width() + 1);
+
+    const Source source{whole.samples, scene.channelFrameCount, scene.channelFirstFrame};
+    if (source != drawnFrom_) {
+        drawn_.clear();
+        drawnFrom_ = source;
+    }
+    const int32_t rows = int32_t(bounds.Height() + 1);
+    WaveformRenderer renderer(bitmap_, rowTable_.data(), rows, scene);
+    renderedColumns_ += renderer.RenderColumns(rect.left, int32_t(rect.right - rect.left + 1), &drawn_);
 }
 
 bool SampleView::IsFocus() const

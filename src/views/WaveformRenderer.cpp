@@ -29,9 +29,16 @@ inline uint8_t Rise(int64_t k, int64_t count, int64_t total)
 
 WaveformRenderer::WaveformRenderer(QImage& image, const int16_t* rowTable, int32_t rows, const WaveformScene& scene)
     : image_(image), rowTable_(rowTable), rows_(std::min(rows, image.height())), scene_(scene),
-      histogram_(size_t(std::max(rows, image.height()) + 1), 0),
+      histogram_(size_t(std::max(rows, image.height()) + 1), 0), counter_(rowTable, uint32_t(histogram_.size())),
       pixels_(image.isNull() ? nullptr : image.bits()), stride_(image.bytesPerLine())
 {
+    int64_t start = 0;
+    spanStarts_.reserve(scene_.spans.size());
+    for (const SampleSpan& span : scene_.spans) {
+        spanStarts_.push_back(start);
+        start += std::max<int64_t>(span.count, 0);
+    }
+    dataCount_ = std::min(start, scene_.channelFrameCount);
 }
 
 // One detach for the whole render instead of one per pixel.
@@ -40,10 +47,13 @@ QRgb& WaveformRenderer::PixelAt(int32_t column, int32_t row)
     return reinterpret_cast<QRgb*>(pixels_ + ptrdiff_t(row) * stride_)[column];
 }
 
-void WaveformRenderer::RenderColumns(float left, int32_t count)
+int32_t WaveformRenderer::RenderColumns(float left, int32_t count, std::vector<RenderedColumn>* memo)
 {
     if (rows_ <= 0 || pixels_ == nullptr)
-        return;
+        return 0;
+    if (memo != nullptr && memo->size() != size_t(image_.width()))
+        memo->assign(size_t(image_.width()), RenderedColumn{});
+    int32_t rendered = 0;
     const float fpc = scene_.framesPerColumn;
     for (int32_t k = 0; k < count; ++k) {
         const float x = left + float(k);
@@ -53,11 +63,30 @@ void WaveformRenderer::RenderColumns(float left, int32_t count)
         const int64_t f0 = TruncateToFrame(fpc * x) + scene_.firstFrame;
         const int64_t f1 = TruncateToFrame(x * fpc + fpc) + scene_.firstFrame - 1;
         const ColumnState state = StateOf(f0, f1);
+        if (Unchanged(memo, column, f0, f1, state))
+            continue;
         if (IsOutsideData(f0, f1))
             FillColumn(column, state);
         else
             RenderDataColumn(column, f0, f1, state);
+        ++rendered;
     }
+    return rendered;
+}
+
+// A column's pixels follow from its frames and its state alone, as long as
+// the data and the height stay the same; whoever owns the memo clears it
+// when they do not.
+bool WaveformRenderer::Unchanged(std::vector<RenderedColumn>* memo, int32_t column, int64_t f0, int64_t f1,
+                                 ColumnState state) const
+{
+    if (memo == nullptr)
+        return false;
+    RenderedColumn& drawn = (*memo)[size_t(column)];
+    if (drawn.state == state.Bits() && drawn.firstFrame == f0 && drawn.lastFrame == f1)
+        return true;
+    drawn = RenderedColumn{f0, f1, state.Bits()};
+    return false;
 }
 
 // A column holding the range's end but reaching past it is deliberately not
@@ -77,7 +106,8 @@ bool WaveformRenderer::IsOutsideData(int64_t f0, int64_t f1) const
 {
     const int64_t first = scene_.channelFirstFrame;
     const int64_t count = scene_.channelFrameCount;
-    return f0 - first < 0 || f0 - first >= count || f1 - first >= count || f1 < f0 || scene_.samples == nullptr;
+    // Frames the spans do not hold are shown as outside the data, never read.
+    return f0 - first < 0 || f0 - first >= count || f1 - first >= count || f1 < f0 || f1 - first >= dataCount_;
 }
 
 void WaveformRenderer::FillColumn(int32_t column, ColumnState state)
@@ -113,34 +143,21 @@ void WaveformRenderer::RenderDataColumn(int32_t column, int64_t f0, int64_t f1, 
         count += histogram_[size_t(row)];
         ShadeRow(column, row, count, total, state, false);
     }
-    std::fill(histogram_.begin(), histogram_.end(), uint16_t(0));
 }
 
-// Four interleaved partial counts keep consecutive samples of the same row
-// from waiting on each other; their 16-bit sum is exactly what one wrapping
-// 16-bit counter per row would hold.
+// The column's frames, span by span.
 void WaveformRenderer::CountSamples(int64_t f0, int64_t f1)
 {
-    const int16_t* sample = scene_.samples + (f0 - scene_.channelFirstFrame);
-    const int64_t count = f1 - f0 + 1;
-    const size_t rowSlots = histogram_.size();
-    const size_t lastSlot = rowSlots - 1;
-    partials_.assign(4 * rowSlots, 0);
-    uint32_t* partial = partials_.data();
-    const auto slotOf = [&](int16_t value) {
-        return std::min(size_t(rowTable_[(int32_t(value) + 32768) >> 3]), lastSlot);
-    };
-    int64_t i = 0;
-    for (; i + 4 <= count; i += 4) {
-        ++partial[slotOf(sample[i])];
-        ++partial[rowSlots + slotOf(sample[i + 1])];
-        ++partial[2 * rowSlots + slotOf(sample[i + 2])];
-        ++partial[3 * rowSlots + slotOf(sample[i + 3])];
+    const int64_t from = f0 - scene_.channelFirstFrame;
+    const int64_t to = f1 - scene_.channelFirstFrame + 1;
+    counter_.Clear();
+    auto next = std::upper_bound(spanStarts_.begin(), spanStarts_.end(), from);
+    size_t index = size_t(next - spanStarts_.begin()) - 1;
+    for (; index < spanStarts_.size() && spanStarts_[index] < to; ++index) {
+        const int64_t start = spanStarts_[index];
+        counter_.Add(scene_.spans[index], std::max(from, start) - start, to - start);
     }
-    for (; i < count; ++i)
-        ++partial[slotOf(sample[i])];
-    for (size_t row = 0; row < rowSlots; ++row)
-        histogram_[row] = uint16_t(partial[row] + partial[rowSlots + row] + partial[2 * rowSlots + row] + partial[3 * rowSlots + row]);
+    counter_.Finish(histogram_.data());
 }
 
 void WaveformRenderer::ShadeRow(int32_t column, int32_t row, int64_t count, int64_t total, ColumnState state,
