@@ -1,6 +1,7 @@
 #include "views/BlockSummary.h"
 
 #include <algorithm>
+#include <utility>
 #include <new>
 
 namespace glimmet {
@@ -13,6 +14,17 @@ constexpr int32_t kLargestChunkShift = 24;
 inline int32_t IndexOf(int16_t sample)
 {
     return (int32_t(sample) + 32768) >> 3;
+}
+
+std::pair<int16_t, int16_t> Extremes(const int16_t* samples, int64_t count)
+{
+    int16_t smallest = samples[0];
+    int16_t largest = samples[0];
+    for (int64_t i = 1; i < count; ++i) {
+        smallest = std::min(smallest, samples[i]);
+        largest = std::max(largest, samples[i]);
+    }
+    return {smallest, largest};
 }
 
 }  // namespace
@@ -40,10 +52,10 @@ std::shared_ptr<const BlockSummary> BlockSummary::Make(const int16_t* samples, i
 
     // The rows the block reaches: those of the table entries between its
     // smallest and largest sample (the table need not be monotonic).
-    const auto [smallest, largest] = std::minmax_element(samples, samples + count);
-    int32_t low = rowTable[IndexOf(*smallest)];
+    const auto [smallest, largest] = Extremes(samples, count);
+    int32_t low = rowTable[IndexOf(smallest)];
     int32_t high = low;
-    for (int32_t i = IndexOf(*smallest); i <= IndexOf(*largest); ++i) {
+    for (int32_t i = IndexOf(smallest); i <= IndexOf(largest); ++i) {
         low = std::min(low, int32_t(rowTable[i]));
         high = std::max(high, int32_t(rowTable[i]));
     }
@@ -69,16 +81,32 @@ std::shared_ptr<const BlockSummary> BlockSummary::Make(const int16_t* samples, i
 }
 
 // Boundary 0 stays all zero; boundary j + 1 is boundary j plus chunk j.
+// Four interleaved sets of running counts keep consecutive samples of the
+// same row from waiting on each other; a boundary holds their sum.
 void BlockSummary::CountChunks(const int16_t* samples, const int16_t* rowTable)
 {
     const int64_t chunkSize = ChunkSize();
     const size_t span = size_t(rowSpan_);
-    std::vector<uint16_t> running(span, 0);
+    std::vector<uint32_t> running(4 * span, 0);
+    uint32_t* first = running.data();
+    uint32_t* second = first + span;
+    uint32_t* third = second + span;
+    uint32_t* fourth = third + span;
+    const int16_t* rows = rowTable;
+    const int32_t low = lowRow_;
+    const auto slotOf = [rows, low](int16_t sample) { return size_t(rows[IndexOf(sample)] - low); };
     for (int64_t chunk = 0; chunk < chunks_; ++chunk) {
         const int16_t* sample = samples + chunk * chunkSize;
-        for (int64_t i = 0; i < chunkSize; ++i)
-            ++running[size_t(rowTable[IndexOf(sample[i])] - lowRow_)];
-        std::copy(running.begin(), running.end(), running_.begin() + std::ptrdiff_t(size_t(chunk + 1) * span));
+        // Chunks hold a multiple of four samples.
+        for (int64_t i = 0; i < chunkSize; i += 4) {
+            ++first[slotOf(sample[i])];
+            ++second[slotOf(sample[i + 1])];
+            ++third[slotOf(sample[i + 2])];
+            ++fourth[slotOf(sample[i + 3])];
+        }
+        uint16_t* boundary = running_.data() + size_t(chunk + 1) * span;
+        for (size_t row = 0; row < span; ++row)
+            boundary[row] = uint16_t(first[row] + second[row] + third[row] + fourth[row]);
     }
 }
 

@@ -14,18 +14,35 @@ constexpr QRgb kEmptyCursor = qRgb(0, 0, 220);
 constexpr QRgb kEmptyInRange = qRgb(50, 50, 50);
 constexpr QRgb kEmptyPlain = qRgb(80, 80, 80);
 
-// k - k * count / total in byte arithmetic.
-inline uint8_t Fade(int64_t k, int64_t count, int64_t total)
-{
-    return uint8_t(k - (k * count) / total);
-}
-
-inline uint8_t Rise(int64_t k, int64_t count, int64_t total)
-{
-    return uint8_t((k * count) / total);
-}
-
 }  // namespace
+
+// k * count / total for every row of a column. A 64-bit division per pixel
+// would cost more than counting the column's samples from a summary, so the
+// quotient is estimated with the column's reciprocal and then corrected to
+// the exact integer quotient. Dividends stay far below 2^53 (a byte value
+// times at most 65535 samples per row), so nothing overflows.
+class ColumnQuotients {
+public:
+    explicit ColumnQuotients(int64_t total) : total_(total), reciprocal_(1.0 / double(total)) {}
+
+    int64_t Of(int64_t dividend) const
+    {
+        int64_t quotient = int64_t(double(dividend) * reciprocal_);
+        while (quotient > 0 && quotient * total_ > dividend)
+            --quotient;
+        while ((quotient + 1) * total_ <= dividend)
+            ++quotient;
+        return quotient;
+    }
+
+    // k - k * count / total in byte arithmetic.
+    uint8_t Fade(int64_t k, int64_t count) const { return uint8_t(k - Of(k * count)); }
+    uint8_t Rise(int64_t k, int64_t count) const { return uint8_t(Of(k * count)); }
+
+private:
+    int64_t total_;
+    double reciprocal_;
+};
 
 WaveformRenderer::WaveformRenderer(QImage& image, const int16_t* rowTable, int32_t rows, const WaveformScene& scene)
     : image_(image), rowTable_(rowTable), rows_(std::min(rows, image.height())), scene_(scene),
@@ -131,7 +148,7 @@ void WaveformRenderer::FillColumn(int32_t column, ColumnState state)
 void WaveformRenderer::RenderDataColumn(int32_t column, int64_t f0, int64_t f1, ColumnState state)
 {
     CountSamples(f0, f1);
-    const int64_t total = f1 - f0 + 1;
+    const ColumnQuotients total(f1 - f0 + 1);
     const int32_t half = rows_ / 2;
     int64_t count = 0;
     for (int32_t row = rows_ - 1; row >= half; --row) {
@@ -160,28 +177,28 @@ void WaveformRenderer::CountSamples(int64_t f0, int64_t f1)
     counter_.Finish(histogram_.data());
 }
 
-void WaveformRenderer::ShadeRow(int32_t column, int32_t row, int64_t count, int64_t total, ColumnState state,
-                                bool lowerPass)
+void WaveformRenderer::ShadeRow(int32_t column, int32_t row, int64_t count, const ColumnQuotients& total,
+                                ColumnState state, bool lowerPass)
 {
     uint8_t red;
     uint8_t green;
     uint8_t blue;
     if (state.cursor && state.playmark) {
-        red = Fade(45, count, total);
-        green = Fade(245, count, total);
-        blue = Fade(255, count, total);
+        red = total.Fade(45, count);
+        green = total.Fade(245, count);
+        blue = total.Fade(255, count);
     } else if (state.playmark) {
-        red = Fade(45, count, total);
-        green = lowerPass ? Fade(245, count, total) : Fade(255, count, total);
-        blue = Fade(45, count, total);
+        red = total.Fade(45, count);
+        green = lowerPass ? total.Fade(245, count) : total.Fade(255, count);
+        blue = total.Fade(45, count);
     } else if (state.cursor) {
-        red = Fade(45, count, total);
-        green = Fade(45, count, total);
-        blue = Fade(255, count, total);
+        red = total.Fade(45, count);
+        green = total.Fade(45, count);
+        blue = total.Fade(255, count);
     } else if (state.inRange) {
-        red = green = blue = Rise(255, count, total);
+        red = green = blue = total.Rise(255, count);
     } else {
-        red = green = blue = Fade(245, count, total);
+        red = green = blue = total.Fade(245, count);
     }
     PixelAt(column, row) = qRgb(red, green, blue);
 }

@@ -11,6 +11,8 @@
 
 namespace glimmet {
 
+class ColumnQuotients;
+
 /// What one render of a channel's columns needs to know: the container's
 /// display range, range, cursor and play mark, and the channel's data.
 struct WaveformScene {
@@ -74,7 +76,8 @@ private:
     void CountSamples(int64_t f0, int64_t f1);
     bool Unchanged(std::vector<RenderedColumn>* memo, int32_t column, int64_t f0, int64_t f1, ColumnState state) const;
     QRgb& PixelAt(int32_t column, int32_t row);
-    void ShadeRow(int32_t column, int32_t row, int64_t count, int64_t total, ColumnState state, bool lowerPass);
+    void ShadeRow(int32_t column, int32_t row, int64_t count, const ColumnQuotients& total, ColumnState state,
+                  bool lowerPass);
 
     QImage& image_;
     const int16_t* rowTable_;

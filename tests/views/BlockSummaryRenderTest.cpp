@@ -158,8 +158,8 @@ TEST(BlockSummaryRender, RandomViewsMatchRenderingTheSamples)
     std::mt19937 random(20261123);
     int64_t summariesMade = 0;
     int compared = 0;
-    for (int trial = 0; trial < 2500; ++trial) {
-        const int64_t count = random() % 10 == 0 ? 70000 + int64_t(random() % 300000) : int64_t(random() % 40000);
+    for (int trial = 0; trial < 2000; ++trial) {
+        const int64_t count = random() % 10 == 0 ? 70000 + int64_t(random() % 200000) : int64_t(random() % 40000);
         BlockChannel channel;
         channel.samples = RandomSamples(random, count);
         channel.Cut(RandomBlockSizes(random, count), random);
@@ -178,7 +178,7 @@ TEST(BlockSummaryRender, RandomViewsMatchRenderingTheSamples)
             ++compared;
         }
     }
-    EXPECT_EQ(compared, 7500);
+    EXPECT_EQ(compared, 6000);
     // The summaries must have been in play, or the test shows nothing.
     EXPECT_GT(summariesMade, 2000);
 }
