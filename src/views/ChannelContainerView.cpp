@@ -287,8 +287,9 @@ void ChannelContainerView::SelectAll()
         for (int32_t i = 0; i < manager_->CountChannels(); ++i)
             manager_->ChannelAt(i)->SetSelected(true);
     }
+    // Only the columns whose range state changed are rendered again.
     for (SampleView* view : sampleViews_)
-        view->Update();
+        view->Update(view->Bounds());
 }
 
 void ChannelContainerView::DeselectAll()
@@ -310,7 +311,7 @@ void ChannelContainerView::RangeChanged()
 {
     for (SampleView* view : sampleViews_) {
         if (view->GetChannel() != nullptr && view->GetChannel()->IsSelected())
-            view->Update();
+            view->Update(view->Bounds());
     }
 }
 

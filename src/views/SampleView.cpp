@@ -67,10 +67,17 @@ void SampleView::resizeEvent(QResizeEvent* event)
         FrameResized(Bounds().Width(), Bounds().Height());
 }
 
+// A layout that keeps the size keeps the image and its row table: only the
+// columns whose frames changed with the layout are rendered again.
 void SampleView::FrameResized(float width, float height)
 {
     const int columns = PixelCanvas::RoundToPixel(width) + 1;
     const int rows = PixelCanvas::RoundToPixel(height) + 1;
+    if (!bitmap_.isNull() && bitmap_.width() == columns && bitmap_.height() == rows) {
+        Update(Bounds());
+        return;
+    }
+    drawn_.clear();
     if (columns > 0 && rows > 0)
         bitmap_ = QImage(columns, rows, QImage::Format_RGB32);
     else
@@ -96,6 +103,7 @@ int32_t SampleView::RowOf(int16_t sample) const
 
 void SampleView::Update()
 {
+    drawn_.clear();
     Update(Bounds());
 }
 
@@ -119,27 +127,46 @@ void SampleView::Update(ViewRect rect)
     if (rect.bottom < bounds.top)
         return;
 
-    if (!bitmap_.isNull()) {
-        WaveformScene scene;
-        scene.firstFrame = container_->FirstDisplayedFrame();
-        scene.lastFrame = container_->LastDisplayedFrame();
-        scene.rangeStart = container_->RangeStart();
-        scene.rangeEnd = container_->RangeEnd();
-        scene.cursorFrame = container_->CursorFrame();
-        scene.playmarkFrame = container_->PlaymarkFrame();
-        scene.selected = channel_->IsSelected();
-        scene.channelFirstFrame = channel_->FirstFrame();
-        scene.channelFrameCount = channel_->FrameCount();
-        channel_->ReadSpans(0, scene.channelFrameCount,
-            [&scene](const SampleSpan& span) { scene.spans.push_back(span); });
-        scene.framesPerColumn = float(scene.lastFrame - scene.firstFrame + 1) / (bounds.Width() + 1);
-        const int32_t rows = int32_t(bounds.Height() + 1);
-        WaveformRenderer renderer(bitmap_, rowTable_.data(), rows, scene);
-        renderer.RenderColumns(rect.left, int32_t(rect.right - rect.left + 1));
-    }
+    if (!bitmap_.isNull())
+        RenderColumns(rect);
     const int left = int(std::floor(rect.left));
     const int top = int(std::floor(rect.top));
     update(QRect(QPoint(left, top), QPoint(int(std::ceil(rect.right)), int(std::ceil(rect.bottom)))));
+}
+
+void SampleView::RenderColumns(const ViewRect& rect)
+{
+    const ViewRect bounds = Bounds();
+    WaveformScene scene;
+    scene.firstFrame = container_->FirstDisplayedFrame();
+    scene.lastFrame = container_->LastDisplayedFrame();
+    scene.rangeStart = container_->RangeStart();
+    scene.rangeEnd = container_->RangeEnd();
+    scene.cursorFrame = container_->CursorFrame();
+    scene.playmarkFrame = container_->PlaymarkFrame();
+    scene.selected = channel_->IsSelected();
+    scene.channelFirstFrame = channel_->FirstFrame();
+    scene.channelFrameCount = channel_->FrameCount();
+    // The channel's blocks as they stand; renders run in the window's
+    // thread, as edits do, so the blocks stay while the columns are drawn.
+    spans_.clear();
+    channel_->ReadSpans(0, scene.channelFrameCount, [this](const SampleSpan& span) { spans_.push_back(span); });
+    scene.spans = std::span<const SampleSpan>(spans_);
+    scene.framesPerColumn = float(scene.lastFrame - scene.firstFrame + 1) / (bounds.Width() + 1);
+
+    // Any edit makes new blocks or moves the data: the columns drawn from
+    // the old ones are all rendered again.
+    Source source{{}, scene.channelFrameCount, scene.channelFirstFrame};
+    source.pieces.reserve(spans_.size());
+    for (const SampleSpan& span : spans_)
+        source.pieces.push_back({span.block != nullptr ? span.block->Id() : 0, span.offset, span.count});
+    if (source != drawnFrom_) {
+        drawn_.clear();
+        drawnFrom_ = std::move(source);
+    }
+    const int32_t rows = int32_t(bounds.Height() + 1);
+    WaveformRenderer renderer(bitmap_, rowTable_.data(), rows, scene);
+    renderedColumns_ += renderer.RenderColumns(rect.left, int32_t(rect.right - rect.left + 1), &drawn_);
 }
 
 bool SampleView::IsFocus() const

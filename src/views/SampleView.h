@@ -2,10 +2,12 @@
 
 #include <array>
 #include <cstdint>
+#include <vector>
 
 #include <QImage>
 
 #include "views/MessageView.h"
+#include "views/WaveformRenderer.h"
 
 namespace glimmet {
 
@@ -43,11 +45,18 @@ public:
     /// Rebuilds the bitmap and the row table for the size, then re-renders.
     void FrameResized(float width, float height);
 
-    /// Re-renders the whole view.
+    /// Re-renders the whole view: for changed data or display range.
     void Update();
-    /// Re-renders the columns of rect (always over the full height) and
-    /// schedules a repaint of it.
+    /// Brings the columns of rect up to date (always over the full height)
+    /// and schedules a repaint of it. The image is kept between renders, so
+    /// only columns whose frames, range, cursor or play mark state changed
+    /// since they were last rendered are rendered again; a change of the
+    /// channel's data, first frame or of the view's size renders them all.
     void Update(ViewRect rect);
+
+    /// Columns rendered since the view was made: lets tests see that an
+    /// update rendered only what changed.
+    int64_t RenderedColumns() const { return renderedColumns_; }
     bool IsFocus() const;
 
     /// The off-screen image: one pixel per view pixel, null when it could not
@@ -80,6 +89,7 @@ private:
     static constexpr int kRowTableSize = 8192;
 
     void BuildRowTable(int32_t rows);
+    void RenderColumns(const ViewRect& rect);
     /// The key as one character of the original key map (arrows 0x1c to
     /// 0x1f, Delete 0x7f); 0 for a key that produces no character.
     static int KeyByte(const QKeyEvent* event);
@@ -95,6 +105,24 @@ private:
     int64_t lastKeyDown_;
     std::array<int16_t, kRowTableSize> rowTable_{};
     Clock clock_;
+    // What each column of the image shows, and what the whole image was
+    // rendered from; a column is rendered again only when either changes.
+    std::vector<RenderedColumn> drawn_;
+    struct Piece {
+        uint64_t block = 0;
+        int64_t offset = 0;
+        int64_t count = 0;
+        bool operator==(const Piece&) const = default;
+    };
+    struct Source {
+        std::vector<Piece> pieces;
+        int64_t frameCount = 0;
+        int64_t firstFrame = 0;
+        bool operator==(const Source&) const = default;
+    };
+    Source drawnFrom_;
+    std::vector<SampleSpan> spans_;  // the last render's, kept for its capacity
+    int64_t renderedColumns_ = 0;
     bool inLayout_ = false;
     // A press was handled and its release has not come yet.
     bool pressHandled_ = false;

@@ -14,24 +14,48 @@ constexpr QRgb kEmptyCursor = qRgb(0, 0, 220);
 constexpr QRgb kEmptyInRange = qRgb(50, 50, 50);
 constexpr QRgb kEmptyPlain = qRgb(80, 80, 80);
 
-// k - k * count / total in byte arithmetic.
-inline uint8_t Fade(int64_t k, int64_t count, int64_t total)
-{
-    return uint8_t(k - (k * count) / total);
-}
-
-inline uint8_t Rise(int64_t k, int64_t count, int64_t total)
-{
-    return uint8_t((k * count) / total);
-}
-
 }  // namespace
+
+// k * count / total for every row of a column. A 64-bit division per pixel
+// would cost more than counting the column's samples from a summary, so the
+// quotient is estimated with the column's reciprocal and then corrected to
+// the exact integer quotient. Dividends stay far below 2^53 (a byte value
+// times at most 65535 samples per row), so nothing overflows.
+class ColumnQuotients {
+public:
+    explicit ColumnQuotients(int64_t total) : total_(total), reciprocal_(1.0 / double(total)) {}
+
+    int64_t Of(int64_t dividend) const
+    {
+        int64_t quotient = int64_t(double(dividend) * reciprocal_);
+        while (quotient > 0 && quotient * total_ > dividend)
+            --quotient;
+        while ((quotient + 1) * total_ <= dividend)
+            ++quotient;
+        return quotient;
+    }
+
+    // k - k * count / total in byte arithmetic.
+    uint8_t Fade(int64_t k, int64_t count) const { return uint8_t(k - Of(k * count)); }
+    uint8_t Rise(int64_t k, int64_t count) const { return uint8_t(Of(k * count)); }
+
+private:
+    int64_t total_;
+    double reciprocal_;
+};
 
 WaveformRenderer::WaveformRenderer(QImage& image, const int16_t* rowTable, int32_t rows, const WaveformScene& scene)
     : image_(image), rowTable_(rowTable), rows_(std::min(rows, image.height())), scene_(scene),
-      histogram_(size_t(std::max(rows, image.height()) + 1), 0),
+      histogram_(size_t(std::max(rows, image.height()) + 1), 0), counter_(rowTable, uint32_t(histogram_.size())),
       pixels_(image.isNull() ? nullptr : image.bits()), stride_(image.bytesPerLine())
 {
+    int64_t start = 0;
+    spanStarts_.reserve(scene_.spans.size());
+    for (const SampleSpan& span : scene_.spans) {
+        spanStarts_.push_back(start);
+        start += std::max<int64_t>(span.count, 0);
+    }
+    dataCount_ = std::min(start, scene_.channelFrameCount);
 }
 
 // One detach for the whole render instead of one per pixel.
@@ -40,10 +64,13 @@ QRgb& WaveformRenderer::PixelAt(int32_t column, int32_t row)
     return reinterpret_cast<QRgb*>(pixels_ + ptrdiff_t(row) * stride_)[column];
 }
 
-void WaveformRenderer::RenderColumns(float left, int32_t count)
+int32_t WaveformRenderer::RenderColumns(float left, int32_t count, std::vector<RenderedColumn>* memo)
 {
     if (rows_ <= 0 || pixels_ == nullptr)
-        return;
+        return 0;
+    if (memo != nullptr && memo->size() != size_t(image_.width()))
+        memo->assign(size_t(image_.width()), RenderedColumn{});
+    int32_t rendered = 0;
     const float fpc = scene_.framesPerColumn;
     for (int32_t k = 0; k < count; ++k) {
         const float x = left + float(k);
@@ -53,11 +80,30 @@ void WaveformRenderer::RenderColumns(float left, int32_t count)
         const int64_t f0 = TruncateToFrame(fpc * x) + scene_.firstFrame;
         const int64_t f1 = TruncateToFrame(x * fpc + fpc) + scene_.firstFrame - 1;
         const ColumnState state = StateOf(f0, f1);
+        if (Unchanged(memo, column, f0, f1, state))
+            continue;
         if (IsOutsideData(f0, f1))
             FillColumn(column, state);
         else
             RenderDataColumn(column, f0, f1, state);
+        ++rendered;
     }
+    return rendered;
+}
+
+// A column's pixels follow from its frames and its state alone, as long as
+// the data and the height stay the same; whoever owns the memo clears it
+// when they do not.
+bool WaveformRenderer::Unchanged(std::vector<RenderedColumn>* memo, int32_t column, int64_t f0, int64_t f1,
+                                 ColumnState state) const
+{
+    if (memo == nullptr)
+        return false;
+    RenderedColumn& drawn = (*memo)[size_t(column)];
+    if (drawn.state == state.Bits() && drawn.firstFrame == f0 && drawn.lastFrame == f1)
+        return true;
+    drawn = RenderedColumn{f0, f1, state.Bits()};
+    return false;
 }
 
 // A column holding the range's end but reaching past it is deliberately not
@@ -77,7 +123,8 @@ bool WaveformRenderer::IsOutsideData(int64_t f0, int64_t f1) const
 {
     const int64_t first = scene_.channelFirstFrame;
     const int64_t count = scene_.channelFrameCount;
-    return f0 - first < 0 || f0 - first >= count || f1 - first >= count || f1 < f0 || scene_.spans.empty();
+    // Frames the spans do not hold are shown as outside the data, never read.
+    return f0 - first < 0 || f0 - first >= count || f1 - first >= count || f1 < f0 || f1 - first >= dataCount_;
 }
 
 void WaveformRenderer::FillColumn(int32_t column, ColumnState state)
@@ -101,7 +148,7 @@ void WaveformRenderer::FillColumn(int32_t column, ColumnState state)
 void WaveformRenderer::RenderDataColumn(int32_t column, int64_t f0, int64_t f1, ColumnState state)
 {
     CountSamples(f0, f1);
-    const int64_t total = f1 - f0 + 1;
+    const ColumnQuotients total(f1 - f0 + 1);
     const int32_t half = rows_ / 2;
     int64_t count = 0;
     for (int32_t row = rows_ - 1; row >= half; --row) {
@@ -113,72 +160,45 @@ void WaveformRenderer::RenderDataColumn(int32_t column, int64_t f0, int64_t f1, 
         count += histogram_[size_t(row)];
         ShadeRow(column, row, count, total, state, false);
     }
-    std::fill(histogram_.begin(), histogram_.end(), uint16_t(0));
 }
 
-// Four interleaved partial counts keep consecutive samples of the same row
-// from waiting on each other; their 16-bit sum is exactly what one wrapping
-// 16-bit counter per row would hold.
+// The column's frames, span by span.
 void WaveformRenderer::CountSamples(int64_t f0, int64_t f1)
 {
-    const size_t rowSlots = histogram_.size();
-    const size_t lastSlot = rowSlots - 1;
-    partials_.assign(4 * rowSlots, 0);
-    uint32_t* partial = partials_.data();
-    const auto slotOf = [&](int16_t value) {
-        return std::min(size_t(rowTable_[(int32_t(value) + 32768) >> 3]), lastSlot);
-    };
-    // The column's samples may lie in several blocks; which partial counts
-    // a sample does not matter to the sum.
-    int64_t index = f0 - scene_.channelFirstFrame;
-    int64_t remaining = f1 - f0 + 1;
-    for (const SampleSpan& span : scene_.spans) {
-        if (remaining <= 0)
-            break;
-        if (index >= span.count) {
-            index -= span.count;
-            continue;
-        }
-        const int16_t* sample = span.samples + index;
-        const int64_t count = std::min(span.count - index, remaining);
-        index = 0;
-        remaining -= count;
-        int64_t i = 0;
-        for (; i + 4 <= count; i += 4) {
-            ++partial[slotOf(sample[i])];
-            ++partial[rowSlots + slotOf(sample[i + 1])];
-            ++partial[2 * rowSlots + slotOf(sample[i + 2])];
-            ++partial[3 * rowSlots + slotOf(sample[i + 3])];
-        }
-        for (; i < count; ++i)
-            ++partial[slotOf(sample[i])];
+    const int64_t from = f0 - scene_.channelFirstFrame;
+    const int64_t to = f1 - scene_.channelFirstFrame + 1;
+    counter_.Clear();
+    auto next = std::upper_bound(spanStarts_.begin(), spanStarts_.end(), from);
+    size_t index = size_t(next - spanStarts_.begin()) - 1;
+    for (; index < spanStarts_.size() && spanStarts_[index] < to; ++index) {
+        const int64_t start = spanStarts_[index];
+        counter_.Add(scene_.spans[index], std::max(from, start) - start, to - start);
     }
-    for (size_t row = 0; row < rowSlots; ++row)
-        histogram_[row] = uint16_t(partial[row] + partial[rowSlots + row] + partial[2 * rowSlots + row] + partial[3 * rowSlots + row]);
+    counter_.Finish(histogram_.data());
 }
 
-void WaveformRenderer::ShadeRow(int32_t column, int32_t row, int64_t count, int64_t total, ColumnState state,
-                                bool lowerPass)
+void WaveformRenderer::ShadeRow(int32_t column, int32_t row, int64_t count, const ColumnQuotients& total,
+                                ColumnState state, bool lowerPass)
 {
     uint8_t red;
     uint8_t green;
     uint8_t blue;
     if (state.cursor && state.playmark) {
-        red = Fade(45, count, total);
-        green = Fade(245, count, total);
-        blue = Fade(255, count, total);
+        red = total.Fade(45, count);
+        green = total.Fade(245, count);
+        blue = total.Fade(255, count);
     } else if (state.playmark) {
-        red = Fade(45, count, total);
-        green = lowerPass ? Fade(245, count, total) : Fade(255, count, total);
-        blue = Fade(45, count, total);
+        red = total.Fade(45, count);
+        green = lowerPass ? total.Fade(245, count) : total.Fade(255, count);
+        blue = total.Fade(45, count);
     } else if (state.cursor) {
-        red = Fade(45, count, total);
-        green = Fade(45, count, total);
-        blue = Fade(255, count, total);
+        red = total.Fade(45, count);
+        green = total.Fade(45, count);
+        blue = total.Fade(255, count);
     } else if (state.inRange) {
-        red = green = blue = Rise(255, count, total);
+        red = green = blue = total.Rise(255, count);
     } else {
-        red = green = blue = Fade(245, count, total);
+        red = green = blue = total.Fade(245, count);
     }
     PixelAt(column, row) = qRgb(red, green, blue);
 }

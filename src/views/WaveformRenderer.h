@@ -1,13 +1,17 @@
 #pragma once
 
 #include <cstdint>
+#include <span>
 #include <vector>
 
 #include <QImage>
 
 #include "sound/SampleBlock.h"
+#include "views/RowCounter.h"
 
 namespace glimmet {
+
+class ColumnQuotients;
 
 /// What one render of a channel's columns needs to know: the container's
 /// display range, range, cursor and play mark, and the channel's data.
@@ -21,10 +25,19 @@ struct WaveformScene {
     bool selected = false;
     int64_t channelFirstFrame = 0;
     int64_t channelFrameCount = 0;
-    /// The channel's data in order, one span per block; empty without data.
-    std::vector<SampleSpan> spans;
+    /// The channel's samples in order from its first frame on; spans over
+    /// blocks may be shaded from the blocks' summaries.
+    std::span<const SampleSpan> spans;
     /// (last - first + 1) / (view width in pixels), single precision.
     float framesPerColumn = 0;
+};
+
+/// What a column of the image shows, so that a later render can tell the
+/// columns whose picture would not change.
+struct RenderedColumn {
+    int64_t firstFrame = 0;
+    int64_t lastFrame = -1;
+    uint8_t state = 0;  // 0: nothing valid drawn
 };
 
 /// Renders pixel columns of a channel into an RGB32 image as a density
@@ -38,14 +51,22 @@ public:
     /// of rows to fill (the view's height).
     WaveformRenderer(QImage& image, const int16_t* rowTable, int32_t rows, const WaveformScene& scene);
 
-    /// Renders columns left, left + 1, ..., left + count - 1.
-    void RenderColumns(float left, int32_t count);
+    /// Renders columns left, left + 1, ..., left + count - 1 and returns how
+    /// many it rendered. With a memo of what each column shows (one entry
+    /// per image column), a column that would come out the same is skipped
+    /// and the memo is brought up to date.
+    int32_t RenderColumns(float left, int32_t count, std::vector<RenderedColumn>* memo = nullptr);
+
+    /// Summaries made for blocks during the renders.
+    int64_t SummariesMade() const { return counter_.SummariesMade(); }
 
 private:
     struct ColumnState {
         bool inRange;
         bool cursor;
         bool playmark;
+
+        uint8_t Bits() const { return uint8_t(0x80 | (inRange ? 1 : 0) | (cursor ? 2 : 0) | (playmark ? 4 : 0)); }
     };
 
     ColumnState StateOf(int64_t f0, int64_t f1) const;
@@ -53,8 +74,10 @@ private:
     void FillColumn(int32_t column, ColumnState state);
     void RenderDataColumn(int32_t column, int64_t f0, int64_t f1, ColumnState state);
     void CountSamples(int64_t f0, int64_t f1);
+    bool Unchanged(std::vector<RenderedColumn>* memo, int32_t column, int64_t f0, int64_t f1, ColumnState state) const;
     QRgb& PixelAt(int32_t column, int32_t row);
-    void ShadeRow(int32_t column, int32_t row, int64_t count, int64_t total, ColumnState state, bool lowerPass);
+    void ShadeRow(int32_t column, int32_t row, int64_t count, const ColumnQuotients& total, ColumnState state,
+                  bool lowerPass);
 
     QImage& image_;
     const int16_t* rowTable_;
@@ -62,7 +85,11 @@ private:
     WaveformScene scene_;
     // 16-bit counters: a column of more than 65535 frames wraps them.
     std::vector<uint16_t> histogram_;
-    std::vector<uint32_t> partials_;  // scratch of CountSamples
+    RowCounter counter_;
+    // Where each span starts, counted from the channel's first frame.
+    std::vector<int64_t> spanStarts_;
+    // Frames the spans hold, at most the channel's frame count.
+    int64_t dataCount_ = 0;
     uchar* pixels_;
     qsizetype stride_;
 };

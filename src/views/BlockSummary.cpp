@@ -1,0 +1,129 @@
+#include "views/BlockSummary.h"
+
+#include <algorithm>
+#include <utility>
+#include <new>
+
+namespace glimmet {
+
+namespace {
+
+constexpr int64_t kLargestBlock = int64_t(1) << 24;
+constexpr int32_t kLargestChunkShift = 24;
+
+inline int32_t IndexOf(int16_t sample)
+{
+    return (int32_t(sample) + 32768) >> 3;
+}
+
+std::pair<int16_t, int16_t> Extremes(const int16_t* samples, int64_t count)
+{
+    int16_t smallest = samples[0];
+    int16_t largest = samples[0];
+    for (int64_t i = 1; i < count; ++i) {
+        smallest = std::min(smallest, samples[i]);
+        largest = std::max(largest, samples[i]);
+    }
+    return {smallest, largest};
+}
+
+}  // namespace
+
+uint64_t BlockSummary::KeyOf(const int16_t* rowTable)
+{
+    // FNV-1a over the table's values.
+    uint64_t key = 1469598103934665603ull;
+    for (int i = 0; i < kRowTableSize; ++i) {
+        key ^= uint16_t(rowTable[i]);
+        key *= 1099511628211ull;
+    }
+    return key;
+}
+
+std::shared_ptr<const BlockSummary> BlockSummary::Make(const int16_t* samples, int64_t count, const int16_t* rowTable,
+                                                       uint64_t tableKey)
+{
+    if (samples == nullptr || rowTable == nullptr || count < 1 || count > kLargestBlock)
+        return nullptr;
+    std::shared_ptr<BlockSummary> summary(new (std::nothrow) BlockSummary());
+    if (summary == nullptr)
+        return nullptr;
+    summary->tableKey_ = tableKey;
+
+    // The rows the block reaches: those of the table entries between its
+    // smallest and largest sample (the table need not be monotonic).
+    const auto [smallest, largest] = Extremes(samples, count);
+    int32_t low = rowTable[IndexOf(smallest)];
+    int32_t high = low;
+    for (int32_t i = IndexOf(smallest); i <= IndexOf(largest); ++i) {
+        low = std::min(low, int32_t(rowTable[i]));
+        high = std::max(high, int32_t(rowTable[i]));
+    }
+    // A row table of negative rows is not one a view builds; nothing to keep.
+    if (low < 0)
+        return nullptr;
+    summary->lowRow_ = low;
+    summary->rowSpan_ = high - low + 1;
+
+    // Coarser chunks until the running counts fit in a quarter of the block.
+    const int64_t budget = std::max<int64_t>(count / 4, 1);
+    int32_t shift = kSmallestChunkShift;
+    while (shift < kLargestChunkShift && ((count >> shift) + 1) * summary->rowSpan_ > budget)
+        ++shift;
+    summary->chunkShift_ = shift;
+    summary->chunks_ = count >> shift;
+    if (summary->chunks_ == 0)
+        return summary;
+    // At most a quarter of the block's samples, which are bounded above.
+    summary->running_.assign(size_t(summary->chunks_ + 1) * size_t(summary->rowSpan_), uint16_t(0));
+    summary->CountChunks(samples, rowTable);
+    return summary;
+}
+
+// Boundary 0 stays all zero; boundary j + 1 is boundary j plus chunk j.
+// Four interleaved sets of running counts keep consecutive samples of the
+// same row from waiting on each other; a boundary holds their sum.
+void BlockSummary::CountChunks(const int16_t* samples, const int16_t* rowTable)
+{
+    const int64_t chunkSize = ChunkSize();
+    const size_t span = size_t(rowSpan_);
+    std::vector<uint32_t> running(4 * span, 0);
+    uint32_t* first = running.data();
+    uint32_t* second = first + span;
+    uint32_t* third = second + span;
+    uint32_t* fourth = third + span;
+    const int16_t* rows = rowTable;
+    const int32_t low = lowRow_;
+    const auto slotOf = [rows, low](int16_t sample) { return size_t(rows[IndexOf(sample)] - low); };
+    for (int64_t chunk = 0; chunk < chunks_; ++chunk) {
+        const int16_t* sample = samples + chunk * chunkSize;
+        // Chunks hold a multiple of four samples.
+        for (int64_t i = 0; i < chunkSize; i += 4) {
+            ++first[slotOf(sample[i])];
+            ++second[slotOf(sample[i + 1])];
+            ++third[slotOf(sample[i + 2])];
+            ++fourth[slotOf(sample[i + 3])];
+        }
+        uint16_t* boundary = running_.data() + size_t(chunk + 1) * span;
+        for (size_t row = 0; row < span; ++row)
+            boundary[row] = uint16_t(first[row] + second[row] + third[row] + fourth[row]);
+    }
+}
+
+void BlockSummary::AddChunks(uint32_t* counts, uint32_t lastSlot, int64_t firstChunk, int64_t endChunk) const
+{
+    if (firstChunk >= endChunk || firstChunk < 0 || endChunk > chunks_)
+        return;
+    const size_t span = size_t(rowSpan_);
+    const uint16_t* from = running_.data() + size_t(firstChunk) * span;
+    const uint16_t* to = running_.data() + size_t(endChunk) * span;
+    // Rows past lastSlot all land in the last slot, as counting would put
+    // them; only that stretch needs the clamp.
+    const size_t direct = std::min<size_t>(span, lastSlot >= uint32_t(lowRow_) ? lastSlot - uint32_t(lowRow_) : 0);
+    for (size_t i = 0; i < direct; ++i)
+        counts[size_t(lowRow_) + i] += uint16_t(to[i] - from[i]);
+    for (size_t i = direct; i < span; ++i)
+        counts[lastSlot] += uint16_t(to[i] - from[i]);
+}
+
+}  // namespace glimmet

@@ -1,0 +1,124 @@
+#include "views/RowCounter.h"
+
+#include <algorithm>
+
+#include "views/BlockSummary.h"
+
+namespace glimmet {
+
+RowCounter::RowCounter(const int16_t* rowTable, uint32_t slots)
+    : rowTable_(rowTable), slots_(std::max<uint32_t>(slots, 1)), lastSlot_(slots_ - 1), partials_(4 * size_t(slots_), 0)
+{
+}
+
+void RowCounter::Clear()
+{
+    std::fill(partials_.begin(), partials_.end(), 0u);
+}
+
+void RowCounter::Finish(uint16_t* counters) const
+{
+    const uint32_t* partial = partials_.data();
+    for (uint32_t row = 0; row < slots_; ++row)
+        counters[row] = uint16_t(partial[row] + partial[slots_ + row] + partial[2 * slots_ + row] + partial[3 * slots_ + row]);
+}
+
+void RowCounter::Count(const int16_t* samples, int64_t count, uint32_t step)
+{
+    uint32_t* partial = partials_.data();
+    const size_t slots = slots_;
+    // A negative table entry converts to a huge slot and is clamped like
+    // any other row past the last.
+    const auto slotOf = [&](int16_t value) {
+        return std::min(size_t(rowTable_[(int32_t(value) + 32768) >> 3]), size_t(lastSlot_));
+    };
+    int64_t i = 0;
+    for (; i + 4 <= count; i += 4) {
+        partial[slotOf(samples[i])] += step;
+        partial[slots + slotOf(samples[i + 1])] += step;
+        partial[2 * slots + slotOf(samples[i + 2])] += step;
+        partial[3 * slots + slotOf(samples[i + 3])] += step;
+    }
+    for (; i < count; ++i)
+        partial[slotOf(samples[i])] += step;
+}
+
+void RowCounter::Add(const SampleSpan& span, int64_t from, int64_t to)
+{
+    from = std::max<int64_t>(from, 0);
+    to = std::min(to, span.count);
+    if (from >= to || span.samples == nullptr)
+        return;
+    const SampleBlock* block = span.block;
+    // A span that does not lie inside its block is read as plain samples.
+    const bool inBlock = block != nullptr && span.offset >= 0 && span.offset <= block->Count() &&
+                         span.count <= block->Count() - span.offset && block->Samples() + span.offset == span.samples;
+    if (inBlock)
+        AddFromBlock(*block, span.offset + from, span.offset + to);
+    else
+        Count(span.samples + from, to - from, kIncrement);
+}
+
+// from and to are offsets inside the block.
+void RowCounter::AddFromBlock(const SampleBlock& block, int64_t from, int64_t to)
+{
+    const int16_t* samples = block.Samples();
+    const std::shared_ptr<const BlockSummary> summary = SummaryFor(block, to - from);
+    if (summary == nullptr || to - from < summary->ChunkSize()) {
+        Count(samples + from, to - from, kIncrement);
+        return;
+    }
+    const int64_t size = summary->ChunkSize();
+    const int64_t chunks = summary->CountChunks();
+    // Either start at the chunk before from and take off what lies before
+    // from, or start at the chunk after and read up to it; the same at the
+    // end. Both choices stay inside the block's whole chunks.
+    const int64_t below = from / size;
+    const int64_t above = (from + size - 1) / size;
+    int64_t firstChunk = above;
+    if (below < chunks && from - below * size < above * size - from)
+        firstChunk = below;
+    const int64_t endBelow = std::min(to / size, chunks);
+    const int64_t endAbove = (to + size - 1) / size;
+    int64_t endChunk = endBelow;
+    if (endAbove <= chunks && endAbove * size - to < to - endBelow * size)
+        endChunk = endAbove;
+
+    summary->AddChunks(partials_.data(), lastSlot_, firstChunk, endChunk);
+    const int64_t chunkStart = firstChunk * size;
+    if (chunkStart < from)
+        Count(samples + chunkStart, from - chunkStart, kDecrement);
+    else
+        Count(samples + from, chunkStart - from, kIncrement);
+    const int64_t chunkEnd = endChunk * size;
+    if (chunkEnd > to)
+        Count(samples + to, chunkEnd - to, kDecrement);
+    else
+        Count(samples + chunkEnd, to - chunkEnd, kIncrement);
+}
+
+std::shared_ptr<const BlockSummary> RowCounter::SummaryFor(const SampleBlock& block, int64_t reading)
+{
+    std::shared_ptr<const BlockSummary> summary = block.Summary();
+    if (summary != nullptr && summary->TableKey() == TableKey())
+        return summary;
+    if (2 * reading < block.Count())
+        return nullptr;
+    summary = BlockSummary::Make(block.Samples(), block.Count(), rowTable_, TableKey());
+    if (summary != nullptr) {
+        block.SetSummary(summary);
+        ++summariesMade_;
+    }
+    return summary;
+}
+
+uint64_t RowCounter::TableKey()
+{
+    if (!tableKeyKnown_) {
+        tableKey_ = BlockSummary::KeyOf(rowTable_);
+        tableKeyKnown_ = true;
+    }
+    return tableKey_;
+}
+
+}  // namespace glimmet
