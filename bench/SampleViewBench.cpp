@@ -14,6 +14,7 @@
 
 #include <QImage>
 
+#include "sound/BlockBuilder.h"
 #include "sound/SampleBlock.h"
 #include "views/BlockSummary.h"
 #include "views/WaveformRenderer.h"
@@ -22,7 +23,8 @@ namespace glimmet {
 namespace {
 
 constexpr int64_t kOneHourFrames = 158760000;
-constexpr int64_t kBlockFrames = 65536;
+// The size channels build their blocks in, so the bench reads what ships.
+constexpr int64_t kBlockFrames = BlockBuilder::kBlockSamples;
 constexpr int kChannels = 2;
 constexpr int kWidth = 1920;
 constexpr int kHeight = 200;
