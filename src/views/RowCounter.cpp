@@ -104,6 +104,11 @@ std::shared_ptr<const BlockSummary> RowCounter::SummaryFor(const SampleBlock& bl
         return summary;
     if (2 * reading < block.Count())
         return nullptr;
+    if (wanted_ != nullptr) {
+        if (wanted_->empty() || wanted_->back() != &block)
+            wanted_->push_back(&block);
+        return nullptr;
+    }
     summary = BlockSummary::Make(block.Samples(), block.Count(), rowTable_, TableKey());
     if (summary != nullptr) {
         block.SetSummary(summary);

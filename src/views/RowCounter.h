@@ -34,6 +34,11 @@ public:
     /// The counts so far, modulo 2^16, into slots counters.
     void Finish(uint16_t* counters) const;
 
+    /// From now on a missing summary is not made during the count: the
+    /// block is listed in wanted (once per run of columns reading it) and its
+    /// samples are read, so whoever renders can have it made later.
+    void DeferSummaries(std::vector<const SampleBlock*>* wanted) { wanted_ = wanted; }
+
     /// Summaries made by this counter, for tests and measurements.
     int64_t SummariesMade() const { return summariesMade_; }
 
@@ -52,6 +57,7 @@ private:
     uint64_t tableKey_ = 0;
     bool tableKeyKnown_ = false;
     int64_t summariesMade_ = 0;
+    std::vector<const SampleBlock*>* wanted_ = nullptr;
     // Four interleaved sets of counters keep consecutive samples of the
     // same row from waiting on each other.
     std::vector<uint32_t> partials_;

@@ -33,7 +33,8 @@ constexpr int kKeyDelete = 0x7f;
 }  // namespace
 
 SampleView::SampleView(Channel* channel, ChannelContainerView* container, QWidget* parent)
-    : MessageView(parent), channel_(channel), container_(container), clock_(&system_time)
+    : MessageView(parent), channel_(channel), container_(container), clock_(&system_time),
+      summaries_(channel, rowTable_.data())
 {
     setObjectName("sample view");
     setAttribute(Qt::WA_OpaquePaintEvent);
@@ -166,7 +167,13 @@ void SampleView::RenderColumns(const ViewRect& rect)
     }
     const int32_t rows = int32_t(bounds.Height() + 1);
     WaveformRenderer renderer(bitmap_, rowTable_.data(), rows, scene);
+    // Summaries are made after the picture, so a long channel's first
+    // picture costs one reading of its samples and not more.
+    wantedSummaries_.clear();
+    renderer.DeferSummaries(&wantedSummaries_);
     renderedColumns_ += renderer.RenderColumns(rect.left, int32_t(rect.right - rect.left + 1), &drawn_);
+    if (!wantedSummaries_.empty())
+        summaries_.Request(spans_, wantedSummaries_);
 }
 
 bool SampleView::IsFocus() const

@@ -7,6 +7,7 @@
 #include <QImage>
 
 #include "views/MessageView.h"
+#include "views/SummaryBuilder.h"
 #include "views/WaveformRenderer.h"
 
 namespace glimmet {
@@ -57,6 +58,9 @@ public:
     /// Columns rendered since the view was made: lets tests see that an
     /// update rendered only what changed.
     int64_t RenderedColumns() const { return renderedColumns_; }
+    /// Makes the summaries renders asked for, which otherwise happens while
+    /// the window is idle.
+    SummaryBuilder& Summaries() { return summaries_; }
     bool IsFocus() const;
 
     /// The off-screen image: one pixel per view pixel, null when it could not
@@ -122,6 +126,8 @@ private:
     };
     Source drawnFrom_;
     std::vector<SampleSpan> spans_;  // the last render's, kept for its capacity
+    std::vector<const SampleBlock*> wantedSummaries_;
+    SummaryBuilder summaries_;
     int64_t renderedColumns_ = 0;
     bool inLayout_ = false;
     // A press was handled and its release has not come yet.

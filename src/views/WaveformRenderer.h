@@ -57,6 +57,10 @@ public:
     /// and the memo is brought up to date.
     int32_t RenderColumns(float left, int32_t count, std::vector<RenderedColumn>* memo = nullptr);
 
+    /// Blocks that want a summary are listed in wanted instead of getting
+    /// one during the render (see RowCounter::DeferSummaries).
+    void DeferSummaries(std::vector<const SampleBlock*>* wanted) { counter_.DeferSummaries(wanted); }
+
     /// Summaries made for blocks during the renders.
     int64_t SummariesMade() const { return counter_.SummariesMade(); }
 
