@@ -55,8 +55,9 @@ TEST(ManyChannelsWindow, AppendingFilesOfManyChannelsDrawsEachViewAFewTimes)
         const SampleView* view = container.SampleViewAtIndex(i);
         ASSERT_GT(view->height(), 0) << i;
         EXPECT_EQ(view->Bitmap().height(), view->height()) << i;
-        if (i > 0)
+        if (i > 0) {
             EXPECT_EQ(view->geometry().top(), container.SampleViewAtIndex(i - 1)->geometry().bottom() + 3) << i;
+        }
     }
 }
 
