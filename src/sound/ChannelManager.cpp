@@ -30,6 +30,7 @@ Channel* ChannelManager::AddChannel(std::unique_ptr<Channel> channel)
         std::lock_guard guard(lock_);
         channels_.push_back(std::move(channel));
         index = int32_t(channels_.size()) - 1;
+        IndexAppendedLocked();
     }
     NotifyChannel(DocumentChange::kChannelAdded, index);
     return added;
@@ -44,6 +45,10 @@ std::unique_ptr<Channel> ChannelManager::AddChannel(std::unique_ptr<Channel> cha
         if (index < 0 || size_t(index) > channels_.size())
             return channel;
         channels_.insert(channels_.begin() + index, std::move(channel));
+        if (size_t(index) + 1 == channels_.size())
+            IndexAppendedLocked();
+        else
+            indexValid_ = false;
     }
     NotifyChannel(DocumentChange::kChannelAdded, index);
     return nullptr;
@@ -52,11 +57,8 @@ std::unique_ptr<Channel> ChannelManager::AddChannel(std::unique_ptr<Channel> cha
 Channel* ChannelManager::ChannelWithId(uint64_t id)
 {
     std::lock_guard guard(lock_);
-    for (const std::unique_ptr<Channel>& channel : channels_) {
-        if (channel->Id() == id)
-            return channel.get();
-    }
-    return nullptr;
+    const int32_t index = IndexOfIdLocked(id);
+    return index < 0 ? nullptr : channels_[size_t(index)].get();
 }
 
 std::unique_ptr<Channel> ChannelManager::RemoveChannel(Channel* channel)
@@ -65,13 +67,12 @@ std::unique_ptr<Channel> ChannelManager::RemoveChannel(Channel* channel)
     int32_t index;
     {
         std::lock_guard guard(lock_);
-        auto found = std::find_if(channels_.begin(), channels_.end(),
-            [channel](const std::unique_ptr<Channel>& item) { return item.get() == channel; });
-        if (found == channels_.end() || channel == nullptr)
+        index = channel != nullptr ? IndexOfLocked(channel) : -1;
+        if (index < 0)
             return nullptr;
-        index = int32_t(found - channels_.begin());
-        removed = std::move(*found);
-        channels_.erase(found);
+        removed = std::move(channels_[size_t(index)]);
+        channels_.erase(channels_.begin() + index);
+        indexValid_ = false;
     }
     NotifyChannel(DocumentChange::kChannelRemoved, index);
     return removed;
@@ -87,6 +88,7 @@ bool ChannelManager::RemoveChannelAt(int32_t index)
             return false;
         removed = std::move(channels_[size_t(index)]);
         channels_.erase(channels_.begin() + index);
+        indexValid_ = false;
     }
     NotifyChannel(DocumentChange::kChannelRemoved, index);
     return true;
@@ -128,11 +130,45 @@ Channel* ChannelManager::ChannelAt(int32_t index)
 int32_t ChannelManager::IndexOf(Channel* channel)
 {
     std::lock_guard guard(lock_);
+    return IndexOfLocked(channel);
+}
+
+int32_t ChannelManager::IndexOfLocked(const Channel* channel)
+{
+    if (!indexValid_)
+        RebuildIndexLocked();
+    const auto found = indexByChannel_.find(channel);
+    return found == indexByChannel_.end() ? -1 : found->second;
+}
+
+int32_t ChannelManager::IndexOfIdLocked(uint64_t id)
+{
+    if (!indexValid_)
+        RebuildIndexLocked();
+    const auto found = indexById_.find(id);
+    return found == indexById_.end() ? -1 : found->second;
+}
+
+// Removing the channels of a document one by one would rebuild the index
+// after each; it is rebuilt only when a look-up needs it.
+void ChannelManager::RebuildIndexLocked()
+{
+    indexByChannel_.clear();
+    indexById_.clear();
     for (size_t i = 0; i < channels_.size(); ++i) {
-        if (channels_[i].get() == channel)
-            return int32_t(i);
+        indexByChannel_[channels_[i].get()] = int32_t(i);
+        indexById_[channels_[i]->Id()] = int32_t(i);
     }
-    return -1;
+    indexValid_ = true;
+}
+
+void ChannelManager::IndexAppendedLocked()
+{
+    if (!indexValid_)
+        return;
+    const int32_t index = int32_t(channels_.size()) - 1;
+    indexByChannel_[channels_.back().get()] = index;
+    indexById_[channels_.back()->Id()] = index;
 }
 
 int64_t ChannelManager::FrameCount()

@@ -3,6 +3,7 @@
 #include <atomic>
 #include <cstdint>
 #include <memory>
+#include <unordered_map>
 #include <vector>
 
 #include "sound/Observable.h"
@@ -119,9 +120,22 @@ public:
 private:
     void NotifyChannel(uint32_t change, int32_t index);
     void PostToWindow(uint32_t what, const char* field = nullptr, int64_t value = 0);
+    /// Where the channel, or the channel with the id, stands; -1 when it is
+    /// not in the list. The caller holds lock_.
+    int32_t IndexOfLocked(const Channel* channel);
+    int32_t IndexOfIdLocked(uint64_t id);
+    void RebuildIndexLocked();
+    void IndexAppendedLocked();
 
     // Guarded by lock_.
     std::vector<std::unique_ptr<Channel>> channels_;
+    // Each channel's place in channels_, by pointer and by id, so that a
+    // document of thousands of channels finds one without a walk. Appending
+    // keeps them up; any other change to the list drops them until the next
+    // look-up.
+    std::unordered_map<const Channel*, int32_t> indexByChannel_;
+    std::unordered_map<uint64_t, int32_t> indexById_;
+    bool indexValid_ = true;
     std::unique_ptr<Mixer> mixer_;
 
     DocumentWindow* window_;

@@ -2,7 +2,6 @@
 
 #include <algorithm>
 
-#include <QFontMetricsF>
 #include <QPainter>
 #include <QWheelEvent>
 
@@ -12,7 +11,7 @@
 #include "sound/DocumentWindow.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
-#include "views/PixelCanvas.h"
+#include "views/ContainerFrames.h"
 #include "views/SampleView.h"
 #include "views/ViewColors.h"
 #include "views/WheelNavigator.h"
@@ -23,35 +22,11 @@ namespace glimmet {
 namespace {
 
 const QColor kBackground = ViewBackgroundColor();
-const QColor kSunkenDark(152, 152, 152);
-const QColor kSunkenLight(255, 255, 255);
-const QColor kFocus(0, 0, 229);
 
 constexpr int kMinimumHeight = 30;
 constexpr int kMaximumSize = 2000;
 // Each sample view is framed by one pixel on every side.
 constexpr int kFrameAllowance = 2;
-
-const char* const kEmptyText = "Drag files with audio tracks into here!";
-
-void FillPixels(QPainter& painter, float x0, float y0, float x1, float y1, const QColor& colour)
-{
-    const int left = PixelCanvas::RoundToPixel(std::min(x0, x1));
-    const int right = PixelCanvas::RoundToPixel(std::max(x0, x1));
-    const int top = PixelCanvas::RoundToPixel(std::min(y0, y1));
-    const int bottom = PixelCanvas::RoundToPixel(std::max(y0, y1));
-    painter.fillRect(QRect(QPoint(left, top), QPoint(right, bottom)), colour);
-}
-
-// The four lines of a frame around r: left and top in the first colour,
-// right and bottom in the second.
-void DrawFrameLines(QPainter& painter, const ViewRect& r, const QColor& topLeft, const QColor& bottomRight)
-{
-    FillPixels(painter, r.left, r.bottom, r.left, r.top, topLeft);
-    FillPixels(painter, r.left + 1, r.top, r.right, r.top, topLeft);
-    FillPixels(painter, r.right, r.top + 1, r.right, r.bottom, bottomRight);
-    FillPixels(painter, r.right - 1, r.bottom, r.left + 1, r.bottom, bottomRight);
-}
 
 }  // namespace
 
@@ -81,20 +56,15 @@ ChannelContainerView::~ChannelContainerView()
         manager_->Listeners().Unsubscribe(static_cast<Observer*>(this));
 }
 
-float ChannelContainerView::Width() const
-{
-    return Bounds().Width();
-}
-
 const DisplayRange& ChannelContainerView::Display() const
 {
-    display_.SetWidth(Width());
+    display_.SetWidth(Bounds().Width());
     return display_;
 }
 
 DisplayRange& ChannelContainerView::Display()
 {
-    display_.SetWidth(Width());
+    display_.SetWidth(Bounds().Width());
     return display_;
 }
 
@@ -179,7 +149,11 @@ void ChannelContainerView::ShowAll()
 
 void ChannelContainerView::CheckZoomSlider(bool notify)
 {
-    const int64_t count = MaxFrameCount();
+    CheckZoomSlider(notify, MaxFrameCount());
+}
+
+void ChannelContainerView::CheckZoomSlider(bool notify, int64_t count)
+{
     if (zoomSlider_ == nullptr || count - 1 <= 0)
         return;
     zoomSlider_->SetLowValue(0, notify);
@@ -189,7 +163,11 @@ void ChannelContainerView::CheckZoomSlider(bool notify)
 
 void ChannelContainerView::UpdateZoomSlider()
 {
-    const int64_t count = MaxFrameCount();
+    UpdateZoomSlider(MaxFrameCount());
+}
+
+void ChannelContainerView::UpdateZoomSlider(int64_t count)
+{
     if (zoomSlider_ == nullptr || count <= 0)
         return;
     const DisplayRange::SliderFractions fractions = Display().SliderFractionsFor(count);
@@ -320,6 +298,8 @@ void ChannelContainerView::ObserverNotified(Observable*, uint32_t mask, const Me
     int32_t index = -1;
     if (data != nullptr)
         data->FindInt32(kFieldIndex, &index);
+    if (mask != DocumentChange::kChannelAdded)
+        burstCountKnown_ = false;
     if (mask & DocumentChange::kChannelRemoved)
         RemoveSampleViewAt(index);
     if (mask & DocumentChange::kChannelAdded)
@@ -338,17 +318,22 @@ void ChannelContainerView::AddChannelAt(Channel* channel, int32_t index)
 }
 
 // An index outside the list appends, so that every view made here is laid
-// out and drawn.
+// out and drawn. What follows from the frame count is brought up to date
+// channel by channel, since the display range depends on the order of the
+// changes; placing the views waits for the one layout pass of the batch.
 void ChannelContainerView::InsertSampleView(SampleView* view, int32_t index)
 {
     const size_t position = (index < 0 || size_t(index) > sampleViews_.size()) ? sampleViews_.size() : size_t(index);
     sampleViews_.insert(sampleViews_.begin() + std::ptrdiff_t(position), view);
     view->show();
+    const int64_t count = FrameCountWith(view->GetChannel());
     if (display_.Last() <= 0)
-        display_.SetLast(MaxFrameCount() - 1);
-    CheckZoomSlider(true);
+        display_.SetLast(count - 1);
+    CheckZoomSlider(true, count);
+    sliderCheckPending_ = true;
     UpdateSizeLimits();
-    LayoutChildren();
+    FollowFrameCount(count);
+    layout_.Schedule();
     update();
 }
 
@@ -359,7 +344,32 @@ void ChannelContainerView::RemoveSampleViewAt(int32_t index)
         return;
     sampleViews_.erase(sampleViews_.begin() + index);
     delete view;
+    burstCountKnown_ = false;
+    // The slider heard of this change as the last one of the batch.
+    sliderCheckPending_ = false;
     UpdateSizeLimits();
+    FollowFrameCount(MaxFrameCount());
+    layout_.Schedule();
+    update();
+}
+
+// A channel added to a batch can only raise the frame count, so the count
+// is taken from the document once per batch and kept up from the channels
+// added since; any other change to the document takes it afresh.
+int64_t ChannelContainerView::FrameCountWith(Channel* added)
+{
+    burstCount_ = burstCountKnown_ && added != nullptr ? std::max(burstCount_, added->EndFrame()) : MaxFrameCount();
+    burstCountKnown_ = true;
+    return burstCount_;
+}
+
+void ChannelContainerView::LayOutAfterChanges()
+{
+    burstCountKnown_ = false;
+    if (sliderCheckPending_) {
+        sliderCheckPending_ = false;
+        CheckZoomSlider(true);
+    }
     LayoutChildren();
     update();
 }
@@ -427,20 +437,26 @@ void ChannelContainerView::UpdateSizeLimits()
 void ChannelContainerView::resizeEvent(QResizeEvent* event)
 {
     MessageView::resizeEvent(event);
-    LayoutChildren();
-    update();
+    if (!layout_.Flush()) {
+        LayoutChildren();
+        update();
+    }
 }
 
-// A view wider than the display range shows one frame per column.
-void ChannelContainerView::WidenToOneFramePerColumn()
+// A view wider than the display range shows one frame per column; the
+// slider follows the frame count.
+void ChannelContainerView::FollowFrameCount(int64_t count)
 {
-    Display().WidenToOneFramePerColumn(MaxFrameCount());
-    UpdateZoomSlider();
+    Display().WidenToOneFramePerColumn(count);
+    UpdateZoomSlider(count);
+    CheckZoomSlider(false, count);
 }
 
 void ChannelContainerView::LayoutChildren()
 {
-    WidenToOneFramePerColumn();
+    const int64_t frames = MaxFrameCount();
+    Display().WidenToOneFramePerColumn(frames);
+    UpdateZoomSlider(frames);
     const ViewRect bounds = Bounds();
     if (zoomSlider_ != nullptr)
         zoomSliderHeight_ = float(zoomSlider_->minimumSizeHint().height());
@@ -456,7 +472,7 @@ void ChannelContainerView::LayoutChildren()
         const float top = sampleViews_.empty() ? bounds.bottom - zoomSliderHeight_ + 1 : previousBottom + 2;
         zoomSlider_->Layout({0, top, bounds.right, bounds.bottom});
     }
-    CheckZoomSlider(false);
+    CheckZoomSlider(false, frames);
 }
 
 // Drawing: only the frames around the sample views and the empty state;
@@ -465,29 +481,10 @@ void ChannelContainerView::paintEvent(QPaintEvent*)
 {
     QPainter painter(this);
     painter.fillRect(rect(), kBackground);
-    for (SampleView* view : sampleViews_) {
-        const ViewRect r = view->Frame().InsetBy(-1, -1);
-        if (view->IsFocus())
-            DrawFrameLines(painter, r, kFocus, kFocus);
-        else
-            DrawFrameLines(painter, r, kSunkenDark, kSunkenLight);
-    }
+    for (SampleView* view : sampleViews_)
+        ContainerFrames::DrawViewFrame(painter, view->Frame(), view->IsFocus());
     if (sampleViews_.empty())
-        DrawEmptyState(painter);
-}
-
-void ChannelContainerView::DrawEmptyState(QPainter& painter)
-{
-    const ViewRect bounds = Bounds();
-    const float bottom = bounds.bottom - zoomSliderHeight_;
-    DrawFrameLines(painter, {bounds.left, bounds.top, bounds.right, bottom}, kSunkenDark, kSunkenLight);
-    FillPixels(painter, bounds.left + 1, bounds.top + 1, bounds.right - 1, bottom - 1, kBackground);
-    const QString text = QString::fromUtf8(kEmptyText);
-    const QFontMetricsF metrics(font());
-    const qreal x = (bounds.left + bounds.right) / 2 - metrics.horizontalAdvance(text) / 2;
-    const qreal baseline = (bounds.top + bottom) / 2;
-    painter.setPen(Qt::black);
-    painter.drawText(QPointF(x, baseline), text);
+        ContainerFrames::DrawEmptyState(painter, Bounds(), zoomSliderHeight_, font());
 }
 
 void ChannelContainerView::wheelEvent(QWheelEvent* event)

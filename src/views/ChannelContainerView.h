@@ -14,10 +14,9 @@
 #include "views/DisplayRange.h"
 #include "views/MessageView.h"
 #include "views/FrameMapping.h"
+#include "views/LayoutScheduler.h"
 #include "views/SampleView.h"
 #include "views/ViewRect.h"
-
-class QPainter;
 
 namespace glimmet {
 
@@ -162,15 +161,20 @@ protected:
     void wheelEvent(QWheelEvent* event) override;
 
 private:
-    float Width() const;
     /// The display range over the current width. The widget's width changes
     /// before its resize event arrives (a hidden widget gets it only when
     /// shown), so the width is taken afresh at every use.
     const DisplayRange& Display() const;
     DisplayRange& Display();
     void LayoutChildren();
-    void DrawEmptyState(QPainter& painter);
-    void WidenToOneFramePerColumn();
+    /// Brings the display range and the zoom slider up to a frame count.
+    void FollowFrameCount(int64_t count);
+    void CheckZoomSlider(bool notify, int64_t count);
+    void UpdateZoomSlider(int64_t count);
+    /// The document's frame count with added just added (see the .cpp).
+    int64_t FrameCountWith(Channel* added);
+    /// The batch's layout pass: places every view once.
+    void LayOutAfterChanges();
     void UpdateSizeLimits();
     void AddChannelAt(Channel* channel, int32_t index);
     void RemoveSampleViewAt(int32_t index);
@@ -187,6 +191,13 @@ private:
     int64_t playmarkFrame_ = -1;
     ChannelContextMenu contextMenu_{*this};
     ContainerMouseInteraction interaction_{*this, contextMenu_};
+    // Channels come and go in batches (a file's channels, a document
+    // replaced); the views are placed once per batch, by layout_.
+    LayoutScheduler layout_{[this] { LayOutAfterChanges(); }};
+    int64_t burstCount_ = 0;
+    bool burstCountKnown_ = false;
+    // Channels were added since the slider was last told of the count.
+    bool sliderCheckPending_ = false;
 };
 
 }  // namespace glimmet

@@ -1,0 +1,65 @@
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <vector>
+
+#include "AppTestSupport.h"
+#include "sound/ChannelManager.h"
+#include "views/ChannelContainerView.h"
+#include "views/SampleView.h"
+
+namespace glimmet::test {
+namespace {
+
+std::vector<std::vector<int16_t>> Channels(int count, int frames)
+{
+    std::vector<std::vector<int16_t>> channels(size_t(count), std::vector<int16_t>(size_t(frames), int16_t(0)));
+    for (int c = 0; c < count; ++c) {
+        for (int f = 0; f < frames; ++f)
+            channels[size_t(c)][size_t(f)] = int16_t(((f * (c + 3)) % 400) * 150 - 30000);
+    }
+    return channels;
+}
+
+/// Every view's rendered columns, in whole renders of a view.
+double WholeRendersPerView(ChannelContainerView& container)
+{
+    const int32_t count = container.CountChannelViews();
+    int64_t columns = 0;
+    int64_t width = 0;
+    for (int32_t i = 0; i < count; ++i) {
+        columns += container.SampleViewAtIndex(i)->RenderedColumns();
+        width = std::max<int64_t>(width, container.SampleViewAtIndex(i)->Bitmap().width());
+    }
+    return count == 0 || width == 0 ? 0 : double(columns) / double(width) / count;
+}
+
+// Appending a file of many channels lays the window out and draws each
+// view a few times, however many channels the file and the document have.
+TEST(ManyChannelsWindow, AppendingFilesOfManyChannelsDrawsEachViewAFewTimes)
+{
+    AppFixture fixture;
+    const std::filesystem::path file = fixture.Dir() / "many.wav";
+    WriteWav(file, Channels(64, 2000));
+    QuillexWindow* window = OpenWindow(fixture);
+    window->SetAppendOnLoad(true);
+    for (int i = 0; i < 2; ++i) {
+        window->OpenFile(file);
+        Drain();
+    }
+    ASSERT_EQ(window->Manager()->CountChannels(), 128);
+    ChannelContainerView& container = *window->ContainerView();
+    EXPECT_LE(WholeRendersPerView(container), 6.0);
+    // Every view has its place and its picture at the end.
+    for (int32_t i = 0; i < container.CountChannelViews(); ++i) {
+        const SampleView* view = container.SampleViewAtIndex(i);
+        ASSERT_GT(view->height(), 0) << i;
+        EXPECT_EQ(view->Bitmap().height(), view->height()) << i;
+        if (i > 0) {
+            EXPECT_EQ(view->geometry().top(), container.SampleViewAtIndex(i - 1)->geometry().bottom() + 3) << i;
+        }
+    }
+}
+
+}  // namespace
+}  // namespace glimmet::test
