@@ -75,6 +75,7 @@ void Action::SnapshotChannel(Channel* channel, SavedChannel& record) const
         return;
     // A read that fails leaves the snapshot as silence.
     record.held = channel->ReadSlice(rangeStart_, frameCount_, &record.data) != B_NO_MEMORY;
+    record.inside = channel->FirstFrame() <= rangeStart_ && rangeEnd_ < channel->EndFrame();
 }
 
 int64_t Action::SnapshotBytes() const
@@ -88,6 +89,14 @@ int64_t Action::SnapshotBytes() const
 }
 
 status_t Action::TransformSelectedRanges(const std::function<void(int16_t*, int64_t)>& transform)
+{
+    std::lock_guard guard(manager_->DocumentLock());
+    RangeTransformer transformer(manager_, rangeStart_, rangeEnd_);
+    transformer.TransformSelected(transform);
+    return transformer.InitCheck();
+}
+
+status_t Action::TransformSelectedRanges(const PieceTransform& transform)
 {
     std::lock_guard guard(manager_->DocumentLock());
     RangeTransformer transformer(manager_, rangeStart_, rangeEnd_);
@@ -137,14 +146,56 @@ status_t Action::Undo()
     if (manager_ == nullptr)
         return B_ERROR;
     manager_->Lock();
-    RestoreSelection([this](Channel* channel, size_t record) {
-        const SavedChannel& saved = savedChannels_[record];
+    const bool keepResult = RedoPutsResultBack();
+    RestoreSelection([this, keepResult](Channel* channel, size_t record) {
+        SavedChannel& saved = savedChannels_[record];
+        saved.redoHeld = keepResult && saved.held && saved.inside &&
+            channel->ReadSlice(rangeStart_, frameCount_, &saved.redo) == B_OK;
+        if (!saved.redoHeld)
+            saved.redo = SampleSlice();
+        saved.redoChannel = channel->Id();
         if (saved.held)
             channel->ReplaceFrames(saved.data, rangeStart_, rangeEnd_);
+        saved.undone = SampleSlice();
+        if (saved.redoHeld)
+            saved.redoHeld = channel->ReadSlice(rangeStart_, frameCount_, &saved.undone) == B_OK;
     });
     RestoreRange();
     manager_->Unlock();
     return B_OK;
+}
+
+bool Action::PutResultBack()
+{
+    if (savedChannels_.empty())
+        return false;
+    for (const SavedChannel& saved : savedChannels_) {
+        Channel* channel = manager_->ChannelAt(saved.index);
+        if (!saved.redoHeld || channel == nullptr || channel->Id() != saved.redoChannel)
+            return false;
+        // Other undos and redos since may have changed what Go would read.
+        SampleSlice now;
+        if (channel->FirstFrame() > rangeStart_ || rangeEnd_ >= channel->EndFrame() ||
+            channel->ReadSlice(rangeStart_, frameCount_, &now) != B_OK || !now.SameSamples(saved.undone))
+            return false;
+    }
+    // Go works on every selected channel: one selected since, after the
+    // last recorded one (the selection walk leaves those alone), would be
+    // transformed too.
+    for (int32_t i = savedChannels_.back().index + 1; Channel* channel = manager_->ChannelAt(i); i++) {
+        if (channel->IsSelected())
+            return false;
+    }
+    // Every range lay inside its channel's data, so the undo gave each back
+    // exactly and Go would compute what it computed before.
+    RestoreSelection([this](Channel* channel, size_t record) {
+        SavedChannel& saved = savedChannels_[record];
+        channel->ReplaceFrames(saved.redo, rangeStart_, rangeEnd_);
+        saved.redo = SampleSlice();
+        saved.undone = SampleSlice();
+        saved.redoHeld = false;
+    });
+    return true;
 }
 
 status_t Action::Redo()
@@ -153,9 +204,11 @@ status_t Action::Redo()
         return B_ERROR;
     manager_->Lock();
     RestoreRange();
-    RestoreSelection(nullptr);
+    const bool putBack = RedoPutsResultBack() && PutResultBack();
+    if (!putBack)
+        RestoreSelection(nullptr);
     manager_->Unlock();
-    return Go();
+    return putBack ? B_OK : Go();
 }
 
 const char* Action::Name()

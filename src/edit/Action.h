@@ -15,6 +15,7 @@ class Channel;
 class ChannelManager;
 class EditContext;
 class MessageTarget;
+struct PieceTransform;
 
 /// One undoable change to a document.
 ///
@@ -43,7 +44,10 @@ public:
     virtual status_t Go();
     /// Writes the snapshot back and restores range and selection.
     virtual status_t Undo();
-    /// Restores range and selection, then runs Go again.
+    /// Restores range and selection, then runs Go again; for an action whose
+    /// result depends on the range's samples alone (RedoPutsResultBack), the
+    /// result the undo took away is put back instead when that is what Go
+    /// would compute.
     virtual status_t Redo();
     virtual const char* Name();
     /// The menu the window lists the action's command under.
@@ -75,12 +79,30 @@ public:
     static SampleAllocator::Array AllocateSamples(int64_t count);
 
 protected:
+    /// True for actions whose Go rewrites only the ranges of the selected
+    /// channels, from their samples alone: a redo may then put back what Go
+    /// made instead of computing it again. Actions that read a dialog at
+    /// every run keep the default (false).
+    virtual bool RedoPutsResultBack() const { return false; }
+
     /// One selected channel's range as it was at SetTo.
     struct SavedChannel {
         /// The range as FillBuffer gives it, kept as shared blocks.
         SampleSlice data;
         bool held = false;  // false when it could not be had
         int32_t index = 0;  // position in the manager
+        /// True when the range lay inside the channel's data at SetTo: the
+        /// transforms then change nothing but the range, and undo gives the
+        /// range back exactly.
+        bool inside = false;
+        /// The range as the last Go left it, kept by Undo for a redo that
+        /// puts it back instead of computing it again.
+        SampleSlice redo;
+        bool redoHeld = false;
+        uint64_t redoChannel = 0;  // the channel it was taken from
+        /// The range as the undo left it: a redo puts the result back only
+        /// while the range still holds these samples.
+        SampleSlice undone;
     };
 
     /// Keeps the channel's range in record: its blocks, shared.
@@ -112,9 +134,15 @@ protected:
     /// channel order, under the document lock (see RangeTransformer).
     /// B_NO_MEMORY, changing nothing, when no working buffer can be had.
     status_t TransformSelectedRanges(const std::function<void(int16_t*, int64_t)>& transform);
+    /// The same a piece at a time, in memory bounded by a block per
+    /// channel whatever the range's length.
+    status_t TransformSelectedRanges(const PieceTransform& transform);
 
 private:
     void TakeSnapshot();
+    /// Puts back the results the last undo kept; false, changing nothing,
+    /// unless it kept one for every recorded channel.
+    bool PutResultBack();
 
     MessageTarget* window_;
     ChannelManager* manager_ = nullptr;

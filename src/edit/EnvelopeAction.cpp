@@ -1,7 +1,11 @@
 #include "edit/EnvelopeAction.h"
 
 #include <optional>
+#include <memory>
 #include <span>
+#include <vector>
+
+#include "edit/RangeTransformer.h"
 
 #include "edit/effects/EnvelopeShape.h"
 
@@ -22,13 +26,33 @@ status_t EnvelopeAction::Go()
     if (InitCheck() != B_OK || Dialog() == nullptr)
         return B_ERROR;
     const std::optional<effects::SplineCurve> curve = HideAndReadCurve(*Dialog());
-    return TransformSelectedRanges([&curve](int16_t* samples, int64_t count) {
-        const std::span<int16_t> range(samples, size_t(count));
-        if (curve)
-            effects::ApplySplineEnvelope(range, *curve);
-        else
-            effects::ApplyEnvelope(range, Silence);
-    });
+    if (!curve) {
+        // A gain of 0 everywhere: every sample, silence included, becomes 0.
+        return TransformSelectedRanges(PieceTransform{
+            [](int16_t* samples, int64_t count, int64_t, int64_t) {
+                effects::ApplyEnvelope(std::span<int16_t>(samples, size_t(count)), Silence);
+            },
+            int16_t(0)});
+    }
+    // The gains follow the range from its first frame to its last; each
+    // channel's pass starts over at the first piece. Silence is computed like
+    // anything else (a gain the curve leaves unbounded would not keep it
+    // silent); the pieces that come out silent are still stored as shared
+    // silence.
+    auto gains = std::make_shared<std::optional<effects::EnvelopeGains>>();
+    auto buffer = std::make_shared<std::vector<double>>();
+    // Shared, so that the sweep's reference to the curve stays valid.
+    auto drawn = std::make_shared<const effects::SplineCurve>(*curve);
+    return TransformSelectedRanges(PieceTransform{
+        [gains, buffer, drawn](int16_t* samples, int64_t count, int64_t first, int64_t total) {
+            if (first == 0 || !*gains)
+                gains->emplace(*drawn, size_t(total));
+            buffer->resize(size_t(count));
+            const std::span<double> piece(buffer->data(), size_t(count));
+            (*gains)->Compute(size_t(first), piece);
+            effects::ApplyGains(piece, std::span<int16_t>(samples, size_t(count)));
+        },
+        std::nullopt});
 }
 
 const char* EnvelopeAction::Name()

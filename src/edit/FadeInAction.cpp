@@ -1,5 +1,6 @@
 #include "edit/FadeInAction.h"
 
+#include "edit/RangeTransformer.h"
 #include "edit/SampleTransform.h"
 
 namespace glimmet {
@@ -8,7 +9,8 @@ status_t FadeInAction::Go()
 {
     if (InitCheck() != B_OK)
         return B_NO_INIT;
-    return TransformSelectedRanges(SampleTransform::FadeIn);
+    // Silence faded stays silence.
+    return TransformSelectedRanges(PieceTransform{SampleTransform::FadeInPiece, int16_t(0)});
 }
 
 const char* FadeInAction::Name()

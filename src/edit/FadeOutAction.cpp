@@ -1,5 +1,6 @@
 #include "edit/FadeOutAction.h"
 
+#include "edit/RangeTransformer.h"
 #include "edit/SampleTransform.h"
 
 namespace glimmet {
@@ -8,7 +9,8 @@ status_t FadeOutAction::Go()
 {
     if (InitCheck() != B_OK)
         return B_ERROR;
-    return TransformSelectedRanges(SampleTransform::FadeOut);
+    // Silence faded stays silence.
+    return TransformSelectedRanges(PieceTransform{SampleTransform::FadeOutPiece, int16_t(0)});
 }
 
 const char* FadeOutAction::Name()

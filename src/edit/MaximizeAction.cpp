@@ -26,12 +26,17 @@ status_t MaximizeAction::Go()
     std::lock_guard guard(Manager()->DocumentLock());
     RangeTransformer transformer(Manager(), RangeStart(), RangeEnd());
     int16_t peak = 0;
+    // Silence never raises the peak.
     transformer.InspectSelected(
-        [&peak](const int16_t* samples, int64_t count) { peak = SampleTransform::Peak(samples, count, peak); });
+        [&peak](const int16_t* samples, int64_t count) { peak = SampleTransform::Peak(samples, count, peak); }, true);
     if (std::abs(int32_t(peak)) <= kLargestScalablePeak) {
         const float factor = SampleTransform::MaximizeFactor(peak);
-        transformer.TransformSelected(
-            [factor](int16_t* samples, int64_t count) { SampleTransform::Scale(samples, count, factor); });
+        // 0 times any factor, infinity included, stores 0.
+        transformer.TransformSelected(PieceTransform{
+            [factor](int16_t* samples, int64_t count, int64_t, int64_t) {
+                SampleTransform::Scale(samples, count, factor);
+            },
+            int16_t(0)});
     }
     return transformer.InitCheck();
 }

@@ -3,26 +3,51 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 
 #include "sound/SampleAllocator.h"
+#include "sound/SampleSlice.h"
 #include "support/Status.h"
 
 namespace glimmet {
 
 class Channel;
 class ChannelManager;
+class SampleBlock;
+
+/// A transform that can rewrite a range one piece at a time.
+struct PieceTransform {
+    /// Rewrites count samples that sit at position first of a range of
+    /// total samples; given the same samples it must write what a pass over
+    /// the whole range would write there.
+    using Apply = std::function<void(int16_t* samples, int64_t count, int64_t first, int64_t total)>;
+    Apply apply;
+    /// What a piece of silence becomes, wherever it sits, when that is one
+    /// value throughout (a fade keeps it silent, a distortion curve may lift
+    /// it): such pieces are not computed, and their result is shared. Empty
+    /// when silence must be computed like anything else.
+    std::optional<int16_t> silenceBecomes;
+    /// True when the output at position p comes from the input at position
+    /// total - 1 - p (a reversal); apply then gets the input piece that
+    /// mirrors the output piece and must reverse it.
+    bool mirrored = false;
+};
 
 /// Runs the in-place transforms over one range of every selected channel.
 ///
-/// The transforms are described as: copy the range into one working buffer,
-/// rewrite the buffer, write it back over the range; the buffer is shared by
-/// all channels and all passes of one run. A channel whose copy fails (a
-/// range starting exactly at the end of its data) therefore gets whatever
-/// the previous channel left in the buffer.
+/// The transforms behave as if the range were copied into one working
+/// buffer, rewritten and written back over the range, the buffer being
+/// shared by all channels and all passes of one run: a channel whose copy
+/// fails (a range starting exactly at the end of its data) gets whatever the
+/// previous channel left in the buffer.
 ///
-/// Writing back builds new blocks for the range only: the rest of each
-/// channel keeps its blocks, and the blocks the range had stay with whoever
-/// shares them (the action's undo snapshot).
+/// The pieced passes never hold the range in memory: the range is read as
+/// shared blocks, rewritten a block at a time into new blocks, and the
+/// silence in it (before or past a channel's data, or stored as the shared
+/// silence block) is passed through as shared silence when the transform
+/// says what silence becomes. A range of a billion frames around a short
+/// channel therefore costs references, not gigabytes. The whole-range
+/// passes remain for transforms that need every sample at once.
 ///
 /// Callers hold the document lock for the transformer's whole life.
 class RangeTransformer {
@@ -37,23 +62,41 @@ public:
     RangeTransformer(const RangeTransformer&) = delete;
     RangeTransformer& operator=(const RangeTransformer&) = delete;
 
-    /// B_OK when the run can go ahead; B_NO_MEMORY when a working buffer is
-    /// needed and cannot be had (nothing has been changed then).
+    /// B_OK when the run went ahead; B_NO_MEMORY when memory it needed
+    /// could not be had (a whole-range buffer refused changes nothing).
     status_t InitCheck() const { return status_; }
 
     /// One pass writing each selected channel's transformed range back.
     void TransformSelected(const Transform& transform);
-    /// One pass that only looks at each selected channel's range.
-    void InspectSelected(const Inspector& inspector);
+    /// The same, a piece at a time.
+    void TransformSelected(const PieceTransform& transform);
+    /// One pass that only looks at each selected channel's range, a piece
+    /// at a time; pieces of silence are skipped when skipSilence is true
+    /// (the inspector would learn nothing from them).
+    void InspectSelected(const Inspector& inspector, bool skipSilence = false);
 
 private:
     bool AnySelected() const;
+    bool Ready() const;
+    /// The channel's range, or what the working buffer holds when the
+    /// channel's copy fails; false when memory ran out.
+    bool ReadSource(Channel* channel, SampleSlice* source);
+    /// Builds the transformed range of source into result.
+    bool TransformSlice(const SampleSlice& source, const PieceTransform& transform, SampleSlice* result);
+    /// True when the count samples of source from index on are all known
+    /// silence: outside its blocks, or in the shared silence block.
+    static bool PieceIsSilent(const SampleSlice& source, int64_t index, int64_t count);
+    /// Copies count samples of source from index on into destination.
+    static void CopyPiece(const SampleSlice& source, int64_t index, int64_t count, int16_t* destination);
 
     ChannelManager* manager_;
     int64_t start_;
     int64_t end_;
     int64_t count_;
-    /// Silence until the first copy; a failed copy leaves it as it was.
+    /// What the working buffer holds between channels and passes: silence
+    /// until the first copy; a failed copy leaves it as it was.
+    SampleSlice held_;
+    /// The whole-range buffer, made for the first whole-range pass.
     SampleAllocator::Array buffer_;
     status_t status_ = B_OK;
 };

@@ -1,5 +1,6 @@
 #include "edit/RevertAction.h"
 
+#include "edit/RangeTransformer.h"
 #include "edit/SampleTransform.h"
 
 namespace glimmet {
@@ -8,7 +9,10 @@ status_t RevertAction::Go()
 {
     if (InitCheck() != B_OK)
         return B_ERROR;
-    return TransformSelectedRanges(SampleTransform::Revert);
+    // Each output piece is the mirrored input piece reversed.
+    return TransformSelectedRanges(PieceTransform{
+        [](int16_t* samples, int64_t count, int64_t, int64_t) { SampleTransform::Revert(samples, count); },
+        int16_t(0), true});
 }
 
 const char* RevertAction::Name()

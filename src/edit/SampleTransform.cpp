@@ -21,12 +21,12 @@ namespace {
 constexpr int64_t kBlock = 16;
 
 template <typename SampleFunction>
-inline void ForEachSample(int16_t* samples, int64_t count, SampleFunction function)
+inline void ForEachSample(int16_t* samples, int64_t count, int64_t first, SampleFunction function)
 {
     double values[kBlock];
     int64_t i = 0;
     for (; i + kBlock <= count; i += kBlock) {
-        const double base = double(i);
+        const double base = double(first + i);
         int16_t* block = samples + i;
         for (int32_t j = 0; j < int32_t(kBlock); j++)
             values[j] = function(base + double(j), block[j]);
@@ -34,23 +34,23 @@ inline void ForEachSample(int16_t* samples, int64_t count, SampleFunction functi
             block[j] = SampleTransform::StoreTruncated(values[j]);
     }
     for (; i < count; i++)
-        samples[i] = SampleTransform::StoreTruncated(function(double(i), samples[i]));
+        samples[i] = SampleTransform::StoreTruncated(function(double(first + i), samples[i]));
 }
 
-GLIMMET_VECTOR_CLONES void FadeInSamples(int16_t* samples, int64_t count, double last)
+GLIMMET_VECTOR_CLONES void FadeInSamples(int16_t* samples, int64_t count, int64_t first, double last)
 {
-    ForEachSample(samples, count, [last](double position, int16_t sample) { return position * double(sample) / last; });
+    ForEachSample(samples, count, first, [last](double position, int16_t sample) { return position * double(sample) / last; });
 }
 
-GLIMMET_VECTOR_CLONES void FadeOutSamples(int16_t* samples, int64_t count, double last)
+GLIMMET_VECTOR_CLONES void FadeOutSamples(int16_t* samples, int64_t count, int64_t first, double last)
 {
     ForEachSample(
-        samples, count, [last](double position, int16_t sample) { return (1.0 - position / last) * double(sample); });
+        samples, count, first, [last](double position, int16_t sample) { return (1.0 - position / last) * double(sample); });
 }
 
 GLIMMET_VECTOR_CLONES void ScaleSamples(int16_t* samples, int64_t count, double factor)
 {
-    ForEachSample(samples, count, [factor](double, int16_t sample) { return factor * double(sample); });
+    ForEachSample(samples, count, 0, [factor](double, int16_t sample) { return factor * double(sample); });
 }
 
 // A one-sample range divides 0 by 0: not-a-number, which stores 0. Said
@@ -67,16 +67,26 @@ bool ClearSingleSample(int16_t* samples, int64_t count)
 
 void SampleTransform::FadeIn(int16_t* samples, int64_t count)
 {
-    if (ClearSingleSample(samples, count))
-        return;
-    FadeInSamples(samples, count, double(count - 1));
+    FadeInPiece(samples, count, 0, count);
 }
 
 void SampleTransform::FadeOut(int16_t* samples, int64_t count)
 {
-    if (ClearSingleSample(samples, count))
+    FadeOutPiece(samples, count, 0, count);
+}
+
+void SampleTransform::FadeInPiece(int16_t* samples, int64_t count, int64_t first, int64_t total)
+{
+    if (ClearSingleSample(samples, total))
         return;
-    FadeOutSamples(samples, count, double(count - 1));
+    FadeInSamples(samples, count, first, double(total - 1));
+}
+
+void SampleTransform::FadeOutPiece(int16_t* samples, int64_t count, int64_t first, int64_t total)
+{
+    if (ClearSingleSample(samples, total))
+        return;
+    FadeOutSamples(samples, count, first, double(total - 1));
 }
 
 void SampleTransform::Revert(int16_t* samples, int64_t count)

@@ -30,6 +30,11 @@ public:
     /// s' = (1 - i / (n - 1)) * s: gain from 1 at the first sample to 0 at
     /// the last.
     static void FadeOut(int16_t* samples, int64_t count);
+    /// FadeIn and FadeOut for the count samples that sit at position first
+    /// of a range of total samples: the same values the whole range would
+    /// get, so a long range can be faded a piece at a time.
+    static void FadeInPiece(int16_t* samples, int64_t count, int64_t first, int64_t total);
+    static void FadeOutPiece(int16_t* samples, int64_t count, int64_t first, int64_t total);
     /// Reverses the order of the samples; an odd count keeps the middle one.
     static void Revert(int16_t* samples, int64_t count);
     /// 16-bit negation: -32768 stays -32768.

@@ -8,7 +8,7 @@ namespace glimmet {
 BlockBuilder::BlockBuilder() = default;
 BlockBuilder::~BlockBuilder() = default;
 
-const BlockRef& BlockBuilder::ZeroBlock()
+const BlockRef& BlockBuilder::Silence()
 {
     // Silence is shared like any other block: a channel pushed far along
     // the timeline by an insert costs references, not zeroed memory.
@@ -81,19 +81,48 @@ void BlockBuilder::AppendSamples(const int16_t* samples, int64_t count)
 
 void BlockBuilder::AppendZeros(int64_t count)
 {
+    AppendRepeated(0, count, Silence());
+}
+
+BlockRef BlockBuilder::RepeatedBlock(int16_t value)
+{
+    if (value == 0)
+        return Silence();
+    std::shared_ptr<SampleBlock> block = SampleBlock::Allocate(kBlockSamples);
+    if (block != nullptr)
+        std::fill_n(block->MutableSamples(), kBlockSamples, value);
+    return block;
+}
+
+void BlockBuilder::AppendRepeated(int16_t sample, int64_t count, const BlockRef& repeated)
+{
+    const bool shareable = repeated != nullptr && repeated->Count() == kBlockSamples;
     while (ok_ && count > 0) {
-        if (pendingCount_ == 0 && count >= kBlockSamples && ZeroBlock() != nullptr) {
-            list_.Append(ZeroBlock());
+        if (pendingCount_ == 0 && count >= kBlockSamples && shareable) {
+            list_.Append(repeated);
             count -= kBlockSamples;
             continue;
         }
         if (!EnsurePending())
             return;
         const int64_t part = std::min(count, kBlockSamples - pendingCount_);
-        std::memset(pending_->MutableSamples() + pendingCount_, 0, size_t(part) * sizeof(int16_t));
+        std::fill_n(pending_->MutableSamples() + pendingCount_, part, sample);
         pendingCount_ += part;
         count -= part;
     }
+}
+
+void BlockBuilder::AppendFresh(std::shared_ptr<SampleBlock> block)
+{
+    if (block == nullptr) {
+        ok_ = false;
+        return;
+    }
+    if (pendingCount_ > 0) {
+        AppendSamples(block->Samples(), block->Count());
+        return;
+    }
+    AddFresh(std::move(block));
 }
 
 void BlockBuilder::AppendBlock(const BlockRef& block)

@@ -31,8 +31,25 @@ public:
 
     void AppendSamples(const int16_t* samples, int64_t count);
     void AppendZeros(int64_t count);
+    /// count copies of sample; whole blocks of them are all one shared
+    /// block, so a long constant run costs references. repeated, when given,
+    /// must be a full block of that sample (it is what gets shared).
+    void AppendRepeated(int16_t sample, int64_t count, const BlockRef& repeated);
+    /// A block made for this list alone (its samples are not copied again);
+    /// when a short piece is pending it is copied behind it instead.
+    void AppendFresh(std::shared_ptr<SampleBlock> block);
     /// The samples index .. index + count - 1 of list, clipped to it.
     void AppendRange(const BlockList& list, int64_t index, int64_t count);
+
+    /// The one all-zero block of kBlockSamples that every run of silence
+    /// shares; null only when it could not be had at all.
+    static const BlockRef& Silence();
+    /// True for the shared silence block: a reader may treat its samples as
+    /// zeros without looking at them.
+    static bool IsSilence(const SampleBlock* block) { return block != nullptr && block == Silence().get(); }
+    /// A full block of value (the shared silence block for 0), or null when
+    /// it cannot be had.
+    static BlockRef RepeatedBlock(int16_t value);
 
     /// False once a block could not be had; the result is then incomplete.
     bool Ok() const { return ok_; }
@@ -48,7 +65,6 @@ private:
     /// Room for more samples in the pending block; false when none can be had.
     bool EnsurePending();
     void FlushPending();
-    static const BlockRef& ZeroBlock();
 
     BlockList list_;
     std::shared_ptr<SampleBlock> pending_;

@@ -19,6 +19,8 @@ struct SampleSlice {
     int64_t newBytes = 0;
 
     int64_t Count() const { return leading + blocks.Count() + trailing; }
+    /// True when both hold the same samples; blocks they share are not read.
+    bool SameSamples(const SampleSlice& other) const;
     /// Writes the Count() samples to destination.
     void CopyTo(int16_t* destination) const;
 };
