@@ -445,9 +445,11 @@ void SoakModel::GoPaste(SoakRecord& r)
     r.pasted = 0;
     const int64_t frames = int64_t(copyBuffer[0].size());
     const bool replace = r.firstChannel >= 0 && r.start >= 0 && r.start <= r.end;
-    // Inserting with no channel focused starts at the first channel.
+    // Inserting goes into the channel focused now, which for a redo may not
+    // be the one focused when the paste was first made; with none focused
+    // it starts at the first channel.
     if (!replace)
-        r.firstChannel = std::max(r.focused, 0);
+        r.firstChannel = std::max(focus, 0);
     for (size_t i = 0; i < copyBuffer.size(); i++) {
         const size_t target = size_t(r.firstChannel) + i;
         if (target >= channels.size())

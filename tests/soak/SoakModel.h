@@ -70,6 +70,9 @@ public:
     int64_t rangeStart = -1;
     int64_t rangeEnd = -1;
     std::vector<std::vector<int16_t>> copyBuffer;
+    /// The focused channel when an action runs (-1: none). A paste that
+    /// inserts reads it then, also when redone, not when it was bound.
+    int32_t focus = -1;
     std::vector<SoakRecord> undo;
     std::vector<SoakRecord> redo;
 

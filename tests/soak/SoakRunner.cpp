@@ -46,7 +46,16 @@ SoakResult RunSoakSteps(uint64_t seed, const std::vector<SoakStep>& steps)
         return result;
     }
     for (size_t i = 0; i < steps.size(); i++) {
-        result.log.push_back(session.Apply(steps[i]));
+        try {
+            result.log.push_back(session.Apply(steps[i]));
+        } catch (const std::exception& error) {
+            // The model's vectors or the document ran out of memory: a
+            // failure of this step like any other, so that it shrinks.
+            result.log.push_back(std::string("step threw ") + error.what());
+            result.failedAt = long(i);
+            result.difference = result.log.back();
+            return result;
+        }
         if (std::getenv("GLIMMET_SOAK_TRACE") != nullptr)
             std::fprintf(stderr, "%zu. [%lld] %s\n", i, (long long)session.Total(), result.log.back().c_str());
         difference = session.Difference();

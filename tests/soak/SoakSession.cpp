@@ -199,6 +199,7 @@ std::string SoakSession::Act(Kind kind, const SoakStep& step)
     const int32_t focus = int32_t((step.r[3] >> 50) % (model_.channels.size() + 1)) - 1;
     document_.position.SetCursorFrame(cursor);
     document_.position.SetFocusIndex(focus);
+    model_.focus = focus;
     std::unique_ptr<Action> action = MakeAction(kind, &copyBuffer_);
     std::ostringstream out;
     out << SoakKindName(kind) << " over " << model_.rangeStart << ".." << model_.rangeEnd << ", cursor " << cursor
@@ -309,14 +310,19 @@ std::string SoakSession::Move(const SoakStep& step, bool huge)
     // frames long; the far move is taken back at once, and sometimes done
     // and taken back again.
     if (huge)
-        done += "; " + Runs(true, 1) + (step.r[3] % 2 == 0 ? "; " + Runs(false, 1) + "; " + Runs(true, 1) : "");
+        done += "; " + Runs(true, 1) + (step.r[3] % 2 == 0 ? "; " + Runs(false, 1, true) + "; " + Runs(true, 1) : "");
     return done;
 }
 
-std::string SoakSession::Runs(bool undo, uint64_t count)
+std::string SoakSession::Runs(bool undo, uint64_t count, bool far)
 {
     uint64_t done = 0;
     for (uint64_t i = 0; i < count; i++) {
+        // A far move is only ever done and taken back at once (see Move):
+        // left done, every later range would be billions of frames long.
+        if (!undo && !far && !model_.redo.empty() && model_.redo.back().kind == Kind::Move
+            && (model_.redo.back().offset > kLongDocument || model_.redo.back().offset < -kLongDocument))
+            break;
         const status_t status = undo ? history_.Undo() : history_.Redo();
         const bool expected = undo ? model_.Undo() : model_.Redo();
         if ((status == B_OK) != expected) {

@@ -38,7 +38,7 @@ private:
     std::string Move(const SoakStep& step, bool huge);
     std::string CopyStep();
     std::string ForeignCopy(const SoakStep& step);
-    std::string Runs(bool undo, uint64_t count);
+    std::string Runs(bool undo, uint64_t count, bool far = false);
     std::string DeleteHistory();
     void ChooseSelection(uint64_t bits);
     void ChooseRange(const SoakStep& step, bool shorten);
