@@ -1,0 +1,494 @@
+#include "SoakModel.h"
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+
+#include "edit/ModelChannel.h"
+#include "edit/TransformReference.h"
+#include "sound/Channel.h"
+#include "support/FrameArithmetic.h"
+
+namespace glimmet::test {
+
+using Kind = SoakRecord::Kind;
+
+const char* SoakKindName(Kind kind)
+{
+    switch (kind) {
+    case Kind::FadeIn: return "Fade In";
+    case Kind::FadeOut: return "Fade Out";
+    case Kind::Maximize: return "Maximize";
+    case Kind::Revert: return "Revert";
+    case Kind::RevertPhases: return "Revert Phases";
+    case Kind::Remove: return "Remove";
+    case Kind::Paste: return "Paste";
+    case Kind::Truncate: return "Truncate";
+    case Kind::Move: return "Move Sample";
+    case Kind::AddChannel: return "Add Channel";
+    case Kind::RemoveChannel: return "Remove Channel";
+    }
+    return "";
+}
+
+namespace {
+
+bool IsTransform(Kind kind)
+{
+    return kind == Kind::FadeIn || kind == Kind::FadeOut || kind == Kind::Maximize || kind == Kind::Revert
+        || kind == Kind::RevertPhases;
+}
+
+}  // namespace
+
+int64_t SoakModel::Total() const
+{
+    int64_t total = 0;
+    for (const SoakChannel& c : channels)
+        total = std::max(total, ModelChannel::End(c.state));
+    return total;
+}
+
+void SoakModel::SetRangeStart(int64_t frame)
+{
+    const int64_t total = Total();
+    rangeStart = frame >= total ? total - 1 : frame;
+    if (rangeStart > rangeEnd)
+        rangeEnd = frame;
+}
+
+void SoakModel::SetRangeEnd(int64_t frame)
+{
+    const int64_t total = Total();
+    rangeEnd = frame >= total ? total - 1 : frame;
+    if (rangeStart > rangeEnd)
+        rangeStart = frame;
+}
+
+SoakChannel* SoakModel::WithId(uint64_t id)
+{
+    for (SoakChannel& c : channels) {
+        if (c.id == id)
+            return &c;
+    }
+    return nullptr;
+}
+
+void SoakModel::Insert(SoakChannel& c, const std::vector<int16_t>& frames, int64_t at)
+{
+    if (frames.empty())
+        return;
+    if (!c.hasData) {
+        // Nothing to keep: the frames become the data where they go.
+        c.state.samples = frames;
+        c.state.first = at;
+        c.hasData = true;
+        return;
+    }
+    ModelChannel::Insert(c.state, frames, at);
+}
+
+void SoakModel::Replace(SoakChannel& c, const std::vector<int16_t>& frames, int64_t from, int64_t to)
+{
+    if (frames.empty() || from > to || from < 0)
+        return;
+    if (!c.hasData) {
+        c.state.samples = frames;
+        c.state.first = from;
+        c.hasData = true;
+        return;
+    }
+    ModelChannel::Replace(c.state, frames, from, to);
+}
+
+void SoakModel::Remove(SoakChannel& c, int64_t from, int64_t to)
+{
+    const int64_t end = ModelChannel::End(c.state);
+    if (from < 0 || from > to || from > end)
+        return;
+    // Both cutting branches build the data again, even when nothing is cut,
+    // which gives a data-less channel an empty array of its own.
+    if (c.state.first <= from || std::min(to, end - 1) >= c.state.first)
+        c.hasData = true;
+    ModelChannel::Remove(c.state, from, to);
+}
+
+SoakRecord SoakModel::Bind(Kind kind, int64_t cursor, int32_t focused)
+{
+    SoakRecord r;
+    r.kind = kind;
+    r.start = rangeStart;
+    r.end = rangeEnd;
+    r.cursor = cursor;
+    r.focused = focused;
+    const int64_t n = r.end - r.start + 1;
+    for (size_t i = 0; i < channels.size(); i++) {
+        const ChannelState& c = channels[i].state;
+        if (!c.selected)
+            continue;
+        if (kind == Kind::Truncate) {
+            SoakRecord::Kept k{int32_t(i), c.first, false, {}, {}};
+            if (c.first <= r.start) {
+                k.hasHead = true;
+                if (!ModelChannel::Fill(c, k.head, c.first, r.start - c.first))
+                    k.head.assign(size_t(r.start - c.first), 0);
+            }
+            const int64_t tail = ModelChannel::End(c) - r.end - 1;
+            if (tail > 0 && !ModelChannel::Fill(c, k.tail, r.end + 1, tail))
+                k.tail.assign(size_t(tail), 0);
+            r.kept.push_back(k);
+        } else if (n >= 1) {
+            std::vector<int16_t> data;
+            // A transform's range starting before frame 0 is never written
+            // back, so its frames need not be kept (they may be billions).
+            if (!(IsTransform(kind) && r.start < 0) && !ModelChannel::Fill(c, data, r.start, n))
+                data.assign(size_t(n), 0);
+            r.snapshot.emplace_back(int32_t(i), data);
+        }
+    }
+    return r;
+}
+
+void SoakModel::Perform(Kind kind, int64_t cursor, int32_t focused)
+{
+    SoakRecord r = Bind(kind, cursor, focused);
+    Go(r);
+    undo.push_back(std::move(r));
+    redo.clear();
+}
+
+void SoakModel::RecordMove(uint64_t id, int64_t before, int64_t after)
+{
+    SoakRecord r;
+    r.kind = Kind::Move;
+    r.channelId = id;
+    r.offset = before - after;
+    undo.push_back(std::move(r));
+    redo.clear();
+}
+
+void SoakModel::RecordAddChannel(uint64_t id, int32_t focused)
+{
+    SoakRecord r;
+    r.kind = Kind::AddChannel;
+    r.focused = focused;
+    SoakChannel fresh;
+    fresh.id = id;
+    fresh.hasData = false;
+    fresh.state.first = 0;
+    fresh.state.pan = Channel::kPanMiddle;
+    channels.push_back(fresh);
+    r.held.id = id;
+    undo.push_back(std::move(r));
+    redo.clear();
+}
+
+bool SoakModel::Undo()
+{
+    if (undo.empty())
+        return false;
+    UndoRecord(undo.back());
+    redo.push_back(std::move(undo.back()));
+    undo.pop_back();
+    return true;
+}
+
+bool SoakModel::Redo()
+{
+    if (redo.empty())
+        return false;
+    RedoRecord(redo.back());
+    undo.push_back(std::move(redo.back()));
+    redo.pop_back();
+    return true;
+}
+
+bool SoakModel::Copy()
+{
+    const int64_t n = rangeEnd - rangeStart + 1;
+    std::vector<std::vector<int16_t>> copied;
+    for (const SoakChannel& c : channels) {
+        if (!c.state.selected)
+            continue;
+        if (n < 1)
+            return false;
+        std::vector<int16_t> data;
+        if (!ModelChannel::Fill(c.state, data, rangeStart, n))
+            return false;  // the runner never copies from a channel's end
+        copied.push_back(std::move(data));
+    }
+    if (copied.empty())
+        return false;
+    copyBuffer = std::move(copied);
+    return true;
+}
+
+void SoakModel::Go(SoakRecord& r)
+{
+    switch (r.kind) {
+    case Kind::Remove: return GoRemove(r);
+    case Kind::Paste: return GoPaste(r);
+    case Kind::Truncate: return GoTruncate(r);
+    case Kind::RemoveChannel: return GoRemoveChannel(r);
+    case Kind::Move:
+    case Kind::AddChannel: return;
+    default: return GoTransform(r);
+    }
+}
+
+void SoakModel::Shift(uint64_t id, int64_t frames, bool back)
+{
+    SoakChannel* c = WithId(id);
+    if (c == nullptr)
+        return;
+    // The first frame saturates instead of wrapping, then is kept between
+    // frame 0 and the latest first frame a channel may have.
+    const int64_t moved = back ? SaturatingAdd(c->state.first, frames) : SaturatingSubtract(c->state.first, frames);
+    c->state.first = std::clamp<int64_t>(moved, 0, Channel::kLastFirstFrame);
+}
+
+void SoakModel::UndoRecord(SoakRecord& r)
+{
+    switch (r.kind) {
+    case Kind::Move: return Shift(r.channelId, r.offset, true);
+    case Kind::AddChannel: {
+        auto found = std::find_if(channels.begin(), channels.end(), [&](const SoakChannel& c) { return c.id == r.held.id; });
+        if (found != channels.end()) {
+            r.held = *found;
+            r.removedOne = true;
+            channels.erase(found);
+        }
+        return;
+    }
+    case Kind::RemoveChannel:
+        if (r.removedOne && size_t(r.index) <= channels.size())
+            channels.insert(channels.begin() + r.index, r.held);
+        return;
+    case Kind::Truncate: return UndoTruncate(r);
+    case Kind::Paste: return UndoPaste(r);
+    default: break;
+    }
+    std::vector<int32_t> indexes;
+    for (const auto& entry : r.snapshot)
+        indexes.push_back(entry.first);
+    Walk(indexes, [&](SoakChannel& c, size_t k) {
+        const std::vector<int16_t>& data = r.snapshot[k].second;
+        if (r.kind == Kind::Remove)
+            Insert(c, data, r.start);
+        else
+            Replace(c, data, r.start, r.end);
+    });
+    RestoreRange(r);
+}
+
+void SoakModel::UndoTruncate(const SoakRecord& r)
+{
+    std::vector<int32_t> indexes;
+    for (const auto& kept : r.kept)
+        indexes.push_back(kept.index);
+    Walk(indexes, [&](SoakChannel& c, size_t k) {
+        const SoakRecord::Kept& kept = r.kept[k];
+        c.state.first = std::max<int64_t>(kept.first, 0);
+        if (kept.hasHead)
+            Insert(c, kept.head, kept.first);
+        if (!kept.tail.empty())
+            Insert(c, kept.tail, r.end + 1);
+    });
+    RestoreRange(r);
+}
+
+void SoakModel::UndoPaste(const SoakRecord& r)
+{
+    std::vector<int32_t> indexes;
+    for (const auto& entry : r.snapshot)
+        indexes.push_back(entry.first);
+    if (!r.hadBuffer) {
+        Walk(indexes, nullptr);
+    } else if (r.snapshot.empty()) {
+        for (int32_t i = 0; i < r.pasted && size_t(r.firstChannel + i) < channels.size(); i++) {
+            Remove(channels[size_t(r.firstChannel + i)], r.pasteStart, r.pasteEnd);
+            channels[size_t(r.firstChannel + i)].state.selected = true;
+        }
+    } else {
+        Walk(indexes, [&](SoakChannel& c, size_t k) { Replace(c, r.snapshot[k].second, r.pasteStart, r.pasteEnd); });
+    }
+    RestoreRange(r);
+}
+
+void SoakModel::RedoRecord(SoakRecord& r)
+{
+    switch (r.kind) {
+    case Kind::Move: return Shift(r.channelId, r.offset, false);
+    case Kind::AddChannel:
+        if (r.removedOne) {
+            channels.push_back(r.held);
+            r.removedOne = false;
+        }
+        return;
+    case Kind::RemoveChannel:
+        if (r.removedOne) {
+            r.held = channels[size_t(r.index)];
+            channels.erase(channels.begin() + r.index);
+        }
+        return;
+    default: break;
+    }
+    RestoreRange(r);
+    std::vector<int32_t> indexes;
+    if (r.kind == Kind::Truncate) {
+        for (const auto& kept : r.kept)
+            indexes.push_back(kept.index);
+    } else {
+        for (const auto& entry : r.snapshot)
+            indexes.push_back(entry.first);
+    }
+    Walk(indexes, nullptr);
+    Go(r);
+}
+
+void SoakModel::Walk(const std::vector<int32_t>& indexes, const std::function<void(SoakChannel&, size_t)>& visit)
+{
+    size_t next = 0;
+    for (size_t i = 0; i < channels.size() && next < indexes.size(); i++) {
+        if (indexes[next] != int32_t(i)) {
+            channels[i].state.selected = false;
+            continue;
+        }
+        channels[i].state.selected = true;
+        if (visit)
+            visit(channels[i], next);
+        next++;
+    }
+}
+
+void SoakModel::RestoreRange(const SoakRecord& r)
+{
+    SetRangeStart(r.start);
+    SetRangeEnd(r.end);
+}
+
+void SoakModel::GoTransform(const SoakRecord& r)
+{
+    const int64_t n = r.end - r.start + 1;
+    // Nothing can be written back before frame 0, so such a range changes
+    // nothing whatever the transform computes.
+    if (n < 1 || r.start < 0)
+        return;
+    // One working buffer for all channels: a channel that cannot be read
+    // (the range starts exactly at its end) gets what the last one left.
+    std::vector<int16_t> buffer(size_t(n), 0);
+    auto pass = [&](const std::function<void(std::vector<int16_t>&)>& change, bool write) {
+        for (SoakChannel& c : channels) {
+            if (!c.state.selected)
+                continue;
+            std::vector<int16_t> filled;
+            if (ModelChannel::Fill(c.state, filled, r.start, n))
+                buffer = filled;
+            change(buffer);
+            if (write)
+                Replace(c, buffer, r.start, r.end);
+        }
+    };
+    using Ref = TransformReference;
+    switch (r.kind) {
+    case Kind::FadeIn: pass([](auto& b) { b = Ref::FadeIn(b); }, true); break;
+    case Kind::FadeOut: pass([](auto& b) { b = Ref::FadeOut(b); }, true); break;
+    case Kind::Revert: pass([](auto& b) { b = Ref::Revert(b); }, true); break;
+    case Kind::RevertPhases: pass([](auto& b) { b = Ref::RevertPhases(b); }, true); break;
+    default: {
+        int peak = 0;
+        pass([&peak](auto& b) {
+            for (int16_t v : b) {
+                if (std::abs(int(v)) > std::abs(peak))
+                    peak = v;
+            }
+        }, false);
+        if (std::abs(peak) > 32766)
+            break;
+        const float factor = peak == 0 ? std::numeric_limits<float>::infinity() : std::fabs(32767.0f / float(peak));
+        pass([factor](auto& b) {
+            for (int16_t& v : b)
+                v = Ref::Low16(double(factor) * v);
+        }, true);
+    }
+    }
+}
+
+void SoakModel::GoRemove(const SoakRecord& r)
+{
+    bool cut = false;
+    for (SoakChannel& c : channels) {
+        if (!c.state.selected)
+            continue;
+        Remove(c, r.start, r.end);
+        c.state.selected = false;
+        cut = true;
+    }
+    if (cut) {
+        SetRangeStart(-1);
+        SetRangeEnd(-1);
+    }
+}
+
+void SoakModel::GoPaste(SoakRecord& r)
+{
+    r.firstChannel = -1;
+    for (size_t i = 0; i < channels.size(); i++) {
+        if (channels[i].state.selected) {
+            r.firstChannel = int32_t(i);
+            break;
+        }
+    }
+    r.hadBuffer = !copyBuffer.empty();
+    if (!r.hadBuffer)
+        return;
+    r.pasted = 0;
+    const int64_t frames = int64_t(copyBuffer[0].size());
+    const bool replace = r.firstChannel >= 0 && r.start >= 0 && r.start <= r.end;
+    // Inserting goes into the channel focused now, which for a redo may not
+    // be the one focused when the paste was first made; with none focused
+    // it starts at the first channel.
+    if (!replace)
+        r.firstChannel = std::max(focus, 0);
+    for (size_t i = 0; i < copyBuffer.size(); i++) {
+        const size_t target = size_t(r.firstChannel) + i;
+        if (target >= channels.size())
+            break;
+        if (replace) {
+            Replace(channels[target], copyBuffer[i], r.start, r.end);
+        } else {
+            Insert(channels[target], copyBuffer[i], r.cursor);
+            channels[target].state.selected = true;
+        }
+        r.pasted++;
+    }
+    r.pasteStart = replace ? r.start : r.cursor;
+    r.pasteEnd = r.cursor + frames - 1;
+    if (!replace)
+        SetRangeStart(r.pasteStart);
+    SetRangeEnd(r.pasteEnd);
+}
+
+void SoakModel::GoTruncate(const SoakRecord& r)
+{
+    for (SoakChannel& c : channels) {
+        if (!c.state.selected)
+            continue;
+        Remove(c, r.end + 1, ModelChannel::End(c.state) - 1);
+        Remove(c, 0, r.start - 1);
+        c.state.selected = false;
+    }
+}
+
+void SoakModel::GoRemoveChannel(SoakRecord& r)
+{
+    r.removedOne = false;
+    if (r.focused < 0 || size_t(r.focused) >= channels.size())
+        return;
+    r.index = r.focused;
+    r.held = channels[size_t(r.index)];
+    channels.erase(channels.begin() + r.index);
+    r.removedOne = true;
+}
+
+}  // namespace glimmet::test
