@@ -1,5 +1,6 @@
 #include "edit/SelectionCopier.h"
 
+#include <algorithm>
 #include <vector>
 
 #include "edit/Action.h"
@@ -30,7 +31,11 @@ std::vector<CopyBuffer::Samples> CopyRanges(const std::vector<Channel*>& channel
         CopyBuffer::Samples samples = Action::AllocateSamples(frames);
         if (!samples)
             return {};
-        channel->FillBuffer(samples.get(), start, frames);
+        // A channel that refuses the read (a range starting exactly at its
+        // end) leaves the array untouched: its part of the copy is silence,
+        // never whatever the memory held before.
+        if (!channel->FillBuffer(samples.get(), start, frames))
+            std::fill_n(samples.get(), frames, int16_t(0));
         copies.push_back(std::move(samples));
     }
     return copies;

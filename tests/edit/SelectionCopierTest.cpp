@@ -2,10 +2,12 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <vector>
 
 #include "TestDocument.h"
 #include "edit/CopyBuffer.h"
+#include "sound/Channel.h"
 
 namespace glimmet {
 namespace {
@@ -37,6 +39,26 @@ TEST(SelectionCopierTest, CopiesTheRangeOfEverySelectedChannelInOrder)
     CopyBuffer buffer;
     ASSERT_TRUE(SelectionCopier::CopySelection(document.manager, buffer));
     const std::vector<std::vector<int16_t>> expected{{3, 4, 5, 6}, {203, 204, 205, 206}};
+    EXPECT_EQ(Contents(buffer), expected);
+}
+
+// The read from the channel that ends where the range starts is refused
+// ("what the....?"); its part of the copy is silence, not what the recycled
+// array held before.
+TEST(SelectionCopierTest, AChannelEndingWhereTheRangeStartsGivesSilence)
+{
+    TestDocument document;
+    document.AddChannel(Ramp(0, 20), 0, true);
+    document.AddChannel(Ramp(100, 40), 0, true);
+    for (int round = 0; round < 4; ++round) {
+        SampleAllocator::Array used = Channel::Allocate(4);
+        ASSERT_TRUE(used);
+        std::fill_n(used.get(), 4, int16_t(0x7777));
+    }
+    document.SetRange(20, 23);
+    CopyBuffer buffer;
+    ASSERT_TRUE(SelectionCopier::CopySelection(document.manager, buffer));
+    const std::vector<std::vector<int16_t>> expected{{0, 0, 0, 0}, {120, 121, 122, 123}};
     EXPECT_EQ(Contents(buffer), expected);
 }
 

@@ -219,22 +219,8 @@ std::string SoakSession::Act(Kind kind, const SoakStep& step)
     return out.str();
 }
 
-bool SoakSession::CopyWouldReadAnEnd() const
-{
-    for (const SoakChannel& c : model_.channels) {
-        if (c.state.selected && model_.rangeStart == ModelChannel::End(c.state))
-            return true;
-    }
-    return false;
-}
-
 std::string SoakSession::CopyStep()
 {
-    // A copy whose range starts exactly at a selected channel's end gets
-    // nothing from that channel: the copy's frames for it are left as the
-    // allocator gave them, so no model can say what a paste of them holds.
-    if (CopyWouldReadAnEnd())
-        return "Copy skipped: the range starts at a selected channel's end";
     const bool copied = SelectionCopier::CopySelection(document_.manager, copyBuffer_);
     const bool expected = model_.Copy();
     std::ostringstream out;

@@ -43,7 +43,6 @@ private:
     void ChooseSelection(uint64_t bits);
     void ChooseRange(const SoakStep& step, bool shorten);
     int64_t Frame(uint64_t r) const;
-    bool CopyWouldReadAnEnd() const;
 
     TestDocument document_;
     HistoryManager history_;
