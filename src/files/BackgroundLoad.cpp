@@ -65,7 +65,9 @@ status_t BackgroundLoad::Finish(LoadTarget& target)
     if (finished_ || progress_.IsCancelled())
         return B_ERROR;
     finished_ = true;
-    if (!report_.opened)
+    // A file that could not be opened, or whose samples would not fit,
+    // leaves the window as it was.
+    if (!report_.opened || report_.refused)
         return status_;
     Hand(target.DocumentManager());
     if (report_.replacedDocument)

@@ -6,6 +6,7 @@
 
 #include "files/MediaFormat.h"
 #include "files/MediaTrack.h"
+#include "files/MemoryBudget.h"
 #include "sound/BlockBuilder.h"
 #include "sound/BlockList.h"
 #include "sound/Channel.h"
@@ -29,8 +30,10 @@ bool ChannelTrackLoader::Load(Channel& channel, MediaTrack* track, uint32_t inde
     if (!accepted)
         return false;
     channel.SetPanPosition(index % 2 == 1 ? Channel::kPanRight : Channel::kPanLeft);
-    // Channels hold at most 2^32 - 1 samples.
-    if (count > int64_t(UINT32_MAX))
+    // Channels hold at most 2^32 - 1 samples, and never more than the
+    // memory that can be had: the count is checked before anything is
+    // allocated for it.
+    if (count > int64_t(UINT32_MAX) || count > MemoryBudget::ForSamples() / int64_t(sizeof(int16_t)))
         return false;
     const std::vector<std::shared_ptr<SampleBlock>> blocks = AllocateBlocks(count);
     if (blocks.empty())

@@ -3,14 +3,16 @@
 #include <algorithm>
 #include <system_error>
 
-#include "files/FrameSpreader.h"
+#include "files/DecodedBlocks.h"
 #include "files/LoadTarget.h"
 #include "files/MediaFile.h"
 #include "files/MediaFormat.h"
 #include "files/MediaTrack.h"
+#include "files/MemoryBudget.h"
+#include "sound/BlockBuilder.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
-#include "sound/SampleAllocator.h"
+#include "support/Diagnostics.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet {
@@ -33,59 +35,27 @@ media_format ShortAudioRequest()
     return request;
 }
 
-using SampleArray = SampleAllocator::Array;
-
-/// Arrays come from the allocator channels use, so that the first edit after
-/// a load can reuse the block it frees, and a long array is faulted in with
-/// one call rather than page by page while it is filled.
-SampleArray AllocateSamples(int64_t count)
+/// Bytes of frames frames of channels channels, saturating instead of
+/// overflowing for absurd claims.
+int64_t BytesOf(int64_t frames, int64_t channels)
 {
-    if (count <= 0)
-        return nullptr;
-    return Channel::Allocate(count);
+    const int64_t frameBytes = channels * int64_t(sizeof(int16_t));
+    if (frames <= 0 || frameBytes <= 0)
+        return 0;
+    return frames > INT64_MAX / frameBytes ? INT64_MAX : frames * frameBytes;
 }
 
-/// Copies frames interleaved frames of channels samples into the arrays
-/// (null entries are skipped) from index at on.
-void SpreadFrames(const int16_t* interleaved, int64_t frames, std::vector<SampleArray>& arrays, int64_t at)
+/// A track whose length was counted before this pass loads as long as that
+/// count said, as each channel loaded on its own would: cut, or filled up
+/// with shared silence (which costs references, not memory).
+BlockList FitToCount(BlockList samples, int64_t counted)
 {
-    const size_t channels = arrays.size();
-    if (channels == 1) {
-        if (arrays[0] != nullptr)
-            FrameSpreader::SpreadMono(interleaved, frames, arrays[0].get() + at);
-        return;
-    }
-    if (channels == 2) {
-        int16_t* left = arrays[0] == nullptr ? nullptr : arrays[0].get() + at;
-        int16_t* right = arrays[1] == nullptr ? nullptr : arrays[1].get() + at;
-        FrameSpreader::SpreadStereo(interleaved, frames, left, right);
-        return;
-    }
-    for (size_t k = 0; k < channels; ++k) {
-        int16_t* to = arrays[k].get();
-        if (to == nullptr)
-            continue;
-        for (int64_t frame = 0; frame < frames; ++frame)
-            to[at + frame] = interleaved[size_t(frame) * channels + k];
-    }
-}
-
-/// Reads the whole track once and spreads its interleaved frames over the
-/// arrays, at most capacity frames; returns how many frames it stored.
-int64_t Deinterleave(MediaTrack* track, int64_t capacity, std::vector<SampleArray>& arrays)
-{
-    int64_t seekTo = 0;
-    track->SeekToFrame(&seekTo, 0);
-    int64_t stored = 0;
-    int64_t framesRead = 0;
-    const int16_t* block = nullptr;
-    while (stored < capacity && track->ReadFramesInPlace(&block, &framesRead) == B_OK) {
-        const int64_t frames = std::min(framesRead, capacity - stored);
-        SpreadFrames(block, frames, arrays, stored);
-        stored += frames;
-    }
-    FrameSpreader::Finish();
-    return stored;
+    if (counted < 0 || samples.Empty() || samples.Count() == counted)
+        return samples;
+    BlockBuilder builder;
+    builder.AppendRange(samples, 0, counted);
+    builder.AppendZeros(counted - samples.Count());
+    return builder.Ok() ? builder.Finish() : BlockList();
 }
 
 }  // namespace
@@ -94,7 +64,7 @@ status_t DocumentLoader::Load(const std::filesystem::path& file, LoadTarget& tar
 {
     LoadReport report;
     const status_t status = Load(file, target.DocumentManager(), target.IsAppendOnLoad(), &report);
-    if (!report.opened)
+    if (!report.opened || report.refused)
         return status;
     if (report.replacedDocument)
         target.DocumentReplaced();
@@ -119,28 +89,43 @@ status_t DocumentLoader::Load(const std::filesystem::path& file, ChannelManager*
         return status;
     report->opened = true;
     report->entry = FollowLinks(file);
+    report->budgetBytes = document != nullptr ? MemoryBudget::ForSamples() : 0;
 
-    for (int32_t index = 0;; ++index) {
+    Staged staged;
+    for (int32_t index = 0; !report->refused; ++index) {
         MediaTrack* track = media.TrackAt(index);
         if (track == nullptr)
             break;
-        if (LoadTrack(track, document, append, &status, report))
+        if (LoadTrack(track, document != nullptr, append, &status, report, &staged))
             report->decodedTracks++;
         media.ReleaseTrack(track);
     }
+    if (report->refused) {
+        PrintRefusal(report->entry, *report);
+        return B_NO_MEMORY;
+    }
+    // The document changes in one go once every track is in: emptied when
+    // an audio track replaced it, then given the staged channels.
+    if (report->replacedDocument)
+        EmptyDocument(document);
+    for (std::unique_ptr<Channel>& channel : staged.channels)
+        document->AddChannel(std::move(channel));
     return status;
 }
 
-bool DocumentLoader::LoadTrack(MediaTrack* track, ChannelManager* document, bool append, status_t* status,
-                               LoadReport* report)
+bool DocumentLoader::LoadTrack(MediaTrack* track, bool hasDocument, bool append, status_t* status,
+                               LoadReport* report, Staged* staged)
 {
     media_format encoded;
     if (track->EncodedFormat(&encoded) != B_OK || !IsAudio(encoded))
         return false;
-    if (document == nullptr)
+    if (!hasDocument)
         return false;
     if (!append) {
-        EmptyDocument(document);
+        // Each audio track replaces what came before it, so only the last
+        // one's channels remain.
+        staged->channels.clear();
+        staged->bytes = 0;
         report->replacedDocument = true;
     }
 
@@ -148,9 +133,12 @@ bool DocumentLoader::LoadTrack(MediaTrack* track, ChannelManager* document, bool
     *status = track->DecodedFormat(&decoded);
     if (*status != B_OK)
         return false;
-    for (std::unique_ptr<Channel>& channel : LoadChannels(track, decoded)) {
-        if (channel != nullptr)
-            document->AddChannel(std::move(channel));
+    const int64_t budget = std::max<int64_t>(0, report->budgetBytes - staged->bytes);
+    for (std::unique_ptr<Channel>& channel : LoadChannels(track, decoded, budget, report)) {
+        if (channel == nullptr)
+            continue;
+        staged->bytes += BytesOf(channel->FrameCount(), 1);
+        staged->channels.push_back(std::move(channel));
     }
     return true;
 }
@@ -161,43 +149,78 @@ void DocumentLoader::EmptyDocument(ChannelManager* document)
         continue;
 }
 
-std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* track, const media_format& decoded)
+int64_t DocumentLoader::ClaimedFrames(MediaTrack* track)
 {
+    const int64_t header = track->HeaderFrameCount();
+    const int64_t bound = track->FrameCountBound();
+    if (header < 0 || bound < 0)
+        return header;
+    // A header may claim more than the file holds; the file's size cannot
+    // lie about what fits in it.
+    return std::min(header, bound);
+}
+
+std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* track, const media_format& decoded,
+                                                                    int64_t budgetBytes, LoadReport* report)
+{
+    LoadReport ignored;
+    if (report == nullptr)
+        report = &ignored;
     const size_t channelCount = decoded.raw_audio.channel_count;
     std::vector<std::unique_ptr<Channel>> channels(channelCount);
     media_format encoded;
     if (channelCount == 0 || track->EncodedFormat(&encoded) != B_OK || !IsAudio(encoded))
         return channels;
-    // Where the file's size bounds the length, arrays of that bound are
-    // filled in one pass and the count is what came; otherwise the exact
-    // count comes first (which may cost a decoding pass of its own).
-    const int64_t bound = track->FrameCountBound();
-    const int64_t capacity = bound >= 0 ? bound : track->CountFrames();
-    if (capacity <= 0)
-        return channels;
-
-    std::vector<SampleArray> arrays(channelCount);
-    for (size_t k = 0; k < channelCount; ++k)
-        arrays[k] = AllocateSamples(capacity);
-    const int64_t stored = Deinterleave(track, capacity, arrays);
-    const int64_t count = bound >= 0 ? stored : capacity;
-    if (count <= 0)
-        return channels;
-    // A decode that came up short of the exact count leaves silence.
-    for (auto& array : arrays) {
-        if (array != nullptr)
-            std::fill(array.get() + stored, array.get() + count, int16_t(0));
+    // A length the header gives is checked before anything is allocated;
+    // where it is missing or lies, the decoding itself stops at the budget.
+    const int64_t claimed = BytesOf(ClaimedFrames(track), int64_t(channelCount));
+    if (claimed > budgetBytes) {
+        report->refused = true;
+        report->neededBytes = claimed;
+        return {};
     }
 
+    DecodedBlocks blocks{int32_t(channelCount)};
+    int64_t seekTo = 0;
+    track->SeekToFrame(&seekTo, 0);
+    int64_t framesRead = 0;
+    const int16_t* frames = nullptr;
+    while (track->ReadFramesInPlace(&frames, &framesRead) == B_OK) {
+        // A block that cannot be had means the samples do not fit either.
+        if (!blocks.Append(frames, framesRead) || blocks.Bytes() > budgetBytes) {
+            report->refused = true;
+            report->neededBytes = -1;
+            return {};
+        }
+    }
+    if (blocks.Frames() <= 0)
+        return channels;
+
+    // Plain PCM is taken as the file holds it now; other codecs keep a count
+    // made before this pass.
+    const int64_t counted = track->FrameCountBound() >= 0 ? -1 : track->CountedFrames();
     for (size_t k = 0; k < channelCount; ++k) {
-        if (arrays[k] == nullptr)
+        BlockList samples = FitToCount(blocks.Take(int32_t(k)), counted);
+        if (samples.Empty())
             continue;
         channels[k] = std::make_unique<Channel>();
         channels[k]->SetFrameRate(decoded.raw_audio.frame_rate);
         channels[k]->SetPanPosition(k % 2 == 1 ? Channel::kPanRight : Channel::kPanLeft);
-        channels[k]->SetTo(std::move(arrays[k]), count);
+        channels[k]->SetTo(std::move(samples));
     }
     return channels;
+}
+
+void DocumentLoader::PrintRefusal(const std::filesystem::path& file, const LoadReport& report)
+{
+    const std::string budget = MemoryBudget::Describe(report.budgetBytes);
+    if (report.neededBytes >= 0) {
+        Diagnostics::PrintError("cannot open %s: its samples need %s of memory, and only %s can be had\n",
+                                file.c_str(), MemoryBudget::Describe(report.neededBytes).c_str(), budget.c_str());
+    } else {
+        Diagnostics::PrintError("cannot open %s: its samples need more than the %s of memory that can be had\n",
+                                file.c_str(), budget.c_str());
+    }
 }
 
 std::filesystem::path DocumentLoader::FollowLinks(const std::filesystem::path& file)

@@ -26,6 +26,15 @@ struct LoadReport {
     /// The document's own channels were removed for the file's: it had an
     /// audio track and the load did not append.
     bool replacedDocument = false;
+    /// The file's samples would not fit in the memory that can be had: the
+    /// document, its file entry and its title stay as they were.
+    bool refused = false;
+    /// What the samples need, when the file said so before they were
+    /// decoded; -1 when the decoding found out by passing the budget.
+    int64_t neededBytes = -1;
+    /// What they could have had (MemoryBudget::ForSamples when the load
+    /// started).
+    int64_t budgetBytes = 0;
 };
 
 /// Loads a sound file into a document: every channel of every audio track
@@ -35,7 +44,10 @@ struct LoadReport {
 class DocumentLoader {
 public:
     /// Opens file and loads it into target. Returns the file's open status
-    /// when it cannot be opened (the document is untouched), otherwise the
+    /// when it cannot be opened (the document is untouched), B_NO_MEMORY
+    /// when its samples would not fit in the memory that can be had (the
+    /// document, title and file entry are untouched, and a diagnostic says
+    /// how much was needed), otherwise the
     /// status of the last decoded-format negotiation (B_OK for a file without
     /// audio). Unless target appends, each audio track first empties the
     /// document, so only the last audio track's channels remain. Each audio
@@ -48,17 +60,35 @@ public:
                          LoadReport* report = nullptr);
 
     /// The channels of an audio track from one decoding pass, in track order;
-    /// a channel that could not be had (no frames, no memory) is null. The
-    /// result is what ChannelTrackLoader::Load gives for each channel k, without
+    /// a channel that could not be had (no frames) is null. The result is
+    /// what ChannelTrackLoader::Load gives for each channel k, without
     /// decoding the track once per channel. decoded is the format the track
-    /// agreed to.
-    static std::vector<std::unique_ptr<Channel>> LoadChannels(MediaTrack* track, const media_format& decoded);
+    /// agreed to. Samples go straight into blocks as they decode, so memory
+    /// follows what the stream holds, not what its header or the file's
+    /// size claim. When the header's length or the decoded samples pass
+    /// budgetBytes, the result is empty and report (may be null) says so
+    /// (refused, neededBytes).
+    static std::vector<std::unique_ptr<Channel>> LoadChannels(MediaTrack* track, const media_format& decoded,
+                                                              int64_t budgetBytes = INT64_MAX,
+                                                              LoadReport* report = nullptr);
 
 private:
-    /// Loads one track; *status takes the decoded-format result of an audio
-    /// track. True when an audio track agreed to a decoded format.
-    static bool LoadTrack(MediaTrack* track, ChannelManager* document, bool append, status_t* status,
-                          LoadReport* report);
+    /// The channels of the audio tracks decoded so far, not yet in the
+    /// document: a file refused halfway must leave the document as it was.
+    struct Staged {
+        std::vector<std::unique_ptr<Channel>> channels;
+        int64_t bytes = 0;
+    };
+
+    /// Loads one track into staged; *status takes the decoded-format result
+    /// of an audio track. True when an audio track agreed to a decoded
+    /// format.
+    static bool LoadTrack(MediaTrack* track, bool hasDocument, bool append, status_t* status, LoadReport* report,
+                          Staged* staged);
+    /// The frames the track claims before decoding: its header's length,
+    /// cut to what the file's size leaves room for where that is known.
+    static int64_t ClaimedFrames(MediaTrack* track);
+    static void PrintRefusal(const std::filesystem::path& file, const LoadReport& report);
     static void EmptyDocument(ChannelManager* document);
     static std::filesystem::path FollowLinks(const std::filesystem::path& file);
 };

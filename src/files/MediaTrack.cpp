@@ -55,6 +55,18 @@ media_format DescribeStream(const AVStream* stream)
     return format;
 }
 
+/// The stream's duration in frames of its own rate, computed in floating
+/// point so that no header value can overflow it; -1 when unknown.
+int64_t HeaderFramesOf(const AVStream* stream)
+{
+    const int rate = stream->codecpar->sample_rate;
+    if (stream->duration == AV_NOPTS_VALUE || stream->duration <= 0 || rate <= 0 || stream->time_base.num <= 0
+        || stream->time_base.den <= 0)
+        return -1;
+    const long double frames = (long double)stream->duration * stream->time_base.num * rate / stream->time_base.den;
+    return frames >= (long double)INT64_MAX ? INT64_MAX : int64_t(frames);
+}
+
 }  // namespace
 
 MediaTrack::MediaTrack(std::filesystem::path path, int32_t index, const AVStream* stream)
@@ -63,6 +75,8 @@ MediaTrack::MediaTrack(std::filesystem::path path, int32_t index, const AVStream
     if (stream == nullptr)
         return;
     encoded_ = DescribeStream(stream);
+    if (IsAudio())
+        headerFrames_ = HeaderFramesOf(stream);
     decoderAvailable_ = avcodec_find_decoder(stream->codecpar->codec_id) != nullptr;
     status_ = B_OK;
 }

@@ -47,10 +47,18 @@ public:
     /// decoded. Counting may decode the whole track once; the result is kept.
     int64_t CountFrames();
 
+    /// What CountFrames found, without counting: -1 until it was called.
+    int64_t CountedFrames() const { return frameCount_; }
+
     /// At least as many frames as the track decodes to, known without
     /// decoding (plain PCM in a simple container: the file's size over the
     /// frame size); -1 when there is no such bound. Needs a DecodedFormat.
     int64_t FrameCountBound();
+
+    /// The length the container's header gives, in frames at the track's
+    /// own rate; -1 when it gives none. Known without decoding, and only a
+    /// claim: the stream may hold more or fewer frames.
+    int64_t HeaderFrameCount() const { return headerFrames_; }
 
     /// Starts reading again at *frame (0 for the start). The next ReadFrames
     /// decodes from the start of the file and skips the frames before it.
@@ -79,6 +87,7 @@ private:
     bool decoderAvailable_ = false;
     int32_t decodedChannels_ = 0;  // 0 until DecodedFormat succeeded
     int64_t frameCount_ = -1;      // -1 until counted
+    int64_t headerFrames_ = -1;
     int64_t skipFrames_ = 0;
     std::unique_ptr<TrackDecoder> pass_;
 };

@@ -7,7 +7,8 @@
 #include "WavBytes.h"
 #include "files/DocumentLoader.h"
 #include "sound/Channel.h"
-#include "sound/SampleAllocator.h"
+#include "sound/BlockBuilder.h"
+#include "sound/SampleBlock.h"
 #include "support/MessageCodes.h"
 
 namespace glimmet {
@@ -244,32 +245,29 @@ TEST_F(DocumentLoaderTest, ChunksAfterTheDataDoNotLengthenTheChannels)
 namespace glimmet {
 namespace {
 
-TEST_F(DocumentLoaderTest, LongChannelsTakeTheirArraysFromTheSampleAllocator)
+TEST_F(DocumentLoaderTest, LongChannelsArriveInWholeBlocksCutToWhatDecoded)
 {
-    // 2.5 million frames: arrays of 5 MB, beyond the size the allocator maps.
+    // 2.5 million frames: 76 whole blocks and part of one more per channel.
     const std::vector<int16_t> source = SoundFixtures::Pattern(2500000, 2);
     const auto path = fixtures.WriteBytes("long.wav", test::WavBytes{}.Make(source));
-    SampleAllocator& allocator = SampleAllocator::Shared();
-    allocator.ReleaseCached();
-    const size_t mappings = allocator.MappingsMade();
     ASSERT_EQ(DocumentLoader::Load(path, window), B_OK);
-    EXPECT_EQ(allocator.MappingsMade(), mappings + 2);
-
-    // Loading again first empties the document, and the new arrays reuse
-    // the blocks the old channels gave back.
-    ASSERT_EQ(DocumentLoader::Load(path, window), B_OK);
-    EXPECT_EQ(allocator.MappingsMade(), mappings + 2);
     ASSERT_EQ(window.manager.CountChannels(), 2);
     for (int32_t k = 0; k < 2; ++k) {
         Channel* channel = window.manager.ChannelAt(k);
         ASSERT_EQ(channel->FrameCount(), 2500000);
+        std::vector<int64_t> blockSizes;
+        channel->ReadSpans(0, channel->FrameCount(), [&](const SampleSpan& span) {
+            EXPECT_EQ(span.offset, 0);
+            blockSizes.push_back(span.block->Count());
+        });
+        ASSERT_EQ(blockSizes.size(), 77u);
+        for (size_t b = 0; b + 1 < blockSizes.size(); ++b)
+            EXPECT_EQ(blockSizes[b], BlockBuilder::kBlockSamples);
+        // The last block holds what decoded and no room beyond it.
+        EXPECT_EQ(blockSizes.back(), 2500000 - 76 * BlockBuilder::kBlockSamples);
         for (int64_t i = 0; i < 2500000; ++i)
             ASSERT_EQ(channel->Data()[i], source[size_t(2 * i + k)]) << k << " " << i;
     }
-    while (window.manager.RemoveChannelAt(0))
-        continue;
-    EXPECT_EQ(allocator.CachedBlocks(), 2u);
-    allocator.ReleaseCached();
 }
 
 }  // namespace
