@@ -91,6 +91,8 @@ void ActionRunner::Go()
         return;
     }
     action->Go();
+    // Its undo data became the history's alone: time to look at the budget.
+    history_.TrimMemory();
     Redraw();
 }
 

@@ -108,6 +108,12 @@ QuillexWindow::QuillexWindow(CopyBuffer* copyBuffer)
     auto* playShortcut = new QShortcut(QKeySequence(Qt::CTRL | Qt::Key_Space), this);
     connect(playShortcut, &QShortcut::activated, this, [this] { PostMessage(kMsgTogglePlay); });
 
+    // The history writes old undo data out on a thread of its own; dropping
+    // it from memory happens here, in the thread that edits the document.
+    history_->SetSpillWrittenCallback([this] {
+        QMetaObject::invokeMethod(this, [this] { history_->TrimMemory(); }, Qt::QueuedConnection);
+    });
+
     setAcceptDrops(true);
     show();
 }
@@ -117,6 +123,7 @@ QuillexWindow::~QuillexWindow()
     // A load still running is given up; its worker ends before the document
     // it would have filled goes.
     loads_.reset();
+    history_->SetSpillWrittenCallback(nullptr);
     playback_->TearDown();
     playback_.reset();
     // The views point into the document; they go before it does.

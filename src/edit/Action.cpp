@@ -226,4 +226,12 @@ bool Action::SupportsConfiguration()
     return false;
 }
 
+void Action::VisitKeptBlocks(const BlockVisitor& visit) const
+{
+    for (const SavedChannel& record : savedChannels_) {
+        for (size_t i = 0; i < record.data.blocks.BlockCount(); ++i)
+            visit(record.data.blocks.BlockAt(i));
+    }
+}
+
 }  // namespace glimmet

@@ -3,14 +3,17 @@
 #include <mutex>
 
 #include "edit/Action.h"
+#include "edit/HistorySpill.h"
 
 namespace glimmet {
 
-HistoryManager::HistoryManager() = default;
+HistoryManager::HistoryManager() : spill_(std::make_unique<HistorySpill>()) {}
 
 HistoryManager::~HistoryManager()
 {
     Clear();
+    // The writer stops before the actions it might still be writing go.
+    spill_.reset();
 }
 
 status_t HistoryManager::AddAction(std::unique_ptr<Action>& action)
@@ -25,6 +28,7 @@ status_t HistoryManager::AddAction(std::unique_ptr<Action>& action)
     // Newest first, as popping the stack would delete them.
     while (!redoStack_.empty())
         redoStack_.pop_back();
+    Trim();
     return B_OK;
 }
 
@@ -46,13 +50,17 @@ status_t HistoryManager::Move(Stack& from, Stack& to, Step step)
 status_t HistoryManager::Undo()
 {
     std::lock_guard guard(*this);
-    return Move(undoStack_, redoStack_, [](Action& action) { return action.Undo(); });
+    const status_t status = Move(undoStack_, redoStack_, [](Action& action) { return action.Undo(); });
+    Trim();
+    return status;
 }
 
 status_t HistoryManager::Redo()
 {
     std::lock_guard guard(*this);
-    return Move(redoStack_, undoStack_, [](Action& action) { return action.Redo(); });
+    const status_t status = Move(redoStack_, undoStack_, [](Action& action) { return action.Redo(); });
+    Trim();
+    return status;
 }
 
 const char* HistoryManager::TopName(const Stack& stack)
@@ -81,6 +89,8 @@ void HistoryManager::Clear()
         undoStack_.pop_back();
     while (!redoStack_.empty())
         redoStack_.pop_back();
+    if (spill_ != nullptr)
+        spill_->ReleaseFile();
 }
 
 void HistoryManager::Save()
@@ -96,6 +106,62 @@ bool HistoryManager::IsSaved()
     if (undoStack_.empty())
         return true;
     return savedSerial_ != 0 && savedSerial_ == undoStack_.back().serial;
+}
+
+void HistoryManager::Trim()
+{
+    std::vector<const BlockRef*> kept;
+    const auto collect = [&kept](const Stack& stack) {
+        for (const Entry& entry : stack)
+            entry.action->VisitKeptBlocks([&kept](const BlockRef& block) { kept.push_back(&block); });
+    };
+    // Oldest first: the bottom of the undo stack, then the redo stack from
+    // the action undone first.
+    collect(undoStack_);
+    collect(redoStack_);
+    spill_->Trim(kept);
+}
+
+void HistoryManager::TrimMemory()
+{
+    std::lock_guard guard(*this);
+    Trim();
+}
+
+void HistoryManager::SetMemoryBudget(int64_t bytes)
+{
+    std::lock_guard guard(*this);
+    spill_->SetBudget(bytes);
+}
+
+int64_t HistoryManager::MemoryBudget()
+{
+    std::lock_guard guard(*this);
+    return spill_->Budget();
+}
+
+void HistoryManager::SetSpillWrittenCallback(std::function<void()> callback)
+{
+    spill_->SetWrittenCallback(std::move(callback));
+}
+
+void HistoryManager::SettleMemory()
+{
+    // Each round drops what the last one wrote; a round that leaves the
+    // history within the budget, or writes nothing, ends it.
+    for (int round = 0; round < 64; ++round) {
+        TrimMemory();
+        spill_->WaitUntilWritten();
+        std::lock_guard guard(*this);
+        Trim();
+        if (spill_->ResidentHistoryBytes() <= spill_->Budget())
+            return;
+    }
+}
+
+int HistoryManager::SpillDescriptor()
+{
+    return spill_->FileDescriptor();
 }
 
 }  // namespace glimmet

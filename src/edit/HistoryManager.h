@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <vector>
 
@@ -10,13 +11,16 @@
 namespace glimmet {
 
 class Action;
+class HistorySpill;
 
 /// A document's undo and redo stacks.
 ///
 /// The history is its own lock (the history lock): every operation holds it
 /// for its whole duration, including the call into the action, so the lock
 /// order is always history lock, then document lock. Both stacks grow
-/// without bound.
+/// without bound; the blocks only they hold stay in memory up to a budget,
+/// the oldest beyond it move to a scratch file (see HistorySpill).
+/// Every operation runs on the thread that edits the document.
 class HistoryManager : public Locker {
 public:
     HistoryManager();
@@ -54,6 +58,24 @@ public:
     /// was on top when the document was last saved.
     bool IsSaved();
 
+    /// Bytes of blocks only the history holds that may stay in memory; by
+    /// default HistorySpill::DefaultBudget().
+    void SetMemoryBudget(int64_t bytes);
+    int64_t MemoryBudget();
+    /// Moves the oldest blocks beyond the budget out of memory: drops what
+    /// has been written, hands more to the writer. Every change of the
+    /// history does it; the owner calls it after an action has run and
+    /// when the writer reports (see SetSpillWrittenCallback).
+    void TrimMemory();
+    /// Called on the writer's thread when it has written all it was given;
+    /// the owner runs TrimMemory on its own thread in answer.
+    void SetSpillWrittenCallback(std::function<void()> callback);
+    /// Trims, waits for the writer and trims again, until everything beyond
+    /// the budget is out of memory (tests, benchmarks).
+    void SettleMemory();
+    /// The scratch file's descriptor, -1 without one (tests).
+    int SpillDescriptor();
+
 private:
     /// A recorded action with the serial number it got when it was added.
     /// The saved marker compares serials rather than addresses, so an action
@@ -69,6 +91,8 @@ private:
     /// succeeds; otherwise the action goes to the dropped list.
     template <typename Step>
     status_t Move(Stack& from, Stack& to, Step step);
+    /// Hands every kept block reference to the spill, the lock held.
+    void Trim();
 
     // All fields are guarded by the history lock (this object).
     Stack undoStack_;
@@ -80,6 +104,7 @@ private:
     /// Actions whose undo or redo failed: out of the history, but kept alive
     /// as they were never deleted; freed with the history.
     std::vector<std::unique_ptr<Action>> dropped_;
+    std::unique_ptr<HistorySpill> spill_;
 };
 
 }  // namespace glimmet

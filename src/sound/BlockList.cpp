@@ -26,6 +26,14 @@ size_t BlockList::Find(int64_t index) const
     return size_t(after - starts_.begin()) - 1;
 }
 
+bool BlockList::MakeResident() const
+{
+    bool ok = true;
+    for (const BlockRef& block : blocks_)
+        ok = block->MakeResident() && ok;
+    return ok;
+}
+
 void BlockList::CopyOut(int64_t index, int64_t count, int16_t* destination) const
 {
     ForEachSpan(index, count, [&destination](const SampleSpan& span) {

@@ -52,6 +52,11 @@ public:
     /// list) to destination.
     void CopyOut(int64_t index, int64_t count, int16_t* destination) const;
 
+    /// Brings back every block whose samples were moved out of memory (see
+    /// SampleBlock); false when one cannot be read back. Called before the
+    /// list's blocks go where the audio thread reads them.
+    bool MakeResident() const;
+
     /// The position of the block holding index (0 <= index < Count()).
     size_t Find(int64_t index) const;
 

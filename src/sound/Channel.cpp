@@ -71,7 +71,7 @@ bool Channel::SetTo(SampleAllocator::Array samples, int64_t count)
 
 bool Channel::SetTo(BlockList blocks)
 {
-    if (blocks.Empty())
+    if (blocks.Empty() || !blocks.MakeResident())
         return false;
     std::lock_guard guard(lock_);
     count_ = blocks.Count();
@@ -179,6 +179,8 @@ status_t Channel::InsertFrames(const SampleSlice& frames, int64_t at)
     const int64_t count = frames.Count();
     if (count <= 0)
         return B_BAD_VALUE;
+    if (!frames.blocks.MakeResident())
+        return B_NO_MEMORY;
     return Insert([&frames](BlockBuilder& builder) {
         builder.AppendZeros(frames.leading);
         builder.AppendRange(frames.blocks, 0, frames.blocks.Count());
@@ -235,6 +237,8 @@ status_t Channel::ReplaceFrames(const SampleSlice& frames, int64_t from, int64_t
     const int64_t count = frames.Count();
     if (count <= 0 || from > to || from < 0)
         return B_BAD_VALUE;
+    if (!frames.blocks.MakeResident())
+        return B_NO_MEMORY;
     return Replace([&frames](BlockBuilder& builder) {
         builder.AppendZeros(frames.leading);
         builder.AppendRange(frames.blocks, 0, frames.blocks.Count());

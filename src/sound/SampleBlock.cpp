@@ -4,6 +4,8 @@
 #include <cstring>
 #include <new>
 
+#include "sound/SpillFile.h"
+
 namespace glimmet {
 
 namespace {
@@ -14,14 +16,35 @@ uint64_t NextId()
     return next.fetch_add(1, std::memory_order_relaxed);
 }
 
+std::atomic<int64_t>& ResidentCounter()
+{
+    static std::atomic<int64_t> bytes{0};
+    return bytes;
+}
+
 }  // namespace
 
 SampleBlock::SampleBlock(std::unique_ptr<int16_t[]> samples, int64_t count)
-    : samples_(std::move(samples)), count_(count), id_(NextId())
+    : samples_(samples.release()), count_(count), id_(NextId())
 {
+    ResidentCounter().fetch_add(Bytes(), std::memory_order_relaxed);
 }
 
-SampleBlock::~SampleBlock() = default;
+SampleBlock::~SampleBlock()
+{
+    int16_t* samples = samples_.load(std::memory_order_relaxed);
+    if (samples != nullptr) {
+        ResidentCounter().fetch_sub(Bytes(), std::memory_order_relaxed);
+        delete[] samples;
+    }
+    if (file_ != nullptr)
+        file_->Release(fileOffset_, Bytes());
+}
+
+int64_t SampleBlock::ResidentBytes()
+{
+    return ResidentCounter().load(std::memory_order_relaxed);
+}
 
 std::shared_ptr<SampleBlock> SampleBlock::Allocate(int64_t count)
 {
@@ -60,6 +83,81 @@ void SampleBlock::SetSummary(std::shared_ptr<const BlockSummary> summary) const
 {
     std::lock_guard guard(summaryLock_);
     summary_ = std::move(summary);
+}
+
+bool SampleBlock::HasFileCopy() const
+{
+    std::lock_guard guard(residencyLock_);
+    return file_ != nullptr;
+}
+
+bool SampleBlock::MakeResident() const
+{
+    if (IsResident())
+        return true;
+    std::lock_guard guard(residencyLock_);
+    if (samples_.load(std::memory_order_relaxed) != nullptr)
+        return true;
+    if (file_ == nullptr)
+        return false;
+    std::unique_ptr<int16_t[]> samples(new (std::nothrow) int16_t[size_t(count_)]);
+    if (samples == nullptr || !file_->Read(fileOffset_, samples.get(), Bytes()))
+        return false;
+    ResidentCounter().fetch_add(Bytes(), std::memory_order_relaxed);
+    samples_.store(samples.release(), std::memory_order_release);
+    // A block read back is usually headed for a channel, where it may live
+    // long after the history is gone: its copy must not keep the file open.
+    file_->Release(fileOffset_, Bytes());
+    file_.reset();
+    fileOffset_ = -1;
+    return true;
+}
+
+const int16_t* SampleBlock::LoadSamples() const
+{
+    // Readers that forgot MakeResident still see the right samples; a block
+    // that cannot be read back reads as silence rather than as a null.
+    static const int16_t kSilence[kMaxSamples] = {};
+    if (!MakeResident())
+        return kSilence;
+    return samples_.load(std::memory_order_acquire);
+}
+
+bool SampleBlock::WriteCopy(const std::shared_ptr<SpillFile>& file) const
+{
+    {
+        std::lock_guard guard(residencyLock_);
+        if (file_ != nullptr)
+            return true;
+    }
+    // Only DropSamples frees the samples, and it needs the copy made here,
+    // so they stay put while they are written without the lock.
+    const int16_t* samples = samples_.load(std::memory_order_acquire);
+    if (samples == nullptr || file == nullptr)
+        return false;
+    const int64_t offset = file->Write(samples, Bytes());
+    if (offset < 0)
+        return false;
+    std::lock_guard guard(residencyLock_);
+    if (file_ != nullptr) {
+        file->Release(offset, Bytes());
+        return true;
+    }
+    file_ = file;
+    fileOffset_ = offset;
+    return true;
+}
+
+bool SampleBlock::DropSamples() const
+{
+    std::lock_guard guard(residencyLock_);
+    int16_t* samples = samples_.load(std::memory_order_relaxed);
+    if (file_ == nullptr || samples == nullptr)
+        return false;
+    samples_.store(nullptr, std::memory_order_release);
+    ResidentCounter().fetch_sub(Bytes(), std::memory_order_relaxed);
+    delete[] samples;
+    return true;
 }
 
 }  // namespace glimmet

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 #include <memory>
 #include <mutex>
@@ -9,6 +10,7 @@ namespace glimmet {
 /// What the views keep about one block's samples (its waveform summary).
 /// Defined by the views; the engine only carries it along with the block.
 class BlockSummary;
+class SpillFile;
 
 /// A run of a channel's samples that never changes once it is shared.
 ///
@@ -20,6 +22,14 @@ class BlockSummary;
 ///
 /// Every block has an identity that is never reused while the program runs,
 /// so caches can be keyed by it.
+///
+/// A block that only the history holds may give up its samples to a
+/// SpillFile and take them back when needed: WriteCopy stores them (any
+/// thread), DropSamples lets go of the memory once a copy is stored, and
+/// MakeResident reads them back. The owner of the history decides when a
+/// drop is safe (no channel and no reader can see the block); anything that
+/// puts a block where the audio thread can read it makes it resident first.
+/// Samples() reads a dropped block back as a last resort.
 class SampleBlock {
 public:
     /// A writable block of count uninitialised samples, or null when count is
@@ -40,8 +50,12 @@ public:
     SampleBlock(const SampleBlock&) = delete;
     SampleBlock& operator=(const SampleBlock&) = delete;
 
-    const int16_t* Samples() const { return samples_.get(); }
-    int16_t* MutableSamples() { return samples_.get(); }
+    const int16_t* Samples() const
+    {
+        const int16_t* samples = samples_.load(std::memory_order_acquire);
+        return samples != nullptr ? samples : LoadSamples();
+    }
+    int16_t* MutableSamples() { return samples_.load(std::memory_order_relaxed); }
     int64_t Count() const { return count_; }
     uint64_t Id() const { return id_; }
 
@@ -50,12 +64,37 @@ public:
     std::shared_ptr<const BlockSummary> Summary() const;
     void SetSummary(std::shared_ptr<const BlockSummary> summary) const;
 
+    int64_t Bytes() const { return count_ * int64_t(sizeof(int16_t)); }
+    /// True while the samples are in memory.
+    bool IsResident() const { return samples_.load(std::memory_order_acquire) != nullptr; }
+    /// True once a copy of the samples is stored in a file.
+    bool HasFileCopy() const;
+    /// Brings the samples back into memory when they were dropped; false
+    /// when they could be neither allocated nor read.
+    bool MakeResident() const;
+    /// Stores a copy of the samples in file unless one is stored already;
+    /// false when the write failed. The samples must be resident: only
+    /// DropSamples takes them away, and not before a copy exists.
+    bool WriteCopy(const std::shared_ptr<SpillFile>& file) const;
+    /// Frees the samples of a block whose copy is stored; true when memory
+    /// was freed. The caller guarantees that nobody reads the block.
+    bool DropSamples() const;
+
+    /// Bytes of samples of all blocks in memory right now.
+    static int64_t ResidentBytes();
+
 private:
     SampleBlock(std::unique_ptr<int16_t[]> samples, int64_t count);
+    const int16_t* LoadSamples() const;
 
-    std::unique_ptr<int16_t[]> samples_;
+    // Owned (from new[]); null while the samples live only in the file.
+    mutable std::atomic<int16_t*> samples_;
     int64_t count_;
     uint64_t id_;
+    // Guards the file copy and every change of samples_ after construction.
+    mutable std::mutex residencyLock_;
+    mutable std::shared_ptr<SpillFile> file_;
+    mutable int64_t fileOffset_ = -1;
     mutable std::mutex summaryLock_;
     mutable std::shared_ptr<const BlockSummary> summary_;
 };

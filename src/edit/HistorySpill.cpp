@@ -1,0 +1,179 @@
+#include "edit/HistorySpill.h"
+
+#include <algorithm>
+#include <atomic>
+#include <cerrno>
+#include <cstdlib>
+#include <unistd.h>
+#include <unordered_map>
+
+#include "sound/SpillFile.h"
+
+namespace glimmet {
+
+namespace {
+
+/// How many references the history keeps to one block, and where the block
+/// first turned up (its age).
+struct KeptBlock {
+    const BlockRef* ref = nullptr;
+    long references = 0;
+    size_t order = 0;
+};
+
+}  // namespace
+
+HistorySpill::HistorySpill() : budget_(DefaultBudget()) {}
+
+HistorySpill::~HistorySpill()
+{
+    {
+        std::lock_guard guard(lock_);
+        stopping_ = true;
+    }
+    wake_.notify_all();
+    if (worker_.joinable())
+        worker_.join();
+}
+
+int64_t HistorySpill::DefaultBudget()
+{
+    if (const char* text = std::getenv("GLIMMET_HISTORY_BUDGET")) {
+        char* end = nullptr;
+        errno = 0;
+        const long long bytes = std::strtoll(text, &end, 10);
+        if (errno == 0 && end != text && *end == '\0' && bytes >= 0)
+            return int64_t(bytes);
+    }
+    const long pages = ::sysconf(_SC_PHYS_PAGES);
+    const long pageSize = ::sysconf(_SC_PAGE_SIZE);
+    if (pages <= 0 || pageSize <= 0)
+        return int64_t(1) << 30;
+    return int64_t(pages) * pageSize / 4;
+}
+
+void HistorySpill::Trim(const std::vector<const BlockRef*>& kept)
+{
+    std::unordered_map<const SampleBlock*, KeptBlock> counts;
+    counts.reserve(kept.size());
+    for (const BlockRef* ref : kept) {
+        KeptBlock& entry = counts[ref->get()];
+        if (entry.ref == nullptr) {
+            entry.ref = ref;
+            entry.order = counts.size();
+        }
+        ++entry.references;
+    }
+    // Blocks held by nothing but the history: a channel, the copy buffer, a
+    // reader or the worker would each add a reference of their own.
+    std::vector<const KeptBlock*> only;
+    int64_t resident = 0;
+    for (const auto& [block, entry] : counts) {
+        if (entry.ref->use_count() == entry.references && block->IsResident()) {
+            only.push_back(&entry);
+            resident += block->Bytes();
+        }
+    }
+    std::atomic_thread_fence(std::memory_order_acquire);
+    std::sort(only.begin(), only.end(), [](const KeptBlock* a, const KeptBlock* b) { return a->order < b->order; });
+    std::vector<BlockRef> toWrite;
+    for (const KeptBlock* entry : only) {
+        if (resident <= budget_)
+            break;
+        const SampleBlock& block = **entry->ref;
+        if (!block.DropSamples())
+            toWrite.push_back(*entry->ref);
+        // Written blocks go at once; the others are on their way.
+        resident -= block.Bytes();
+    }
+    residentHistory_ = 0;
+    for (const KeptBlock* entry : only) {
+        if ((*entry->ref)->IsResident())
+            residentHistory_ += (*entry->ref)->Bytes();
+    }
+    if (!toWrite.empty())
+        Queue(std::move(toWrite));
+}
+
+void HistorySpill::Queue(std::vector<BlockRef> blocks)
+{
+    {
+        std::lock_guard guard(lock_);
+        if (file_ == nullptr)
+            file_ = SpillFile::Create();
+        if (file_ == nullptr)
+            return;
+        for (BlockRef& block : blocks)
+            queue_.push_back(std::move(block));
+        if (!worker_.joinable())
+            worker_ = std::thread([this] { Work(); });
+    }
+    wake_.notify_one();
+}
+
+void HistorySpill::Work()
+{
+    std::unique_lock guard(lock_);
+    for (;;) {
+        wake_.wait(guard, [this] { return stopping_ || !queue_.empty(); });
+        if (stopping_)
+            return;
+        busy_ = true;
+        while (!queue_.empty() && !stopping_) {
+            BlockRef block = std::move(queue_.front());
+            queue_.pop_front();
+            std::shared_ptr<SpillFile> file = file_;
+            guard.unlock();
+            block->WriteCopy(file);
+            // Let go of the block before the owner looks at it again, so
+            // this thread's reference does not keep it out of the next Trim.
+            block.reset();
+            file.reset();
+            guard.lock();
+        }
+        busy_ = false;
+        idle_.notify_all();
+        if (!stopping_) {
+            guard.unlock();
+            {
+                // Held during the call, so that once SetWrittenCallback has
+                // returned the old callback is never called again.
+                std::lock_guard callbackGuard(callbackLock_);
+                if (written_)
+                    written_();
+            }
+            guard.lock();
+        }
+    }
+}
+
+void HistorySpill::SetWrittenCallback(std::function<void()> callback)
+{
+    std::lock_guard guard(callbackLock_);
+    written_ = std::move(callback);
+}
+
+void HistorySpill::WaitUntilWritten()
+{
+    std::unique_lock guard(lock_);
+    idle_.wait(guard, [this] { return stopping_ || (queue_.empty() && !busy_); });
+}
+
+void HistorySpill::ReleaseFile()
+{
+    std::deque<BlockRef> unwritten;
+    {
+        std::lock_guard guard(lock_);
+        file_.reset();
+        unwritten.swap(queue_);
+    }
+    residentHistory_ = 0;
+}
+
+int HistorySpill::FileDescriptor()
+{
+    std::lock_guard guard(lock_);
+    return file_ != nullptr ? file_->Descriptor() : -1;
+}
+
+}  // namespace glimmet

@@ -1,0 +1,253 @@
+// The history keeps the blocks only it holds within a memory budget by
+// moving the oldest to a nameless scratch file, and every undo still gives
+// back exactly what was there.
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cmath>
+#include <cstdlib>
+#include <filesystem>
+#include <random>
+#include <string>
+#include <thread>
+#include <unistd.h>
+#include <vector>
+
+#include "TestDocument.h"
+#include "edit/FadeInAction.h"
+#include "edit/FadeOutAction.h"
+#include "edit/HistoryManager.h"
+#include "sound/BlockBuilder.h"
+#include "sound/SampleBlock.h"
+
+namespace glimmet {
+namespace {
+
+using Samples = std::vector<int16_t>;
+using Document = std::vector<Samples>;
+
+constexpr int64_t kFrames = 8 * BlockBuilder::kBlockSamples + 1234;
+constexpr int kChannels = 2;
+constexpr int64_t kDocumentBytes = kChannels * kFrames * int64_t(sizeof(int16_t));
+
+/// Something like music: a few tones and some noise.
+Samples MusicLike(unsigned seed)
+{
+    std::mt19937 random(seed);
+    std::normal_distribution<double> noise(0, 300);
+    Samples samples(size_t(kFrames), 0);
+    for (int64_t i = 0; i < kFrames; i++) {
+        const double t = double(i) / 44100;
+        const double value = 9000 * std::sin(2 * M_PI * 220 * t) + 4000 * std::sin(2 * M_PI * 331 * t + seed)
+            + noise(random);
+        samples[size_t(i)] = int16_t(std::lround(std::clamp(value, -32768.0, 32767.0)));
+    }
+    return samples;
+}
+
+Document Read(ChannelManager& manager)
+{
+    Document document;
+    for (int32_t c = 0; Channel* channel = manager.ChannelAt(c); c++) {
+        Samples samples(size_t(channel->FrameCount()));
+        channel->FillBuffer(samples.data(), channel->FirstFrame(), channel->FrameCount());
+        document.push_back(std::move(samples));
+    }
+    return document;
+}
+
+/// Where the descriptor leads, as /proc tells it; empty when it is closed.
+std::string LinkOf(int fd)
+{
+    std::error_code error;
+    const auto target = std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(fd), error);
+    return error ? std::string() : target.string();
+}
+
+bool AnyDescriptorLeadsTo(const std::string& link)
+{
+    std::error_code error;
+    for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd", error)) {
+        std::error_code readError;
+        if (std::filesystem::read_symlink(entry.path(), readError).string() == link)
+            return true;
+    }
+    return false;
+}
+
+template <typename ActionType>
+void Perform(test::TestDocument& document, HistoryManager& history)
+{
+    auto* action = new ActionType(nullptr);
+    std::unique_ptr<Action> owned(action);
+    ASSERT_EQ(action->SetTo(&document.manager, &document.position), B_OK);
+    ASSERT_EQ(history.AddAction(owned), B_OK);
+    ASSERT_EQ(action->Go(), B_OK);
+    // As the window does once an action has run.
+    history.TrimMemory();
+}
+
+class HistorySpillTest : public ::testing::Test {
+protected:
+    void MakeDocument()
+    {
+        for (int c = 0; c < kChannels; c++)
+            document.AddChannel(MusicLike(unsigned(c + 1)));
+        document.SetRange(0, kFrames - 1);
+    }
+
+    int64_t baseline = SampleBlock::ResidentBytes();
+    test::TestDocument document;
+};
+
+TEST_F(HistorySpillTest, TenWholeDocumentFadesUndoExactlyWithinTheBudget)
+{
+    MakeDocument();
+    const int64_t budget = kDocumentBytes / 4;
+    std::string link;
+    {
+        HistoryManager history;
+        history.SetMemoryBudget(budget);
+        std::vector<Document> states{Read(document.manager)};
+        for (int i = 0; i < 10; i++) {
+            Perform<FadeInAction>(document, history);
+            states.push_back(Read(document.manager));
+            ASSERT_NE(states.back(), states[states.size() - 2]) << "fade " << i << " changed nothing";
+            history.SettleMemory();
+            EXPECT_LE(SampleBlock::ResidentBytes() - baseline, budget + kDocumentBytes) << "after fade " << i;
+        }
+        const int fd = history.SpillDescriptor();
+        ASSERT_GE(fd, 0) << "nothing was moved out of memory";
+        link = LinkOf(fd);
+        EXPECT_TRUE(link.ends_with(" (deleted)")) << link;
+        for (int i = 10; i > 0; i--) {
+            ASSERT_EQ(history.Undo(), B_OK);
+            ASSERT_TRUE(Read(document.manager) == states[size_t(i - 1)]) << "undo back to state " << i - 1;
+            history.SettleMemory();
+            EXPECT_LE(SampleBlock::ResidentBytes() - baseline, budget + kDocumentBytes) << "after undo " << i;
+        }
+        // And forward again, from blocks that went out as redo data.
+        for (int i = 1; i <= 10; i++) {
+            ASSERT_EQ(history.Redo(), B_OK);
+            history.SettleMemory();
+            ASSERT_TRUE(Read(document.manager) == states[size_t(i)]) << "redo to state " << i;
+        }
+    }
+    EXPECT_FALSE(AnyDescriptorLeadsTo(link)) << "the scratch file outlived the history";
+}
+
+TEST_F(HistorySpillTest, WithoutPressureNothingLeavesMemory)
+{
+    MakeDocument();
+    HistoryManager history;
+    history.SetMemoryBudget(20 * kDocumentBytes);
+    for (int i = 0; i < 3; i++)
+        Perform<FadeOutAction>(document, history);
+    history.SettleMemory();
+    EXPECT_EQ(history.SpillDescriptor(), -1);
+    EXPECT_GE(SampleBlock::ResidentBytes() - baseline, 4 * kDocumentBytes);
+}
+
+TEST_F(HistorySpillTest, ClearingTheHistoryClosesTheFile)
+{
+    MakeDocument();
+    HistoryManager history;
+    history.SetMemoryBudget(0);
+    for (int i = 0; i < 3; i++)
+        Perform<FadeInAction>(document, history);
+    history.SettleMemory();
+    const int fd = history.SpillDescriptor();
+    ASSERT_GE(fd, 0);
+    const std::string link = LinkOf(fd);
+    ASSERT_FALSE(link.empty());
+    history.Clear();
+    EXPECT_FALSE(AnyDescriptorLeadsTo(link));
+    // Only the document is left in memory.
+    EXPECT_LE(SampleBlock::ResidentBytes() - baseline, kDocumentBytes);
+}
+
+TEST_F(HistorySpillTest, BudgetComesFromTheEnvironment)
+{
+    const char* old = std::getenv("GLIMMET_HISTORY_BUDGET");
+    const std::string saved = old != nullptr ? old : "";
+    ::setenv("GLIMMET_HISTORY_BUDGET", "123456", 1);
+    EXPECT_EQ(HistoryManager().MemoryBudget(), 123456);
+    ::setenv("GLIMMET_HISTORY_BUDGET", "lots", 1);
+    const int64_t fallback = HistoryManager().MemoryBudget();
+    const int64_t memory = int64_t(::sysconf(_SC_PHYS_PAGES)) * ::sysconf(_SC_PAGE_SIZE);
+    EXPECT_EQ(fallback, memory / 4);
+    if (old != nullptr)
+        ::setenv("GLIMMET_HISTORY_BUDGET", saved.c_str(), 1);
+    else
+        ::unsetenv("GLIMMET_HISTORY_BUDGET");
+}
+
+/// Mixing reads the channels the whole time while the history writes
+/// blocks out, drops them and reads them back; every undo stays exact.
+TEST(HistorySpillStress, MixingWhileSpillingAndUndoing)
+{
+    test::TestDocument document;
+    for (int c = 0; c < kChannels; c++)
+        document.AddChannel(MusicLike(unsigned(c + 7)));
+    document.SetRange(0, kFrames - 1);
+    std::atomic<bool> written{false};
+    HistoryManager history;
+    history.SetMemoryBudget(0);
+    history.SetSpillWrittenCallback([&written] { written = true; });
+
+    std::atomic<bool> done{false};
+    std::atomic<int64_t> reads{0};
+    std::vector<Channel*> channels;
+    for (int c = 0; c < kChannels; c++)
+        channels.push_back(document.manager.ChannelAt(c));
+    std::thread mixer([&] {
+        int64_t start = 0;
+        int64_t sum = 0;
+        while (!done) {
+            for (Channel* channel : channels) {
+                channel->ReadForMix(start, 4096, [&sum](const Channel::MixSource& source) {
+                    for (int64_t i = 0; i < source.length; i++)
+                        sum += source.samples[i];
+                });
+            }
+            start = (start + 4096) % kFrames;
+            ++reads;
+        }
+        EXPECT_NE(sum, 1);  // keeps the reads
+    });
+
+    const Document original = Read(document.manager);
+    std::vector<Document> states{original};
+    std::mt19937 random(5);
+    for (int step = 0; step < 60; step++) {
+        if (written.exchange(false))
+            history.TrimMemory();
+        const int choice = int(random() % 4);
+        if (choice < 2 || states.size() == 1) {
+            if (choice == 0)
+                Perform<FadeInAction>(document, history);
+            else
+                Perform<FadeOutAction>(document, history);
+            states.push_back(Read(document.manager));
+        } else {
+            ASSERT_EQ(history.Undo(), B_OK);
+            states.pop_back();
+            ASSERT_TRUE(Read(document.manager) == states.back()) << "step " << step;
+        }
+        if (step % 7 == 0)
+            history.SettleMemory();
+    }
+    while (states.size() > 1) {
+        ASSERT_EQ(history.Undo(), B_OK);
+        states.pop_back();
+        ASSERT_TRUE(Read(document.manager) == states.back());
+    }
+    done = true;
+    mixer.join();
+    EXPECT_GT(reads.load(), 0);
+    EXPECT_TRUE(Read(document.manager) == original);
+}
+
+}  // namespace
+}  // namespace glimmet
