@@ -5,8 +5,7 @@
 
 #include <QResizeEvent>
 
-#include "ViewFixture.h"
-#include "WaveformReference.h"
+#include "ViewWaveformCheck.h"
 
 namespace glimmet::test {
 namespace {
@@ -35,23 +34,7 @@ protected:
 
     int64_t Rendered() const { return fixture.View(0)->RenderedColumns() + fixture.View(1)->RenderedColumns(); }
 
-    void ExpectAsFullRender(int index, const std::vector<int16_t>& samples)
-    {
-        SampleView* view = fixture.View(index);
-        WaveformCase c;
-        c.samples = samples;
-        c.channelFirst = view->GetChannel()->FirstFrame();
-        c.first = fixture.container->FirstDisplayedFrame();
-        c.last = fixture.container->LastDisplayedFrame();
-        c.rangeStart = fixture.manager.RangeStart();
-        c.rangeEnd = fixture.manager.RangeEnd();
-        c.cursor = fixture.container->CursorFrame();
-        c.playmark = fixture.container->PlaymarkFrame();
-        c.selected = view->GetChannel()->IsSelected();
-        c.width = view->width();
-        c.height = view->height();
-        EXPECT_EQ(FirstDifference(view->Bitmap(), ReferenceWaveform(c)), "");
-    }
+    void ExpectAsFullRender(int index, const std::vector<int16_t>& samples) { ExpectRendered(fixture, index, samples); }
 
     void ExpectBothAsFullRender()
     {

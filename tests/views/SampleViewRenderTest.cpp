@@ -4,8 +4,7 @@
 
 #include <cmath>
 
-#include "ViewFixture.h"
-#include "WaveformReference.h"
+#include "ViewWaveformCheck.h"
 
 namespace glimmet::test {
 namespace {
@@ -26,31 +25,6 @@ std::vector<int16_t> Noise(int64_t count, uint32_t seed)
         sample = int16_t(seed >> 16);
     }
     return samples;
-}
-
-/// The case for a view as the container shows it now.
-WaveformCase CaseFor(const ViewFixture& fixture, int index, const std::vector<int16_t>& samples)
-{
-    SampleView* view = fixture.View(index);
-    WaveformCase c;
-    c.samples = samples;
-    c.channelFirst = view->GetChannel()->FirstFrame();
-    c.first = fixture.container->FirstDisplayedFrame();
-    c.last = fixture.container->LastDisplayedFrame();
-    c.rangeStart = fixture.manager.RangeStart();
-    c.rangeEnd = fixture.manager.RangeEnd();
-    c.cursor = fixture.container->CursorFrame();
-    c.playmark = fixture.container->PlaymarkFrame();
-    c.selected = view->GetChannel()->IsSelected();
-    c.width = view->width();
-    c.height = view->height();
-    return c;
-}
-
-void ExpectRendered(const ViewFixture& fixture, int index, const std::vector<int16_t>& samples)
-{
-    const QImage expected = ReferenceWaveform(CaseFor(fixture, index, samples));
-    EXPECT_EQ(FirstDifference(fixture.View(index)->Bitmap(), expected), "");
 }
 
 TEST(SampleViewRender, WholeSineAtSeveralSizes)

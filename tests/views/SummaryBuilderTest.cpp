@@ -5,8 +5,7 @@
 
 #include <QTest>
 
-#include "ViewFixture.h"
-#include "WaveformReference.h"
+#include "ViewWaveformCheck.h"
 #include "sound/BlockBuilder.h"
 #include "views/BlockSummary.h"
 
@@ -54,21 +53,7 @@ protected:
         return count;
     }
 
-    void ExpectAsFullRender()
-    {
-        WaveformCase c;
-        c.samples = samples;
-        c.first = fixture.container->FirstDisplayedFrame();
-        c.last = fixture.container->LastDisplayedFrame();
-        c.rangeStart = fixture.manager.RangeStart();
-        c.rangeEnd = fixture.manager.RangeEnd();
-        c.cursor = fixture.container->CursorFrame();
-        c.playmark = fixture.container->PlaymarkFrame();
-        c.selected = view->GetChannel()->IsSelected();
-        c.width = view->width();
-        c.height = view->height();
-        EXPECT_EQ(FirstDifference(view->Bitmap(), ReferenceWaveform(c)), "");
-    }
+    void ExpectAsFullRender() { ExpectRendered(fixture, 0, samples); }
 
     ViewFixture fixture{302, 120};
     std::vector<int16_t> samples;
