@@ -5,6 +5,9 @@
 #include <cstring>
 #include <vector>
 
+#include "sound/Channel.h"
+#include "sound/SampleBlock.h"
+
 
 namespace glimmet::bench {
 
@@ -42,6 +45,17 @@ inline double MemcpyNanoseconds(size_t bytes, int rounds, int repetitions)
 inline double Seconds(std::chrono::steady_clock::duration duration)
 {
     return std::chrono::duration<double>(duration).count();
+}
+
+/// A channel's samples in one array, read span by span as the mixer and the
+/// views read them.
+inline std::vector<int16_t> SamplesOf(Channel& channel)
+{
+    std::vector<int16_t> samples;
+    channel.ReadSpans(0, channel.FrameCount(), [&samples](const SampleSpan& span) {
+        samples.insert(samples.end(), span.samples, span.samples + span.count);
+    });
+    return samples;
 }
 
 }  // namespace glimmet::bench

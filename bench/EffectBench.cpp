@@ -253,7 +253,7 @@ struct Document {
     bool Matches(const Check& check)
     {
         for (int c = 0; c < kChannels; c++) {
-            if (!check(originals[size_t(c)].data(), manager.ChannelAt(c)->Data(), kFrames))
+            if (!check(originals[size_t(c)].data(), bench::SamplesOf(*manager.ChannelAt(c)).data(), kFrames))
                 return false;
         }
         return true;

@@ -120,8 +120,7 @@ void RunTransform(benchmark::State& state, const Check& check)
     std::vector<std::vector<int16_t>> originals;
     Samples before;
     for (int c = 0; c < kChannels; c++) {
-        const int16_t* data = manager.ChannelAt(c)->Data();
-        originals.emplace_back(data, data + kFrames);
+        originals.push_back(bench::SamplesOf(*manager.ChannelAt(c)));
         before.push_back(originals.back().data());
     }
 
@@ -151,9 +150,12 @@ void RunTransform(benchmark::State& state, const Check& check)
         memcpyTotal += Seconds(std::chrono::steady_clock::now() - begin);
 
         if (!checked) {
+            std::vector<std::vector<int16_t>> results;
             Samples after;
-            for (int c = 0; c < kChannels; c++)
-                after.push_back(manager.ChannelAt(c)->Data());
+            for (int c = 0; c < kChannels; c++) {
+                results.push_back(bench::SamplesOf(*manager.ChannelAt(c)));
+                after.push_back(results.back().data());
+            }
             if (!check(before, after, kFrames)) {
                 state.SkipWithError("output differs from the arithmetic");
                 break;

@@ -416,22 +416,4 @@ void Channel::GetMixSettings(bool* muted, int8_t* pan)
     *pan = pan_;
 }
 
-int16_t* Channel::Data()
-{
-    std::lock_guard guard(lock_);
-    if (!hasData_ || blocks_.Empty())
-        return nullptr;
-    // A block only this channel holds may be written: nobody else sees it.
-    if (blocks_.BlockCount() == 1 && blocks_.BlockAt(0).use_count() == 1)
-        return const_cast<SampleBlock*>(blocks_.BlockAt(0).get())->MutableSamples();
-    std::shared_ptr<SampleBlock> whole = SampleBlock::Allocate(blocks_.Count());
-    if (whole == nullptr)
-        return nullptr;
-    blocks_.CopyOut(0, blocks_.Count(), whole->MutableSamples());
-    int16_t* samples = whole->MutableSamples();
-    blocks_.Clear();
-    blocks_.Append(std::move(whole));
-    return samples;
-}
-
 }  // namespace glimmet

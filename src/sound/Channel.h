@@ -167,14 +167,6 @@ public:
         return filled;
     }
 
-    /// The samples as one writable array, for tests and tools that want to
-    /// look at or poke a channel directly; the program itself reads through
-    /// ReadSpans. Gathers the data into one block of the channel's own when
-    /// it is spread over several or shared (a copy), so later calls are
-    /// cheap until the next edit. Null for a channel without data, and for
-    /// one longer than a block may be.
-    int16_t* Data();
-
     /// An uninitialised array of count samples from the shared allocator, or
     /// null when it cannot be had: arrays hold 0 to 2^32 - 1 samples. Every
     /// array that may become a channel's, or a copy of one, comes from here.

@@ -102,9 +102,13 @@ int32_t SampleView::RowOf(int16_t sample) const
     return rowTable_[size_t((int32_t(sample) + 32768) >> 3)];
 }
 
+// What a column shows is known from its frames, its state and the blocks
+// it reads (RenderColumns forgets every column when those change), so a
+// whole-view update renders only the columns that would come out different:
+// a display range set to what it already was, or the views of a document
+// that gained channels elsewhere, render nothing.
 void SampleView::Update()
 {
-    drawn_.clear();
     Update(Bounds());
 }
 

@@ -46,7 +46,7 @@ public:
     /// Rebuilds the bitmap and the row table for the size, then re-renders.
     void FrameResized(float width, float height);
 
-    /// Re-renders the whole view: for changed data or display range.
+    /// Brings the whole view up to date: for changed data or display range.
     void Update();
     /// Brings the columns of rect up to date (always over the full height)
     /// and schedules a repaint of it. The image is kept between renders, so

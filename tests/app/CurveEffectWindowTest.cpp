@@ -18,6 +18,7 @@
 #include "sound/ChannelManager.h"
 #include "support/MessageCodes.h"
 #include "views/SplineControl.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet::test {
 namespace {
@@ -48,8 +49,7 @@ QuillexWindow* EditableWindow(AppFixture& fixture, const char* name = "curve.wav
 
 std::vector<int16_t> Samples(QuillexWindow* window, int32_t channel)
 {
-    Channel* data = window->Manager()->ChannelAt(channel);
-    return std::vector<int16_t>(data->Data(), data->Data() + data->FrameCount());
+    return test::SamplesOf(*window->Manager()->ChannelAt(channel));
 }
 
 /// The control pixel of a normalised point.

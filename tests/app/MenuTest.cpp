@@ -11,6 +11,7 @@
 #include "sound/ChannelManager.h"
 #include "support/MessageCodes.h"
 #include "views/ChannelContainerView.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet::test {
 namespace {
@@ -178,10 +179,10 @@ TEST(Menus, AfterAFadeInUndoNamesItAndAfterUndoRedoDoes)
     QAction* undo = window->MenuItem(KeptMenuItem::Undo);
     QAction* redo = window->MenuItem(KeptMenuItem::Redo);
     QAction* clear = window->MenuItem(KeptMenuItem::DeleteHistory);
-    const int16_t before = window->Manager()->ChannelAt(0)->Data()[0];
+    const int16_t before = test::SamplesOf(*window->Manager()->ChannelAt(0)).at(0);
     FindItem(window, "Tools", "Fade In")->trigger();
     Drain();
-    EXPECT_NE(window->Manager()->ChannelAt(0)->Data()[0], before);
+    EXPECT_NE(test::SamplesOf(*window->Manager()->ChannelAt(0)).at(0), before);
     EXPECT_EQ(undo->text(), "Undo Fade In");
     EXPECT_TRUE(undo->isEnabled());
     EXPECT_EQ(redo->text(), "Redo");
@@ -190,7 +191,7 @@ TEST(Menus, AfterAFadeInUndoNamesItAndAfterUndoRedoDoes)
 
     undo->trigger();
     Drain();
-    EXPECT_EQ(window->Manager()->ChannelAt(0)->Data()[0], before);
+    EXPECT_EQ(test::SamplesOf(*window->Manager()->ChannelAt(0)).at(0), before);
     EXPECT_EQ(undo->text(), "Undo");
     EXPECT_FALSE(undo->isEnabled());
     EXPECT_EQ(redo->text(), "Redo Fade In");

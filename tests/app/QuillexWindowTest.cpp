@@ -28,6 +28,7 @@
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
 #include "views/ChannelContainerView.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet::test {
 namespace {
@@ -332,14 +333,14 @@ TEST(QuillexWindow, OpeningAFileIntoTheWindowEmptiesItsHistory)
     const auto second = fixture.MakeSound("second.wav", 2, 1000);
     DropFiles(window, {second}, Qt::NoModifier);
     ASSERT_EQ(window->windowTitle(), "Glimmet - second.wav");
-    const int16_t before = window->Manager()->ChannelAt(0)->Data()[999];
+    const int16_t before = test::SamplesOf(*window->Manager()->ChannelAt(0)).at(999);
     EXPECT_EQ(window->History()->UndoName(), nullptr);
     EXPECT_TRUE(window->History()->IsSaved());
     EXPECT_FALSE(window->MenuItem(KeptMenuItem::Save)->isEnabled());
     EXPECT_FALSE(window->MenuItem(KeptMenuItem::Undo)->isEnabled());
     window->PostMessage(kMsgUndo);
     Drain();
-    EXPECT_EQ(window->Manager()->ChannelAt(0)->Data()[999], before);
+    EXPECT_EQ(test::SamplesOf(*window->Manager()->ChannelAt(0)).at(999), before);
 }
 
 TEST(QuillexWindow, AppendingAFileKeepsTheHistory)

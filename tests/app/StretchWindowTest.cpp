@@ -23,14 +23,14 @@
 #include "sound/ChannelManager.h"
 #include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet::test {
 namespace {
 
 std::vector<int16_t> SamplesOf(QuillexWindow* window, int32_t channel)
 {
-    Channel* data = window->Manager()->ChannelAt(channel);
-    return std::vector<int16_t>(data->Data(), data->Data() + data->FrameCount());
+    return test::SamplesOf(*window->Manager()->ChannelAt(channel));
 }
 
 /// A loaded window with every channel selected over all its frames.

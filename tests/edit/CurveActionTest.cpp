@@ -15,6 +15,7 @@
 #include "edit/HistoryManager.h"
 #include "edit/effects/PeakDistortion.h"
 #include "support/DiagnosticsCapture.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet {
 namespace {
@@ -201,10 +202,11 @@ TEST(CurveActionTest, UnreadableDialogLeavesPeakDistortRunsAlone)
 TEST(CurveActionTest, PeakDistortScalesEachRunsPeak)
 {
     EffectDocument setup;
-    setup.document.manager.ChannelAt(0)->Data()[100] = 1000;
-    setup.document.manager.ChannelAt(0)->Data()[101] = 2000;
-    setup.document.manager.ChannelAt(0)->Data()[102] = 1000;
-    setup.document.manager.ChannelAt(0)->Data()[103] = -7;
+    Channel& first = *setup.document.manager.ChannelAt(0);
+    test::SetSampleAt(first, 100, 1000);
+    test::SetSampleAt(first, 101, 2000);
+    test::SetSampleAt(first, 102, 1000);
+    test::SetSampleAt(first, 103, -7);
     DocumentState expected = setup.document.State();
     setup.Run(std::make_unique<CompressorAction>(nullptr, setup.Dialog(0.5, 0.5)));
     // The first run's peak 2000 goes to half of full scale: gain
@@ -236,7 +238,7 @@ TEST(CurveActionTest, UntouchedEnvelopeLeavesTheDataAlone)
 TEST(CurveActionTest, EnvelopeFollowsTheSelection)
 {
     EffectDocument setup;
-    setup.document.manager.ChannelAt(0)->Data()[100] = -10000;
+    test::SetSampleAt(*setup.document.manager.ChannelAt(0), 100, -10000);
     DocumentState expected = setup.document.State();
     setup.Run(std::make_unique<EnvelopeAction>(nullptr, setup.Dialog(0.0, 1.0)));
     // 400 % at the first frame: -10000 becomes -40000, stored as 32767.

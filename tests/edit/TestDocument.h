@@ -10,6 +10,7 @@
 #include "edit/EditPosition.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet::test {
 
@@ -90,9 +91,7 @@ public:
     static ChannelState StateOf(Channel* channel)
     {
         ChannelState state;
-        const int16_t* data = channel->Data();
-        if (data != nullptr)
-            state.samples.assign(data, data + channel->FrameCount());
+        state.samples = SamplesOf(*channel);
         state.first = channel->FirstFrame();
         state.selected = channel->IsSelected();
         state.muted = channel->IsMuted();

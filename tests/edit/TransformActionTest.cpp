@@ -5,6 +5,7 @@
 #include "TestDocument.h"
 #include "TransformCases.h"
 #include "edit/HistoryManager.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet {
 namespace {
@@ -51,9 +52,11 @@ TEST_P(TransformActionTest, RangesOfManyLengthsMatchTheReference)
         // Quieter data lets Maximize scale instead of stopping at full scale.
         if (GetParam().name == "Maximize") {
             for (int32_t i = 0; i < 3; i++) {
-                int16_t* data = document.manager.ChannelAt(i)->Data();
-                for (int64_t f = 0; f < document.manager.ChannelAt(i)->FrameCount(); f++)
-                    data[f] = int16_t(data[f] / 5);
+                Channel& channel = *document.manager.ChannelAt(i);
+                std::vector<int16_t> quieter = test::SamplesOf(channel);
+                for (int16_t& sample : quieter)
+                    sample = int16_t(sample / 5);
+                test::SetSamples(channel, quieter);
             }
         }
         const int64_t start = 50;

@@ -7,6 +7,7 @@
 #include "files/MediaFormat.h"
 #include "files/MediaTrack.h"
 #include "sound/Channel.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet {
 namespace {
@@ -15,7 +16,7 @@ using test::SoundFixtures;
 
 std::vector<int16_t> ChannelSamples(Channel& channel)
 {
-    return std::vector<int16_t>(channel.Data(), channel.Data() + channel.FrameCount());
+    return test::SamplesOf(channel);
 }
 
 std::vector<int16_t> Column(const std::vector<int16_t>& interleaved, int32_t channels, int32_t index)
@@ -71,7 +72,7 @@ TEST_F(ChannelTrackTest, FailsForMissingTrackAndNonAudio)
     MediaFile file(video);
     EXPECT_FALSE(ChannelTrackLoader::Load(channel, file.TrackAt(0), 0));
     EXPECT_EQ(channel.FrameCount(), 0);
-    EXPECT_EQ(channel.Data(), nullptr);
+    EXPECT_EQ(test::FirstStoredSample(channel), nullptr);
 }
 
 TEST_F(ChannelTrackTest, IndexBeyondTheChannelsFails)
@@ -190,7 +191,7 @@ TEST_F(ChannelTrackTest, FailedReloadOfAnotherLengthLetsTheOldSamplesGo)
     ASSERT_TRUE(ChannelTrackLoader::Load(channel, longer.TrackAt(0), 0));
     EXPECT_FALSE(ChannelTrackLoader::Load(channel, shorter.TrackAt(0), 2));
     EXPECT_EQ(channel.FrameCount(), 100);
-    EXPECT_EQ(channel.Data(), nullptr);
+    EXPECT_EQ(test::FirstStoredSample(channel), nullptr);
     std::vector<int16_t> buffer(50, 7);
     ASSERT_TRUE(channel.FillBuffer(buffer.data(), 0, 50));
     EXPECT_EQ(buffer, std::vector<int16_t>(50, 0));

@@ -19,6 +19,7 @@
 #include "sound/Channel.h"
 #include "support/DiagnosticsCapture.h"
 #include "support/MessageCodes.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet {
 namespace {
@@ -136,8 +137,9 @@ TEST_F(LoadMemoryTest, SparseJunkChunkAfterTheDataCostsNothing)
             Channel* channel = target.manager.ChannelAt(k);
             if (channel->FrameCount() != 44100)
                 return 2;
+            const std::vector<int16_t> samples = test::SamplesOf(*channel);
             for (int64_t i = 0; i < 44100; ++i) {
-                if (channel->Data()[i] != source[size_t(2 * i + k)])
+                if (samples[size_t(i)] != source[size_t(2 * i + k)])
                     return 3;
             }
         }

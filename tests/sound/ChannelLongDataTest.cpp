@@ -6,6 +6,7 @@
 
 #include "sound/Channel.h"
 #include "support/Status.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet {
 namespace {
@@ -34,7 +35,7 @@ bool HoldsOriginal(Channel& channel)
 {
     if (channel.FrameCount() != kLong)
         return false;
-    const int16_t* data = channel.Data();
+    const std::vector<int16_t> data = test::SamplesOf(channel);
     for (int64_t i = 0; i < kLong; i++) {
         if (data[i] != ValueAt(i))
             return false;
@@ -47,12 +48,14 @@ TEST(ChannelLongDataTest, RemovingAndInsertingASecondRepeatedlyKeepsTheData)
     auto channel = LongChannel();
     const int64_t middle = kLong / 2;
     for (int round = 0; round < 4; round++) {
-        std::vector<int16_t> removed(channel->Data() + middle, channel->Data() + middle + kSecond);
+        const std::vector<int16_t> before = test::SamplesOf(*channel);
+        std::vector<int16_t> removed(before.begin() + middle, before.begin() + middle + kSecond);
         ASSERT_EQ(channel->RemoveFrames(middle, middle + kSecond - 1), B_OK);
         ASSERT_EQ(channel->FrameCount(), kLong - kSecond);
-        EXPECT_EQ(channel->Data()[middle - 1], ValueAt(middle - 1));
-        EXPECT_EQ(channel->Data()[middle], ValueAt(middle + kSecond));
-        EXPECT_EQ(channel->Data()[kLong - kSecond - 1], ValueAt(kLong - 1));
+        const std::vector<int16_t> after = test::SamplesOf(*channel);
+        EXPECT_EQ(after[middle - 1], ValueAt(middle - 1));
+        EXPECT_EQ(after[middle], ValueAt(middle + kSecond));
+        EXPECT_EQ(after[kLong - kSecond - 1], ValueAt(kLong - 1));
         ASSERT_EQ(channel->InsertFrames(removed.data(), kSecond, middle), B_OK);
         ASSERT_TRUE(HoldsOriginal(*channel)) << "round " << round;
     }
@@ -66,9 +69,9 @@ TEST(ChannelLongDataTest, TwoChannelsEditedInTurnKeepTheirOwnData)
     for (int round = 0; round < 3; round++) {
         ASSERT_EQ(left->InsertFrames(minute.data(), int64_t(minute.size()), 1000), B_OK);
         ASSERT_EQ(right->InsertFrames(minute.data(), int64_t(minute.size()), 2000), B_OK);
-        EXPECT_EQ(left->Data()[999], ValueAt(999));
-        EXPECT_EQ(left->Data()[1000], -9);
-        EXPECT_EQ(right->Data()[2000 + 60 * kSecond], ValueAt(2000));
+        EXPECT_EQ(test::SamplesOf(*left)[999], ValueAt(999));
+        EXPECT_EQ(test::SamplesOf(*left)[1000], -9);
+        EXPECT_EQ(test::SamplesOf(*right)[2000 + 60 * kSecond], ValueAt(2000));
         ASSERT_EQ(left->RemoveFrames(1000, 1000 + 60 * kSecond - 1), B_OK);
         ASSERT_EQ(right->RemoveFrames(2000, 2000 + 60 * kSecond - 1), B_OK);
         ASSERT_TRUE(HoldsOriginal(*left));
@@ -94,12 +97,12 @@ TEST(ChannelLongDataTest, AdoptedArrayReplacesAnAllocatedOne)
 TEST(ChannelLongDataTest, InsertBeyondTheLimitLeavesTheChannelUnchanged)
 {
     auto channel = LongChannel();
-    const int16_t* before = channel->Data();
+    const int16_t* before = test::FirstStoredSample(*channel);
     const int16_t frame = 1;
     // The new array would exceed 2^32 - 1 samples; it is refused before any
     // frame is read.
     EXPECT_EQ(channel->InsertFrames(&frame, int64_t(UINT32_MAX) - kLong + 1, kLong / 2), B_NO_MEMORY);
-    EXPECT_EQ(channel->Data(), before);
+    EXPECT_EQ(test::FirstStoredSample(*channel), before);
     EXPECT_EQ(channel->FirstFrame(), 0);
     EXPECT_TRUE(HoldsOriginal(*channel));
 }
@@ -107,10 +110,10 @@ TEST(ChannelLongDataTest, InsertBeyondTheLimitLeavesTheChannelUnchanged)
 TEST(ChannelLongDataTest, ReplaceFarBeyondTheEndLeavesTheChannelUnchanged)
 {
     auto channel = LongChannel();
-    const int16_t* before = channel->Data();
+    const int16_t* before = test::FirstStoredSample(*channel);
     const int16_t frame = 1;
     EXPECT_EQ(channel->ReplaceFrames(&frame, 1, int64_t(UINT32_MAX), int64_t(UINT32_MAX)), B_NO_MEMORY);
-    EXPECT_EQ(channel->Data(), before);
+    EXPECT_EQ(test::FirstStoredSample(*channel), before);
     EXPECT_TRUE(HoldsOriginal(*channel));
 }
 

@@ -8,6 +8,7 @@
 #include "sound/Channel.h"
 #include "support/DiagnosticsCapture.h"
 #include "support/Status.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet {
 namespace {
@@ -34,10 +35,7 @@ std::unique_ptr<Channel> MakeChannel(const Samples& samples, int64_t first)
 
 Samples Contents(Channel& channel)
 {
-    const int16_t* data = channel.Data();
-    if (data == nullptr)
-        return {};
-    return Samples(data, data + channel.FrameCount());
+    return test::SamplesOf(channel);
 }
 
 Samples Concat(std::initializer_list<Samples> parts)
@@ -61,7 +59,7 @@ TEST(ChannelTest, FreshChannel)
     EXPECT_FALSE(channel.IsMuted());
     EXPECT_FALSE(channel.IsSelected());
     EXPECT_EQ(channel.PanPosition(), 0);
-    EXPECT_EQ(channel.Data(), nullptr);
+    EXPECT_EQ(test::FirstStoredSample(channel), nullptr);
     EXPECT_EQ(channel.FrameRate(), 0.0f);
 }
 
@@ -105,7 +103,7 @@ TEST(ChannelTest, AdoptingAnArray)
     EXPECT_FALSE(channel.SetTo(samples, -1));
     channel.SetStartFrameOffset(12);
     EXPECT_TRUE(channel.SetTo(samples, 3));
-    EXPECT_EQ(channel.Data(), samples);
+    EXPECT_EQ(test::FirstStoredSample(channel), samples);
     EXPECT_EQ(channel.FrameCount(), 3);
     EXPECT_EQ(channel.FirstFrame(), 12);
 }
@@ -158,7 +156,7 @@ TEST_P(ChannelFillTest, ReadForMixDescribesTheSameSamples)
         EXPECT_EQ(source.samples == nullptr, source.length == 0);
         if (source.length == 0)
             return;
-        const int16_t* data = channel->Data();
+        const int16_t* data = test::FirstStoredSample(*channel);
         ASSERT_GE(source.samples, data);
         EXPECT_EQ(source.samples + source.length + source.following, data + 10);
         std::copy_n(source.samples, source.length, buffer.begin() + source.offset);

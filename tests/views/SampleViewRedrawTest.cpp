@@ -6,6 +6,7 @@
 #include <QResizeEvent>
 
 #include "ViewWaveformCheck.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet::test {
 namespace {
@@ -142,15 +143,41 @@ TEST_F(SampleViewRedraw, DisplayRangeAndDataChangesRenderEverything)
     EXPECT_EQ(fixture.View(0)->RenderedColumns() - before, width);
     ExpectBothAsFullRender();
 
-    // Samples rewritten in place: the document says the channel changed.
-    int16_t* data = fixture.manager.ChannelAt(0)->Data();
-    for (size_t i = 0; i < samples0.size(); ++i) {
-        samples0[i] = int16_t(-samples0[i] / 2);
-        data[i] = samples0[i];
-    }
+    // New samples of the same length: the document says the channel changed.
+    for (int16_t& sample : samples0)
+        sample = int16_t(-sample / 2);
+    test::SetSamples(*fixture.manager.ChannelAt(0), samples0);
     before = fixture.View(0)->RenderedColumns();
     fixture.manager.ChannelChanged(fixture.manager.ChannelAt(0));
     EXPECT_EQ(fixture.View(0)->RenderedColumns() - before, width);
+    ExpectBothAsFullRender();
+}
+
+TEST_F(SampleViewRedraw, TheSameDisplayRangeAgainRendersNothing)
+{
+    ChannelContainerView& container = *fixture.container;
+    const int64_t before = Rendered();
+    // As opening a file into the document does when the longest channel
+    // keeps its length.
+    container.SetDisplayRange(0, 8999);
+    EXPECT_EQ(Rendered() - before, 0);
+    container.UpdateAll();
+    EXPECT_EQ(Rendered() - before, 0);
+    ExpectBothAsFullRender();
+}
+
+TEST_F(SampleViewRedraw, AChannelChangedRendersOnlyItsOwnView)
+{
+    const int64_t width = fixture.View(0)->width();
+    const int64_t before0 = fixture.View(0)->RenderedColumns();
+    const int64_t before1 = fixture.View(1)->RenderedColumns();
+    for (int16_t& sample : samples1)
+        sample = int16_t(sample / 3);
+    SetSamples(*fixture.manager.ChannelAt(1), samples1);
+    // Told for every channel at once, as an action over the selection does.
+    fixture.container->UpdateAll();
+    EXPECT_EQ(fixture.View(0)->RenderedColumns() - before0, 0);
+    EXPECT_EQ(fixture.View(1)->RenderedColumns() - before1, width);
     ExpectBothAsFullRender();
 }
 
