@@ -155,8 +155,11 @@ void MakeChannels(std::mt19937& random, TestDocument& a, TestDocument& b)
         }
         if (coin(random) == 0) {
             // Long runs of one sign, crossing blocks, with a few zeros.
-            for (size_t k = 0; k < samples.size(); k++)
-                samples[k] = int16_t(((k / 40000) % 2 == 0 ? 1 : -1) * (std::abs(int32_t(samples[k])) % 30000 + (k % 50000 == 7 ? -1 : 1)));
+            for (size_t k = 0; k < samples.size(); k++) {
+                const int32_t sign = (k / 40000) % 2 == 0 ? 1 : -1;
+                const int32_t magnitude = std::abs(int32_t(samples[k])) % 30000 + (k % 50000 == 7 ? -1 : 1);
+                samples[k] = int16_t(sign * magnitude);
+            }
         }
         const int64_t at = first(random);
         const bool selected = coin(random) != 0;
