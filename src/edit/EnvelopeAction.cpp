@@ -19,6 +19,14 @@ double Silence(double)
     return 1.0;
 }
 
+// 0 when every gain of curve is finite, so that silence stays silence.
+std::optional<int16_t> SilenceBecomes(const effects::SplineCurve& curve)
+{
+    if (effects::EnvelopeGains(curve, 1).AlwaysFinite())
+        return int16_t(0);
+    return std::nullopt;
+}
+
 }  // namespace
 
 status_t EnvelopeAction::Go()
@@ -35,10 +43,11 @@ status_t EnvelopeAction::Go()
             int16_t(0)});
     }
     // The gains follow the range from its first frame to its last; each
-    // channel's pass starts over at the first piece. Silence is computed like
-    // anything else (a gain the curve leaves unbounded would not keep it
-    // silent); the pieces that come out silent are still stored as shared
-    // silence.
+    // channel's pass starts over at the first piece. A finite gain keeps
+    // silence silent, so when the curve can give no other, pieces of silence
+    // are not computed; otherwise (a gain that is not a number turns 0 into
+    // 32767) they are computed like anything else, and those that come out
+    // silent are still stored as shared silence.
     auto gains = std::make_shared<std::optional<effects::EnvelopeGains>>();
     auto buffer = std::make_shared<std::vector<double>>();
     // Shared, so that the sweep's reference to the curve stays valid.
@@ -52,7 +61,7 @@ status_t EnvelopeAction::Go()
             (*gains)->Compute(size_t(first), piece);
             effects::ApplyGains(piece, std::span<int16_t>(samples, size_t(count)));
         },
-        std::nullopt});
+        SilenceBecomes(*curve)});
 }
 
 const char* EnvelopeAction::Name()

@@ -1,9 +1,12 @@
 #include "edit/FilterAction.h"
 
-#include <cstring>
+#include <algorithm>
+#include <vector>
 #include <mutex>
 #include <span>
 
+#include "edit/PieceTransformWriter.h"
+#include "edit/RangeTransformer.h"
 #include "edit/effects/FirFilter.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
@@ -41,29 +44,52 @@ void FilterAction::ReadDialog()
 status_t FilterAction::FilterSelected()
 {
     std::lock_guard guard(Manager()->DocumentLock());
-    const int64_t count = FrameCount();
-    if (count < 1)
-        return B_OK;
     const int64_t taps = int64_t(kernel_.size());
-    // The input holds the taps frames before the range as history, then the
-    // range; both buffers serve every channel in turn.
-    SampleAllocator::Array input = AllocateSamples(count + taps);
-    SampleAllocator::Array output = AllocateSamples(count);
-    if (input == nullptr || output == nullptr)
-        return B_NO_MEMORY;
-    // A channel whose copy fails filters what the buffer held before: the
-    // previous channel's input, or silence for the first.
-    std::memset(input.get(), 0, size_t(count + taps) * sizeof(int16_t));
-    const std::span<const int16_t> history(input.get(), size_t(count + taps));
-    const std::span<int16_t> filtered(output.get(), size_t(count));
-    for (int32_t i = 0; Channel* channel = Manager()->ChannelAt(i); i++) {
-        if (!channel->IsSelected())
+    // Every output frame is the same function of the taps input frames
+    // before it and itself, so a frame whose inputs are all silence comes
+    // out as this one value (0 unless a coefficient is not finite).
+    std::vector<int16_t> zeros(size_t(taps) + 1, 0);
+    int16_t silenceBecomes = 0;
+    effects::FirFilter(zeros, kernel_, std::span<int16_t>(&silenceBecomes, 1));
+    // The filter reads the taps frames before the range as history; a
+    // channel whose copy fails filters what the previous channel read, or
+    // silence for the first.
+    SliceTransform filter;
+    filter.lookBehind = taps;
+    filter.keepsSource = true;
+    filter.build = [this, taps, silenceBecomes](const SampleSlice& source, int64_t count, SampleSlice* result) {
+        return FilterSlice(source, count, taps, silenceBecomes, result);
+    };
+    RangeTransformer transformer(Manager(), RangeStart(), RangeEnd());
+    transformer.TransformSelected(filter);
+    return transformer.InitCheck();
+}
+
+bool FilterAction::FilterSlice(const SampleSlice& source, int64_t count, int64_t taps, int16_t silenceBecomes,
+    SampleSlice* result) const
+{
+    constexpr int64_t kPiece = BlockBuilder::kBlockSamples;
+    // One piece of output and the frames it reads: its history, then itself.
+    std::vector<int16_t> input(size_t(taps + kPiece));
+    std::vector<int16_t> output(static_cast<size_t>(kPiece));
+    PieceTransformWriter writer;
+    for (int64_t first = 0; first < count && writer.Ok(); first += kPiece) {
+        const int64_t n = std::min(kPiece, count - first);
+        if (RangeTransformer::PieceIsSilent(source, first, taps + n)) {
+            writer.PutRepeated(silenceBecomes, n);
             continue;
-        channel->FillBuffer(input.get(), RangeStart() - taps, count + taps);
-        effects::FirFilter(history, kernel_, filtered);
-        channel->ReplaceFrames(output.get(), count, RangeStart(), RangeEnd());
+        }
+        RangeTransformer::CopyPiece(source, first, taps + n, input.data());
+        effects::FirFilter(std::span<const int16_t>(input.data(), size_t(taps + n)), kernel_,
+            std::span<int16_t>(output.data(), size_t(n)));
+        for (int64_t j = 0; j < n; j++)
+            writer.Put(output[size_t(j)]);
     }
-    return B_OK;
+    if (!writer.Ok())
+        return false;
+    *result = SampleSlice();
+    result->blocks = writer.Finish();
+    return writer.Ok();
 }
 
 const char* FilterAction::Name()

@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "edit/CurveEffectAction.h"
+#include "sound/SampleSlice.h"
 
 namespace glimmet {
 
@@ -25,8 +26,9 @@ public:
 
     /// B_ERROR when the action is not bound. No kernel (a tap count of 0 or
     /// less, too many taps, or a first run whose dialog could not be read)
-    /// leaves the channels unchanged. B_NO_MEMORY, changing nothing, when
-    /// the working buffers cannot be had.
+    /// leaves the channels unchanged. B_NO_MEMORY when memory runs out.
+    /// The range is filtered a block at a time, so its length costs only
+    /// the blocks of the result: silence far from any data stays shared.
     status_t Go() override;
     const char* Name() override;
     const std::vector<double>& Kernel() const { return kernel_; }
@@ -36,6 +38,11 @@ private:
     /// that can read it.
     void ReadDialog();
     status_t FilterSelected();
+    /// The filtered range from source (taps frames of history, then the
+    /// count frames of the range), a piece at a time; false when memory ran
+    /// out.
+    bool FilterSlice(const SampleSlice& source, int64_t count, int64_t taps, int16_t silenceBecomes,
+        SampleSlice* result) const;
 
     std::vector<double> kernel_;
 };

@@ -114,6 +114,40 @@ void RangeTransformer::TransformSelected(const PieceTransform& transform)
     }
 }
 
+void RangeTransformer::TransformSelected(const SliceTransform& transform)
+{
+    // History is only kept for transforms that leave their input alone.
+    const bool lookBehindAllowed = transform.lookBehind == 0 || transform.keepsSource;
+    if (!Ready() || transform.lookBehind < 0 || transform.lookBehind > kLargestRange || !lookBehindAllowed)
+        return;
+    const int64_t length = count_ + transform.lookBehind;
+    // What a failed copy finds: silence before any channel was read.
+    SampleSlice held;
+    held.leading = transform.keepsSource ? length : 0;
+    if (!transform.keepsSource)
+        held = held_;
+    for (int32_t i = 0; Channel* channel = manager_->ChannelAt(i); i++) {
+        if (!channel->IsSelected())
+            continue;
+        SampleSlice source;
+        const status_t read = channel->ReadSlice(start_ - transform.lookBehind, length, &source);
+        if (read == B_NO_MEMORY) {
+            status_ = B_NO_MEMORY;
+            return;
+        }
+        if (read != B_OK)
+            source = held;
+        SampleSlice result;
+        if (!transform.build(source, count_, &result) || result.Count() != count_) {
+            status_ = B_NO_MEMORY;
+            return;
+        }
+        channel->ReplaceFrames(result, start_, end_);
+        held = transform.keepsSource ? std::move(source) : result;
+        held_ = std::move(result);
+    }
+}
+
 void RangeTransformer::InspectSelected(const Inspector& inspector, bool skipSilence)
 {
     if (!Ready())

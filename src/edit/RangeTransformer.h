@@ -33,6 +33,23 @@ struct PieceTransform {
     bool mirrored = false;
 };
 
+/// A transform that builds each channel's new range from the old one as a
+/// whole, streaming it (a filter whose output depends on the frames before
+/// it, an effect whose runs of samples may span pieces).
+struct SliceTransform {
+    /// Frames read before the range, with it: a filter's history.
+    int64_t lookBehind = 0;
+    /// Builds the count frames of the new range from source (lookBehind +
+    /// count frames: the history, then the range); false when memory ran
+    /// out.
+    std::function<bool(const SampleSlice& source, int64_t count, SampleSlice* result)> build;
+    /// What a channel whose copy fails is given instead: true for what the
+    /// previous channel read (a transform that writes to a buffer of its
+    /// own, leaving its input as it was), false for what it wrote back (a
+    /// transform that rewrites its working buffer in place).
+    bool keepsSource = false;
+};
+
 /// Runs the in-place transforms over one range of every selected channel.
 ///
 /// The transforms behave as if the range were copied into one working
@@ -70,10 +87,18 @@ public:
     void TransformSelected(const Transform& transform);
     /// The same, a piece at a time.
     void TransformSelected(const PieceTransform& transform);
+    /// The same for a transform of the whole slice.
+    void TransformSelected(const SliceTransform& transform);
     /// One pass that only looks at each selected channel's range, a piece
     /// at a time; pieces of silence are skipped when skipSilence is true
     /// (the inspector would learn nothing from them).
     void InspectSelected(const Inspector& inspector, bool skipSilence = false);
+
+    /// True when the count samples of source from index on are all known
+    /// silence: outside its blocks, or in the shared silence block.
+    static bool PieceIsSilent(const SampleSlice& source, int64_t index, int64_t count);
+    /// Copies count samples of source from index on into destination.
+    static void CopyPiece(const SampleSlice& source, int64_t index, int64_t count, int16_t* destination);
 
 private:
     bool AnySelected() const;
@@ -83,11 +108,6 @@ private:
     bool ReadSource(Channel* channel, SampleSlice* source);
     /// Builds the transformed range of source into result.
     bool TransformSlice(const SampleSlice& source, const PieceTransform& transform, SampleSlice* result);
-    /// True when the count samples of source from index on are all known
-    /// silence: outside its blocks, or in the shared silence block.
-    static bool PieceIsSilent(const SampleSlice& source, int64_t index, int64_t count);
-    /// Copies count samples of source from index on into destination.
-    static void CopyPiece(const SampleSlice& source, int64_t index, int64_t count, int16_t* destination);
 
     ChannelManager* manager_;
     int64_t start_;

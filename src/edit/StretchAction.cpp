@@ -5,9 +5,11 @@
 #include <cstring>
 #include <mutex>
 #include <new>
+#include <vector>
 
 #include "edit/vocoder/VocoderState.h"
 #include "edit/vocoder/VocoderStretch.h"
+#include "sound/BlockBuilder.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "support/Diagnostics.h"
@@ -112,23 +114,36 @@ status_t StretchAction::StretchRecord(const SavedChannel& record, size_t index, 
     const int64_t outputFrames = StretchedLength(frames, parameters_.stretch) + 1;
     if (frames < 1 || outputFrames > kLongestOutput)
         return B_NO_MEMORY;
-    std::unique_ptr<float[]> input(new (std::nothrow) float[size_t(frames)]());
-    // Never written beyond what the vocoder puts there: the rest stays 0.
-    std::unique_ptr<float[]> output(new (std::nothrow) float[size_t(outputFrames)]());
+    // The vocoder reads only the first windows of the input and writes only
+    // the first window of the output, so only those are held, whatever the
+    // range's length; the rest of the output is silence.
+    const int64_t inputHead = std::min(frames, VocoderStretch::kInputRead);
+    const int64_t outputHead = std::min(outputFrames, VocoderStretch::kOutputWritten);
+    std::unique_ptr<float[]> input(new (std::nothrow) float[size_t(inputHead)]());
+    std::unique_ptr<float[]> output(new (std::nothrow) float[size_t(outputHead)]());
     if (!input || !output)
         return B_NO_MEMORY;
-    if (record.held && record.data.Count() == frames) {
-        int64_t i = record.data.leading;
-        record.data.blocks.ForEachSpan(0, record.data.blocks.Count(), [&](const SampleSpan& span) {
-            for (int64_t k = 0; k < span.count; k++)
-                input[size_t(i++)] = float(span.samples[k]) * (1.0f / 32768.0f);
-        });
-    }
+    if (record.held && record.data.Count() == frames)
+        ReadHead(record.data, input.get(), inputHead);
     const StretchParameters& p = parameters_;
     const bool ok = VocoderStretch::Stretch(input.get(), frames, output.get(), outputFrames, p.fftLength,
         p.windowSize, p.interpolation, float(p.decimation), p.stretch, p.pitch, stop, &channelProgress_);
     outputs_[index] = std::move(output);
     return ok ? B_OK : B_ERROR;
+}
+
+void StretchAction::ReadHead(const SampleSlice& data, float* input, int64_t count)
+{
+    // input starts as zeros: the leading silence stays as it is.
+    const int64_t leading = std::min(data.leading, count);
+    const int64_t stored = std::min(data.blocks.Count(), count - leading);
+    if (stored <= 0)
+        return;
+    int64_t i = leading;
+    data.blocks.ForEachSpan(0, stored, [&](const SampleSpan& span) {
+        for (int64_t k = 0; k < span.count; k++)
+            input[size_t(i++)] = float(span.samples[k]) * (1.0f / 32768.0f);
+    });
 }
 
 status_t StretchAction::WriteBack()
@@ -147,17 +162,27 @@ status_t StretchAction::WriteBack()
 void StretchAction::WriteChannel(Channel* channel, int32_t index)
 {
     const int64_t count = StretchedLength(FrameCount(), parameters_.stretch);
-    SampleAllocator::Array samples = AllocateSamples(count);
-    if (samples == nullptr)
+    if (count < 1 || count > kLongestOutput)
         return;
     // The outputs are indexed by the channel's place among all channels, not
     // among the selected ones: a channel past the outputs, or one whose
-    // output could not be made, gets silence.
+    // output could not be made, gets silence. Past the vocoder's window the
+    // output is silence too, and is stored as shared silence: a stretch to a
+    // billion frames costs references.
     const size_t slot = size_t(index);
     const float* output = slot < outputs_.size() ? outputs_[slot].get() : nullptr;
-    for (int64_t i = 0; i < count; i++)
-        samples[size_t(i)] = output != nullptr ? ToSample(output[size_t(i)]) : 0;
-    channel->ReplaceFrames(samples.get(), count, RangeStart(), RangeEnd());
+    const int64_t head = output != nullptr ? std::min(count, VocoderStretch::kOutputWritten) : 0;
+    std::vector<int16_t> samples(static_cast<size_t>(head));
+    for (int64_t i = 0; i < head; i++)
+        samples[size_t(i)] = ToSample(output[size_t(i)]);
+    BlockBuilder builder;
+    builder.AppendSamples(samples.data(), head);
+    builder.AppendZeros(count - head);
+    if (!builder.Ok())
+        return;
+    SampleSlice result;
+    result.blocks = builder.Finish();
+    channel->ReplaceFrames(result, RangeStart(), RangeEnd());
     if (slot < outputs_.size())
         outputs_[slot].reset();
 }

@@ -69,10 +69,14 @@ private:
     void NoteTargets();
     status_t StretchRecord(const SavedChannel& record, size_t index, const std::atomic<bool>* stop);
     void WriteChannel(Channel* channel, int32_t index);
+    /// The first count frames of data as the vocoder's floats, into input,
+    /// which holds zeros.
+    static void ReadHead(const SampleSlice& data, float* input, int64_t count);
 
     std::unique_ptr<StretchDialog> dialog_;
     StretchParameters parameters_;
-    /// One per snapshot record; an entry may be empty when its memory could
+    /// One per snapshot record, the output's first window (the vocoder
+    /// writes no further); an entry may be empty when its memory could
     /// not be had.
     std::vector<std::unique_ptr<float[]>> outputs_;
     status_t status_ = B_NO_INIT;

@@ -8,13 +8,18 @@
 #include "CurveDialogFake.h"
 #include "MemoryLimit.h"
 #include "TestDocument.h"
+#include "StretchDialogFake.h"
+#include "edit/CompressorAction.h"
 #include "edit/DistortAction.h"
 #include "edit/EnvelopeAction.h"
 #include "edit/FadeInAction.h"
 #include "edit/FadeOutAction.h"
+#include "edit/FilterAction.h"
 #include "edit/MaximizeAction.h"
 #include "edit/RevertAction.h"
 #include "edit/RevertPhasesAction.h"
+#include "edit/StretchAction.h"
+#include "edit/vocoder/VocoderState.h"
 
 // Ranges typed far beyond a short document: every transform must finish in
 // memory bounded by the document's data (a billion frames of silence would
@@ -41,6 +46,13 @@ std::vector<Maker> Transforms()
         fake->SetReadable(false);  // the gain-of-zero envelope: every frame 0
         return fake;
     };
+    // A drawn curve that lifts 0: silence becomes a constant.
+    const auto drawn = [](int32_t passes) {
+        auto fake = std::make_unique<test::CurveDialogFake>(std::make_shared<test::CurveDialogLog>(),
+            std::vector<double>{0.0, 0.4, 1.0}, std::vector<double>{0.3, 0.9, 0.6});
+        fake->SetPasses(passes);
+        return fake;
+    };
     return {
         {"FadeIn", [] { return std::make_unique<FadeInAction>(nullptr); }},
         {"FadeOut", [] { return std::make_unique<FadeOutAction>(nullptr); }},
@@ -49,6 +61,11 @@ std::vector<Maker> Transforms()
         {"Maximize", [] { return std::make_unique<MaximizeAction>(nullptr); }},
         {"Distort", [dialog] { return std::make_unique<DistortAction>(nullptr, dialog()); }},
         {"Envelope", [dialog] { return std::make_unique<EnvelopeAction>(nullptr, dialog()); }},
+        {"DrawnEnvelope", [drawn] { return std::make_unique<EnvelopeAction>(nullptr, drawn(0)); }},
+        {"DrawnDistort", [drawn] { return std::make_unique<DistortAction>(nullptr, drawn(0)); }},
+        {"PeakDistort", [drawn] { return std::make_unique<CompressorAction>(nullptr, drawn(0)); }},
+        {"UnreadablePeakDistort", [dialog] { return std::make_unique<CompressorAction>(nullptr, dialog()); }},
+        {"Filter", [drawn] { return std::make_unique<FilterAction>(nullptr, drawn(64)); }},
     };
 }
 
@@ -109,6 +126,47 @@ TEST(AbsurdRangeTest, TransformsOverHugeRangesStayWithinMemoryAndUndo)
             const int result = test::RunUnderMemoryLimit(kAllowance, [&] { return RunOne(maker, range); });
             EXPECT_EQ(result, kOk) << maker.name << " over " << range.start << ".." << range.end;
         }
+    }
+}
+
+// The stretch cannot be undone; it must finish in bounded memory and leave
+// the stretched range's length behind it.
+int RunStretch(const Range& range)
+{
+    VocoderState::Shared().Reset();
+    TestDocument document;
+    document.AddChannel(test::Ramp(-11025, 22050), 0, true);
+    document.AddChannel(test::Ramp(7, 22050), 0, false);
+    document.SetRange(range.start, range.end);
+    const int64_t start = document.manager.RangeStart();
+    const int64_t end = document.manager.RangeEnd();
+    StretchParameters values = test::DefaultStretchParameters();
+    values.stretch = 1.5f;
+    const auto started = std::chrono::steady_clock::now();
+    StretchAction action(nullptr, std::make_unique<test::StretchDialogFake>(
+        std::make_shared<test::StretchDialogLog>(), values));
+    action.SetTo(&document.manager, &document.position);
+    if (action.Go() != B_OK)
+        return kGoFailed;
+    if (std::chrono::steady_clock::now() - started > std::chrono::seconds(60))
+        return kTooSlow;
+    Channel* stretched = document.manager.ChannelAt(0);
+    const int64_t length = StretchAction::StretchedLength(end - start + 1, values.stretch);
+    // The range's frames become the stretched ones, at most the channel's
+    // own frames beside them; a range starting before frame 0 cannot be
+    // written back and leaves the channel as it was.
+    const int64_t frames = stretched->FrameCount();
+    const bool written = frames >= length && frames <= length + 22050;
+    if (start >= 0 ? !written : frames != 22050)
+        return kUndoWrong;
+    return kOk;
+}
+
+TEST(AbsurdRangeTest, TimeStretchOverHugeRangesStaysWithinMemory)
+{
+    for (const Range& range : {Range{-1000000000, 100}, Range{100, 1000000000}, Range{0, 400000000}}) {
+        const int result = test::RunUnderMemoryLimit(kAllowance, [&] { return RunStretch(range); });
+        EXPECT_EQ(result, kOk) << "Time Stretch over " << range.start << ".." << range.end;
     }
 }
 

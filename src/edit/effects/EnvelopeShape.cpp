@@ -1,6 +1,7 @@
 #include "edit/effects/EnvelopeShape.h"
 
 #include <algorithm>
+#include <cmath>
 #include <cstdint>
 #include <stdexcept>
 
@@ -78,6 +79,24 @@ void EnvelopeGains::Compute(size_t first, std::span<double> gains)
             j = end;
         }
     }
+}
+
+bool EnvelopeGains::AlwaysFinite() const
+{
+    if (sweep_.Empty())
+        return true;
+    // A position t in [0, 1) lies within |x| + 1 of any knot x, so a piece's
+    // cubic there is at most this in magnitude; far below the largest double
+    // the rounding of its evaluation cannot carry it to infinity.
+    constexpr double kSafe = 1e300;
+    for (size_t k = 0; k <= sweep_.LastPiece(); k++) {
+        const double u = std::fabs(sweep_.KnotX(k)) + 1.0;
+        const double bound = std::fabs(sweep_.KnotY(k))
+            + u * (std::fabs(sweep_.Linear(k)) + u * (std::fabs(sweep_.Quadratic(k)) + u * std::fabs(sweep_.Cubic(k))));
+        if (!(bound < kSafe))
+            return false;
+    }
+    return true;
 }
 
 GLIMMET_EFFECT_CLONES

@@ -51,6 +51,13 @@ public:
     /// gains.size() must not exceed n.
     void Compute(size_t first, std::span<double> gains);
 
+    /// True when every gain this curve can give over [0, 1) is a finite
+    /// number, judged from a bound on its cubics: a silent frame then stays
+    /// silent wherever it lies, and need not be computed. False (and the
+    /// frames must be computed) when the bound is not finite, even where
+    /// every gain would be.
+    bool AlwaysFinite() const;
+
 private:
     SplineSweep sweep_;
     double count_;

@@ -48,6 +48,16 @@ double RunGain(double curveValue, double position);
 /// is touched and the caller never sees it.
 void ScaleRun(std::span<int16_t> samples, const SampleRun& run, double gain, int16_t& spare);
 
+/// One sample of a scaled run: trunc(gain * sample) kept to its low 16 bits
+/// (INT32_MIN's, 0, when the product is out of int32's range or not a
+/// number), the value ScaleRun stores.
+inline int16_t ScaledSample(int16_t sample, double gain)
+{
+    const double product = gain * double(sample);
+    const bool fits = product < 2147483648.0 && product > -2147483649.0;
+    return int16_t(int32_t(fits ? product : -2147483648.0));
+}
+
 /// RunGain for every peak a run can have, so that a run's gain is looked up
 /// instead of evaluated: the gain of a run depends on its peak alone (whose
 /// sign tells the side), so the lookup gives the same double.

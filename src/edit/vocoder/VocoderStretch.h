@@ -20,8 +20,20 @@ public:
 
     VocoderStretch() = delete;
 
+    /// The input frames the vocoder ever reads: the first two windows, which
+    /// make its first two analysis frames; every later frame is analysed from
+    /// the FFT buffer. A caller may pass just these.
+    static constexpr int64_t kInputRead = 2 * int64_t(kWindow);
+    /// The output frames it ever writes: the accumulator is copied over the
+    /// start of the output after every frame, so everything past the first
+    /// window stays as the caller left it. A caller may pass just these.
+    static constexpr int64_t kOutputWritten = kWindow;
+
     /// N is the FFT length, D the analysis hop, I the synthesis hop (D when
-    /// 0), P the oscillators' pitch factor. False, with a message, for a
+    /// 0), P the oscillators' pitch factor. inputFrames and outputFrames are
+    /// the lengths of the whole input and output; input need only hold
+    /// min(inputFrames, kInputRead) floats and output min(outputFrames,
+    /// kOutputWritten), so a stretch of any length costs a few windows. False, with a message, for a
     /// stretch factor of 0 and for values the vocoder cannot use. stop, when
     /// given and set, ends the run early (false, as a failure); the program
     /// uses it only when it quits in the middle of a stretch. progress, when
