@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdint>
-#include <cstdlib>
 
 #if defined(__SANITIZE_ADDRESS__)
 #define GLIMMET_ASAN 1
@@ -104,11 +103,7 @@ BlockPool::~BlockPool()
 
 BlockPool& BlockPool::Shared()
 {
-    static BlockPool* shared = [] {
-        Limits limits;
-        limits.hugePages = std::getenv("GLIMMET_BLOCK_HUGE_PAGES") != nullptr;
-        return new BlockPool(limits);
-    }();
+    static BlockPool* shared = new BlockPool();
     return *shared;
 }
 

@@ -38,7 +38,9 @@ public:
         size_t slabBytes = size_t(4) << 20;
         /// Warm free blocks kept beyond which freed blocks are handed back.
         size_t warmReserve = 64;
-        /// Ask for transparent huge pages on slabs.
+        /// Ask for transparent huge pages on slabs. Off: opening an hour of
+        /// stereo was no faster with them (the kernel compacts memory to
+        /// find them), and handing back a single block splits a huge page.
         bool hugePages = false;
     };
 
