@@ -24,6 +24,7 @@
 #include "files/MediaFile.h"
 #include "files/MediaFormat.h"
 #include "files/MediaTrack.h"
+#include "sound/BlockPool.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "sound/SampleAllocator.h"
@@ -192,6 +193,7 @@ void BM_OpenOneHourWav(benchmark::State& state)
             // Every round opens into fresh memory, as the first open of a
             // session does, instead of into the blocks the last round freed.
             SampleAllocator::Shared().ReleaseCached();
+            BlockPool::Shared().ReleaseFree();
             const double baselineSeconds = SecondsOf(ffmpeg);
             const double bareSeconds = SecondsOf([&] { DecodeOnly(file); });
             ours = round == 0 ? seconds : std::min(ours, seconds);

@@ -4,6 +4,7 @@
 #include <cstring>
 #include <new>
 
+#include "sound/BlockPool.h"
 #include "sound/SpillFile.h"
 
 namespace glimmet {
@@ -24,8 +25,8 @@ std::atomic<int64_t>& ResidentCounter()
 
 }  // namespace
 
-SampleBlock::SampleBlock(std::unique_ptr<int16_t[]> samples, int64_t count)
-    : samples_(samples.release()), count_(count), id_(NextId())
+SampleBlock::SampleBlock(int16_t* samples, bool pooled, int64_t count)
+    : samples_(samples), pooled_(pooled), count_(count), id_(NextId())
 {
     ResidentCounter().fetch_add(Bytes(), std::memory_order_relaxed);
 }
@@ -35,7 +36,7 @@ SampleBlock::~SampleBlock()
     int16_t* samples = samples_.load(std::memory_order_relaxed);
     if (samples != nullptr) {
         ResidentCounter().fetch_sub(Bytes(), std::memory_order_relaxed);
-        delete[] samples;
+        FreeSamples(samples, pooled_);
     }
     if (file_ != nullptr)
         file_->Release(fileOffset_, Bytes());
@@ -46,21 +47,50 @@ int64_t SampleBlock::ResidentBytes()
     return ResidentCounter().load(std::memory_order_relaxed);
 }
 
+int16_t* SampleBlock::NewSamples(int64_t count, bool* pooled)
+{
+    // Only full-size blocks are pooled: they are nearly all of a long
+    // document's memory. Odd sizes (ends of edits and files) are few, and
+    // rounding them up to a whole block could double what a short one costs.
+    *pooled = size_t(count) * sizeof(int16_t) == BlockPool::kBlockBytes;
+    if (*pooled)
+        return static_cast<int16_t*>(BlockPool::Shared().Allocate());
+    return new (std::nothrow) int16_t[size_t(count)];
+}
+
+void SampleBlock::FreeSamples(int16_t* samples, bool pooled)
+{
+    if (pooled)
+        BlockPool::Shared().Free(samples);
+    else
+        delete[] samples;
+}
+
 std::shared_ptr<SampleBlock> SampleBlock::Allocate(int64_t count)
 {
     if (count < 1 || count > kMaxSamples)
         return nullptr;
-    std::unique_ptr<int16_t[]> samples(new (std::nothrow) int16_t[size_t(count)]);
+    bool pooled = false;
+    int16_t* samples = NewSamples(count, &pooled);
     if (samples == nullptr)
         return nullptr;
-    return std::shared_ptr<SampleBlock>(new (std::nothrow) SampleBlock(std::move(samples), count));
+    auto* block = new (std::nothrow) SampleBlock(samples, pooled, count);
+    if (block == nullptr) {
+        FreeSamples(samples, pooled);
+        return nullptr;
+    }
+    return std::shared_ptr<SampleBlock>(block);
 }
 
 std::shared_ptr<SampleBlock> SampleBlock::Adopt(std::unique_ptr<int16_t[]> samples, int64_t count)
 {
     if (samples == nullptr || count < 1 || count > kMaxSamples)
         return nullptr;
-    return std::shared_ptr<SampleBlock>(new (std::nothrow) SampleBlock(std::move(samples), count));
+    auto* block = new (std::nothrow) SampleBlock(samples.get(), false, count);
+    if (block == nullptr)
+        return nullptr;
+    samples.release();
+    return std::shared_ptr<SampleBlock>(block);
 }
 
 std::shared_ptr<const SampleBlock> SampleBlock::CopyOf(const int16_t* samples, int64_t count)
@@ -100,11 +130,17 @@ bool SampleBlock::MakeResident() const
         return true;
     if (file_ == nullptr)
         return false;
-    std::unique_ptr<int16_t[]> samples(new (std::nothrow) int16_t[size_t(count_)]);
-    if (samples == nullptr || !file_->Read(fileOffset_, samples.get(), Bytes()))
+    bool pooled = false;
+    int16_t* samples = NewSamples(count_, &pooled);
+    if (samples == nullptr)
         return false;
+    if (!file_->Read(fileOffset_, samples, Bytes())) {
+        FreeSamples(samples, pooled);
+        return false;
+    }
     ResidentCounter().fetch_add(Bytes(), std::memory_order_relaxed);
-    samples_.store(samples.release(), std::memory_order_release);
+    pooled_ = pooled;
+    samples_.store(samples, std::memory_order_release);
     // A block read back is usually headed for a channel, where it may live
     // long after the history is gone: its copy must not keep the file open.
     file_->Release(fileOffset_, Bytes());
@@ -156,7 +192,7 @@ bool SampleBlock::DropSamples() const
         return false;
     samples_.store(nullptr, std::memory_order_release);
     ResidentCounter().fetch_sub(Bytes(), std::memory_order_relaxed);
-    delete[] samples;
+    FreeSamples(samples, pooled_);
     return true;
 }
 

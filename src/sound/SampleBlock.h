@@ -84,11 +84,18 @@ public:
     static int64_t ResidentBytes();
 
 private:
-    SampleBlock(std::unique_ptr<int16_t[]> samples, int64_t count);
+    SampleBlock(int16_t* samples, bool pooled, int64_t count);
     const int16_t* LoadSamples() const;
+    /// Memory for count samples: full-size blocks come from the BlockPool,
+    /// other sizes from new[]; null when none can be had.
+    static int16_t* NewSamples(int64_t count, bool* pooled);
+    static void FreeSamples(int16_t* samples, bool pooled);
 
-    // Owned (from new[]); null while the samples live only in the file.
+    // Owned; null while the samples live only in the file.
     mutable std::atomic<int16_t*> samples_;
+    // Whether samples_ came from the BlockPool (otherwise from new[]); changes
+    // with samples_, under residencyLock_ after construction.
+    mutable bool pooled_;
     int64_t count_;
     uint64_t id_;
     // Guards the file copy and every change of samples_ after construction.

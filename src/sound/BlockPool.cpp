@@ -1,0 +1,263 @@
+#include "sound/BlockPool.h"
+
+#include <sys/mman.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdint>
+
+#if defined(__SANITIZE_ADDRESS__)
+#define GLIMMET_ASAN 1
+#elif defined(__has_feature)
+#if __has_feature(address_sanitizer)
+#define GLIMMET_ASAN 1
+#endif
+#endif
+
+#ifdef GLIMMET_ASAN
+#include <sanitizer/asan_interface.h>
+#endif
+
+#ifndef MADV_POPULATE_WRITE
+#define MADV_POPULATE_WRITE 23
+#endif
+
+namespace glimmet {
+
+namespace {
+
+constexpr size_t kPage = 4096;
+// Slabs start on a huge-page boundary so that huge pages can back them.
+constexpr size_t kSlabAlign = size_t(2) << 20;
+
+// The sanitizer does not watch mapped memory by itself: a free block is
+// poisoned so that a use after free is still caught.
+void Poison(void* start, size_t bytes)
+{
+#ifdef GLIMMET_ASAN
+    ASAN_POISON_MEMORY_REGION(start, bytes);
+#else
+    (void)start;
+    (void)bytes;
+#endif
+}
+
+void Unpoison(void* start, size_t bytes)
+{
+#ifdef GLIMMET_ASAN
+    ASAN_UNPOISON_MEMORY_REGION(start, bytes);
+#else
+    (void)start;
+    (void)bytes;
+#endif
+}
+
+/// Calls f(start, bytes) for each run of adjacent blocks, so that a system
+/// call covers as much as it can.
+template <typename F>
+void ForEachRun(std::vector<void*>& blocks, F&& f)
+{
+    std::sort(blocks.begin(), blocks.end());
+    size_t first = 0;
+    while (first < blocks.size()) {
+        size_t last = first;
+        while (last + 1 < blocks.size()
+               && static_cast<char*>(blocks[last]) + BlockPool::kBlockBytes == static_cast<char*>(blocks[last + 1]))
+            ++last;
+        f(static_cast<char*>(blocks[first]), (last - first + 1) * BlockPool::kBlockBytes);
+        first = last + 1;
+    }
+}
+
+/// A mapping of bytes starting on a kSlabAlign boundary, or null.
+void* MapAligned(size_t bytes)
+{
+    const size_t padded = bytes + kSlabAlign;
+    void* raw = mmap(nullptr, padded, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    if (raw == MAP_FAILED)
+        return nullptr;
+    const uintptr_t address = reinterpret_cast<uintptr_t>(raw);
+    const uintptr_t start = (address + kSlabAlign - 1) & ~uintptr_t(kSlabAlign - 1);
+    const size_t head = start - address;
+    if (head > 0)
+        munmap(raw, head);
+    const size_t tail = padded - head - bytes;
+    if (tail > 0)
+        munmap(reinterpret_cast<void*>(start + bytes), tail);
+    return reinterpret_cast<void*>(start);
+}
+
+}  // namespace
+
+BlockPool::BlockPool() : BlockPool(Limits()) {}
+
+BlockPool::BlockPool(const Limits& limits) : limits_(limits) {}
+
+BlockPool::~BlockPool()
+{
+    for (void* slab : slabs_) {
+        Unpoison(slab, limits_.slabBytes);
+        munmap(slab, limits_.slabBytes);
+    }
+}
+
+BlockPool& BlockPool::Shared()
+{
+    static BlockPool* shared = new BlockPool();
+    return *shared;
+}
+
+void* BlockPool::Allocate()
+{
+    // Two tries: another thread may take the blocks a refill just made.
+    for (int attempt = 0; attempt < 2; ++attempt) {
+        {
+            std::lock_guard guard(mutex_);
+            if (!warm_.empty()) {
+                void* block = warm_.back();
+                warm_.pop_back();
+                inUse_++;
+                Unpoison(block, kBlockBytes);
+                return block;
+            }
+        }
+        if (!Refill())
+            return nullptr;
+    }
+    return nullptr;
+}
+
+void BlockPool::Free(void* block)
+{
+    if (block == nullptr)
+        return;
+    Poison(block, kBlockBytes);
+    const size_t batch = std::max<size_t>(1, limits_.slabBytes / kBlockBytes);
+    std::vector<void*> surplus;
+    {
+        std::lock_guard guard(mutex_);
+        warm_.push_back(block);
+        inUse_--;
+        if (warm_.size() < limits_.warmReserve + batch)
+            return;
+        // The blocks freed longest ago go back to the system; the newest
+        // stay warm for the next allocations.
+        const size_t count = warm_.size() - limits_.warmReserve;
+        surplus.assign(warm_.begin(), warm_.begin() + ptrdiff_t(count));
+        warm_.erase(warm_.begin(), warm_.begin() + ptrdiff_t(count));
+    }
+    Release(surplus);
+    std::lock_guard guard(mutex_);
+    cold_.insert(cold_.end(), surplus.begin(), surplus.end());
+}
+
+void BlockPool::ReleaseFree()
+{
+    std::vector<void*> blocks;
+    {
+        std::lock_guard guard(mutex_);
+        blocks.swap(warm_);
+    }
+    Release(blocks);
+    std::lock_guard guard(mutex_);
+    cold_.insert(cold_.end(), blocks.begin(), blocks.end());
+}
+
+bool BlockPool::Refill()
+{
+    const size_t batch = std::max<size_t>(1, limits_.slabBytes / kBlockBytes);
+    std::vector<void*> blocks;
+    {
+        std::lock_guard guard(mutex_);
+        const size_t count = std::min(batch, cold_.size());
+        blocks.assign(cold_.end() - ptrdiff_t(count), cold_.end());
+        cold_.resize(cold_.size() - count);
+    }
+    if (blocks.empty())
+        return MapSlab();
+    const bool populated = Populate(blocks);
+    std::lock_guard guard(mutex_);
+    (populated ? warm_ : cold_).insert((populated ? warm_ : cold_).end(), blocks.begin(), blocks.end());
+    return populated;
+}
+
+bool BlockPool::MapSlab()
+{
+    const size_t bytes = limits_.slabBytes / kBlockBytes * kBlockBytes;
+    if (bytes == 0)
+        return false;
+    char* slab = static_cast<char*>(MapAligned(bytes));
+    if (slab == nullptr)
+        return false;
+    if (limits_.hugePages)
+        madvise(slab, bytes, MADV_HUGEPAGE);
+    std::vector<void*> blocks;
+    blocks.reserve(bytes / kBlockBytes);
+    for (size_t offset = 0; offset < bytes; offset += kBlockBytes)
+        blocks.push_back(slab + offset);
+    Poison(slab, bytes);
+    if (!Populate(blocks)) {
+        Unpoison(slab, bytes);
+        munmap(slab, bytes);
+        return false;
+    }
+    // Handed out from the top of the stack: the slab's first block first,
+    // so that blocks allocated in a row lie in a row.
+    std::reverse(blocks.begin(), blocks.end());
+    std::lock_guard guard(mutex_);
+    slabs_.push_back(slab);
+    warm_.insert(warm_.end(), blocks.begin(), blocks.end());
+    return true;
+}
+
+bool BlockPool::Populate(std::vector<void*>& blocks)
+{
+    bool ok = true;
+    ForEachRun(blocks, [&](char* start, size_t bytes) {
+        if (!ok || madvise(start, bytes, MADV_POPULATE_WRITE) == 0)
+            return;
+        // A kernel without MADV_POPULATE_WRITE refuses it with EINVAL and the
+        // pages are touched one by one instead; any other refusal means the
+        // memory is not there to be had.
+        if (errno != EINVAL) {
+            ok = false;
+            return;
+        }
+        Unpoison(start, bytes);
+        for (size_t offset = 0; offset < bytes; offset += kPage)
+            static_cast<volatile char*>(start)[offset] = 0;
+        Poison(start, bytes);
+    });
+    return ok;
+}
+
+void BlockPool::Release(std::vector<void*>& blocks)
+{
+    ForEachRun(blocks, [](char* start, size_t bytes) { madvise(start, bytes, MADV_DONTNEED); });
+}
+
+size_t BlockPool::BlocksInUse()
+{
+    std::lock_guard guard(mutex_);
+    return inUse_;
+}
+
+size_t BlockPool::WarmBlocks()
+{
+    std::lock_guard guard(mutex_);
+    return warm_.size();
+}
+
+size_t BlockPool::ColdBlocks()
+{
+    std::lock_guard guard(mutex_);
+    return cold_.size();
+}
+
+size_t BlockPool::SlabsMapped()
+{
+    std::lock_guard guard(mutex_);
+    return slabs_.size();
+}
+
+}  // namespace glimmet
