@@ -91,17 +91,75 @@ int64_t Action::SnapshotBytes() const
 status_t Action::TransformSelectedRanges(const std::function<void(int16_t*, int64_t)>& transform)
 {
     std::lock_guard guard(manager_->DocumentLock());
+    const bool recorded = RecordGoInput();
     RangeTransformer transformer(manager_, rangeStart_, rangeEnd_);
     transformer.TransformSelected(transform);
+    RecordGoOutput(recorded && transformer.InitCheck() == B_OK);
     return transformer.InitCheck();
 }
 
 status_t Action::TransformSelectedRanges(const PieceTransform& transform)
 {
     std::lock_guard guard(manager_->DocumentLock());
+    const bool recorded = RecordGoInput();
     RangeTransformer transformer(manager_, rangeStart_, rangeEnd_);
     transformer.TransformSelected(transform);
+    RecordGoOutput(recorded && transformer.InitCheck() == B_OK);
     return transformer.InitCheck();
+}
+
+void Action::ForgetGoRecord()
+{
+    for (SavedChannel& saved : savedChannels_) {
+        saved.redoHeld = false;
+        saved.redo = SampleSlice();
+        saved.undone = SampleSlice();
+    }
+}
+
+bool Action::RecordGoInput()
+{
+    ForgetGoRecord();
+    if (!RedoPutsResultBack() || savedChannels_.empty() || frameCount_ < 1)
+        return false;
+    // The transform reads every selected channel; its result is a function
+    // of the recorded channels' ranges alone only when exactly those are
+    // selected and every range lies inside its channel's data (a channel
+    // the read refuses would get the previous channel's samples).
+    size_t next = 0;
+    for (int32_t i = 0; Channel* channel = manager_->ChannelAt(i); i++) {
+        if (!channel->IsSelected())
+            continue;
+        if (next >= savedChannels_.size() || savedChannels_[next].index != i || !RangeInside(channel))
+            return false;
+        SavedChannel& saved = savedChannels_[next++];
+        saved.redoChannel = channel->Id();
+        if (channel->ReadSlice(rangeStart_, frameCount_, &saved.undone) != B_OK)
+            return false;
+    }
+    return next == savedChannels_.size();
+}
+
+void Action::RecordGoOutput(bool recorded)
+{
+    if (!recorded) {
+        ForgetGoRecord();
+        return;
+    }
+    for (SavedChannel& saved : savedChannels_) {
+        Channel* channel = manager_->ChannelAt(saved.index);
+        if (channel == nullptr || channel->ReadSlice(rangeStart_, frameCount_, &saved.redo) != B_OK) {
+            ForgetGoRecord();
+            return;
+        }
+    }
+    for (SavedChannel& saved : savedChannels_)
+        saved.redoHeld = true;
+}
+
+bool Action::RangeInside(Channel* channel) const
+{
+    return channel->FirstFrame() <= rangeStart_ && rangeEnd_ < channel->EndFrame();
 }
 
 status_t Action::Go()
@@ -146,20 +204,22 @@ status_t Action::Undo()
     if (manager_ == nullptr)
         return B_ERROR;
     manager_->Lock();
-    const bool keepResult = RedoPutsResultBack();
-    RestoreSelection([this, keepResult](Channel* channel, size_t record) {
+    // What the last Go made stays good for a redo only while the channel
+    // still shows it: an undo since of a later action need not have given
+    // the range back exactly.
+    bool keepResult = RedoPutsResultBack();
+    size_t visited = 0;
+    RestoreSelection([this, &keepResult, &visited](Channel* channel, size_t record) {
+        visited++;
         SavedChannel& saved = savedChannels_[record];
-        saved.redoHeld = keepResult && saved.held && saved.inside &&
-            channel->ReadSlice(rangeStart_, frameCount_, &saved.redo) == B_OK;
-        if (!saved.redoHeld)
-            saved.redo = SampleSlice();
-        saved.redoChannel = channel->Id();
+        SampleSlice now;
+        keepResult = keepResult && saved.redoHeld && channel->Id() == saved.redoChannel && RangeInside(channel) &&
+            channel->ReadSlice(rangeStart_, frameCount_, &now) == B_OK && now.SameSamples(saved.redo);
         if (saved.held)
             channel->ReplaceFrames(saved.data, rangeStart_, rangeEnd_);
-        saved.undone = SampleSlice();
-        if (saved.redoHeld)
-            saved.redoHeld = channel->ReadSlice(rangeStart_, frameCount_, &saved.undone) == B_OK;
     });
+    if (!keepResult || visited != savedChannels_.size())
+        ForgetGoRecord();
     RestoreRange();
     manager_->Unlock();
     return B_OK;
@@ -173,10 +233,10 @@ bool Action::PutResultBack()
         Channel* channel = manager_->ChannelAt(saved.index);
         if (!saved.redoHeld || channel == nullptr || channel->Id() != saved.redoChannel)
             return false;
-        // Other undos and redos since may have changed what Go would read.
+        // Go would compute what it kept only from the samples it read then.
         SampleSlice now;
-        if (channel->FirstFrame() > rangeStart_ || rangeEnd_ >= channel->EndFrame() ||
-            channel->ReadSlice(rangeStart_, frameCount_, &now) != B_OK || !now.SameSamples(saved.undone))
+        if (!RangeInside(channel) || channel->ReadSlice(rangeStart_, frameCount_, &now) != B_OK ||
+            !now.SameSamples(saved.undone))
             return false;
     }
     // Go works on every selected channel: one selected since, after the
@@ -186,14 +246,11 @@ bool Action::PutResultBack()
         if (channel->IsSelected())
             return false;
     }
-    // Every range lay inside its channel's data, so the undo gave each back
-    // exactly and Go would compute what it computed before.
+    // The same channels hold, inside their data, what the last Go read:
+    // Go would compute what it made then. The record stays for the next
+    // undo and redo.
     RestoreSelection([this](Channel* channel, size_t record) {
-        SavedChannel& saved = savedChannels_[record];
-        channel->ReplaceFrames(saved.redo, rangeStart_, rangeEnd_);
-        saved.redo = SampleSlice();
-        saved.undone = SampleSlice();
-        saved.redoHeld = false;
+        channel->ReplaceFrames(savedChannels_[record].redo, rangeStart_, rangeEnd_);
     });
     return true;
 }
@@ -205,8 +262,11 @@ status_t Action::Redo()
     manager_->Lock();
     RestoreRange();
     const bool putBack = RedoPutsResultBack() && PutResultBack();
-    if (!putBack)
+    if (!putBack) {
+        // A Go that does not reach the transform keeps no record.
+        ForgetGoRecord();
         RestoreSelection(nullptr);
+    }
     manager_->Unlock();
     return putBack ? B_OK : Go();
 }
@@ -229,8 +289,10 @@ bool Action::SupportsConfiguration()
 void Action::VisitKeptBlocks(const BlockVisitor& visit) const
 {
     for (const SavedChannel& record : savedChannels_) {
-        for (size_t i = 0; i < record.data.blocks.BlockCount(); ++i)
-            visit(record.data.blocks.BlockAt(i));
+        for (const SampleSlice* slice : {&record.data, &record.redo, &record.undone}) {
+            for (size_t i = 0; i < slice->blocks.BlockCount(); ++i)
+                visit(slice->blocks.BlockAt(i));
+        }
     }
 }
 

@@ -102,13 +102,16 @@ protected:
         /// transforms then change nothing but the range, and undo gives the
         /// range back exactly.
         bool inside = false;
-        /// The range as the last Go left it, kept by Undo for a redo that
+        /// The range as the last Go's transform left it, for a redo that
         /// puts it back instead of computing it again.
         SampleSlice redo;
+        /// True while redo and undone are good: the last Go transformed
+        /// exactly the recorded channels, each inside its data, and every
+        /// undo since found redo still in place.
         bool redoHeld = false;
-        uint64_t redoChannel = 0;  // the channel it was taken from
-        /// The range as the undo left it: a redo puts the result back only
-        /// while the range still holds these samples.
+        uint64_t redoChannel = 0;  // the channel they were taken from
+        /// The range as the last Go's transform read it: a redo puts the
+        /// result back only while the range holds these samples again.
         SampleSlice undone;
     };
 
@@ -147,9 +150,16 @@ protected:
 
 private:
     void TakeSnapshot();
-    /// Puts back the results the last undo kept; false, changing nothing,
-    /// unless it kept one for every recorded channel.
+    /// Puts back the results the last Go made; false, changing nothing,
+    /// unless every recorded channel holds again what that Go read.
     bool PutResultBack();
+    /// Keeps what the transform is about to read (true) when the result
+    /// can be put back later; caller holds the document lock.
+    bool RecordGoInput();
+    /// Keeps what the transform made when recorded, else forgets the record.
+    void RecordGoOutput(bool recorded);
+    void ForgetGoRecord();
+    bool RangeInside(Channel* channel) const;
 
     MessageTarget* window_;
     ChannelManager* manager_ = nullptr;

@@ -34,10 +34,9 @@ status_t PasteAction::Go()
     if (InitCheck() != B_OK)
         return B_ERROR;
     firstChannel_ = FirstSelectedChannel();
-    std::vector<const int16_t*> buffers;
-    int32_t count = 0;
+    std::vector<SampleSlice> buffers;
     int64_t frames = 0;
-    pasted_ = copyBuffer_ != nullptr && copyBuffer_->GetCopyBuffer(buffers, count, frames);
+    pasted_ = copyBuffer_ != nullptr && copyBuffer_->GetSlices(buffers, frames);
     if (pasted_) {
         pastedChannelCount_ = 0;
         if (ReplaceMode())
@@ -51,13 +50,13 @@ status_t PasteAction::Go()
     return B_OK;
 }
 
-void PasteAction::PasteOverRange(const std::vector<const int16_t*>& buffers, int64_t frames)
+void PasteAction::PasteOverRange(const std::vector<SampleSlice>& buffers, int64_t frames)
 {
     for (size_t i = 0; i < buffers.size(); i++) {
         Channel* channel = Manager()->ChannelAt(firstChannel_ + int32_t(i));
         if (channel == nullptr)
             break;
-        const status_t status = channel->ReplaceFrames(buffers[i], frames, RangeStart(), RangeEnd());
+        const status_t status = channel->ReplaceFrames(buffers[i], RangeStart(), RangeEnd());
         if (status != B_OK)
             Diagnostics::Print("error replacing frames: %s\n", StatusText(status));
         pastedChannelCount_++;
@@ -69,7 +68,7 @@ void PasteAction::PasteOverRange(const std::vector<const int16_t*>& buffers, int
     Manager()->SetRangeEnd(pasteEnd_);
 }
 
-void PasteAction::InsertAtCursor(const std::vector<const int16_t*>& buffers, int64_t frames)
+void PasteAction::InsertAtCursor(const std::vector<SampleSlice>& buffers, int64_t frames)
 {
     // With no channel focused, the paste starts at the first one.
     firstChannel_ = std::max(Context()->FocusIndex(), 0);
@@ -77,7 +76,7 @@ void PasteAction::InsertAtCursor(const std::vector<const int16_t*>& buffers, int
         Channel* channel = Manager()->ChannelAt(firstChannel_ + int32_t(i));
         if (channel == nullptr)
             break;
-        const status_t status = channel->InsertFrames(buffers[i], frames, Cursor());
+        const status_t status = channel->InsertFrames(buffers[i], Cursor());
         if (status != B_OK)
             Diagnostics::Print("error inserting frames: %s\n", StatusText(status));
         channel->SetSelected(true);

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/Action.h"
+#include "sound/SampleSlice.h"
 
 namespace glimmet {
 
@@ -37,8 +38,8 @@ public:
 private:
     int32_t FirstSelectedChannel();
     bool ReplaceMode() const;
-    void PasteOverRange(const std::vector<const int16_t*>& buffers, int64_t frames);
-    void InsertAtCursor(const std::vector<const int16_t*>& buffers, int64_t frames);
+    void PasteOverRange(const std::vector<SampleSlice>& buffers, int64_t frames);
+    void InsertAtCursor(const std::vector<SampleSlice>& buffers, int64_t frames);
     void RemoveInsertedFrames();
 
     const CopyBuffer* copyBuffer_;

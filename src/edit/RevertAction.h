@@ -12,6 +12,9 @@ public:
     /// B_ERROR without touching anything when the action is not bound.
     status_t Go() override;
     const char* Name() override;
+
+protected:
+    bool RedoPutsResultBack() const override { return true; }
 };
 
 }  // namespace glimmet

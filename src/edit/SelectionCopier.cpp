@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <vector>
 
-#include "edit/Action.h"
 #include "edit/CopyBuffer.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
@@ -22,21 +21,21 @@ std::vector<Channel*> SelectedChannels(ChannelManager& manager)
     return selected;
 }
 
-/// One array per channel with its frames from start on; empty as soon as
-/// one array cannot be had, so that a copy is whole or nothing.
-std::vector<CopyBuffer::Samples> CopyRanges(const std::vector<Channel*>& channels, int64_t start, int64_t frames)
+/// One slice per channel with its frames from start on, sharing the
+/// channel's blocks; empty as soon as one cannot be had, so that a copy is
+/// whole or nothing. A copy that FillBuffer would refuse is silence.
+std::vector<SampleSlice> CopyRanges(const std::vector<Channel*>& channels, int64_t start, int64_t frames)
 {
-    std::vector<CopyBuffer::Samples> copies;
+    std::vector<SampleSlice> copies;
+    if (frames < 1)
+        return {};
     for (Channel* channel : channels) {
-        CopyBuffer::Samples samples = Action::AllocateSamples(frames);
-        if (!samples)
+        SampleSlice slice;
+        if (channel->ReadSlice(start, frames, &slice) == B_NO_MEMORY)
             return {};
         // A channel that refuses the read (a range starting exactly at its
-        // end) leaves the array untouched: its part of the copy is silence,
-        // never whatever the memory held before.
-        if (!channel->FillBuffer(samples.get(), start, frames))
-            std::fill_n(samples.get(), frames, int16_t(0));
-        copies.push_back(std::move(samples));
+        // end) gives a slice of silence, never whatever came before.
+        copies.push_back(std::move(slice));
     }
     return copies;
 }
@@ -53,7 +52,7 @@ bool SelectionCopier::CopySelection(ChannelManager& manager, CopyBuffer& buffer)
         const int64_t frames = manager.RangeEnd() - start + 1;
         // The buffer refuses an empty set of channels, which keeps the old
         // copy when the range was too long for any array.
-        copied = buffer.SetCopyBuffer(CopyRanges(selected, start, frames), frames);
+        copied = buffer.SetSlices(CopyRanges(selected, start, frames), frames);
     }
     manager.Unlock();
     return copied;

@@ -1,0 +1,95 @@
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <random>
+#include <vector>
+
+#include "TestDocument.h"
+#include "edit/FadeInAction.h"
+#include "edit/MoveSampleAction.h"
+#include "sound/BlockBuilder.h"
+#include "sound/Channel.h"
+
+namespace glimmet {
+namespace {
+
+using test::TestDocument;
+
+constexpr int64_t kBlock = BlockBuilder::kBlockSamples;
+
+std::vector<uint64_t> BlockIds(Channel& channel)
+{
+    std::vector<uint64_t> ids;
+    channel.ReadSpans(0, channel.FrameCount(), [&ids](const SampleSpan& span) { ids.push_back(span.block->Id()); });
+    return ids;
+}
+
+std::vector<int16_t> SamplesOf(Channel& channel)
+{
+    std::vector<int16_t> samples;
+    channel.ReadSpans(0, channel.FrameCount(), [&samples](const SampleSpan& span) {
+        samples.insert(samples.end(), span.samples, span.samples + span.count);
+    });
+    return samples;
+}
+
+Channel* AddLongChannel(TestDocument& document, int64_t count)
+{
+    std::mt19937 random(7);
+    std::uniform_int_distribution<int> value(-32768, 32767);
+    std::vector<int16_t> samples(static_cast<size_t>(count));
+    for (int16_t& sample : samples)
+        sample = int16_t(value(random));
+    Channel* channel = document.AddChannel({}, 0, true);
+    EXPECT_EQ(channel->InsertFrames(samples.data(), count, 0), B_OK);
+    return channel;
+}
+
+TEST(RedoPutBackTest, ARedoOfAFadeGivesBackTheBlocksItsGoMade)
+{
+    TestDocument document;
+    const int64_t count = 8 * kBlock;
+    Channel* channel = AddLongChannel(document, count);
+    document.SetRange(0, count - 1);
+    FadeInAction action(nullptr);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
+    ASSERT_EQ(action.Go(), B_OK);
+    const std::vector<uint64_t> faded = BlockIds(*channel);
+    const std::vector<int16_t> fadedSamples = SamplesOf(*channel);
+    for (int round = 0; round < 2; round++) {
+        ASSERT_EQ(action.Undo(), B_OK);
+        ASSERT_EQ(action.Redo(), B_OK);
+        // Not computed again: the very blocks come back.
+        EXPECT_EQ(BlockIds(*channel), faded);
+        EXPECT_EQ(SamplesOf(*channel), fadedSamples);
+    }
+}
+
+TEST(RedoPutBackTest, ARedoAfterTheRangeChangedUnderneathComputesAgain)
+{
+    TestDocument document;
+    const int64_t count = 4 * kBlock;
+    Channel* channel = AddLongChannel(document, count);
+    document.SetRange(10, count - 11);
+    FadeInAction action(nullptr);
+    ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
+    ASSERT_EQ(action.Go(), B_OK);
+    ASSERT_EQ(action.Undo(), B_OK);
+    // Something outside the history rewrites the range before the redo.
+    std::vector<int16_t> other(size_t(count - 20), 1000);
+    ASSERT_EQ(channel->ReplaceFrames(other.data(), int64_t(other.size()), 10, count - 11), B_OK);
+    ASSERT_EQ(action.Redo(), B_OK);
+    std::vector<int16_t> expected(size_t(count - 20), 1000);
+    FadeInAction reference(nullptr);
+    TestDocument plain;
+    Channel* copy = plain.AddChannel(expected, 0, true);
+    plain.SetRange(0, int64_t(expected.size()) - 1);
+    ASSERT_EQ(reference.SetTo(&plain.manager, &plain.position), B_OK);
+    ASSERT_EQ(reference.Go(), B_OK);
+    const std::vector<int16_t> all = SamplesOf(*channel);
+    const std::vector<int16_t> middle(all.begin() + 10, all.end() - 10);
+    EXPECT_EQ(middle, SamplesOf(*copy));
+}
+
+}  // namespace
+}  // namespace glimmet
