@@ -107,7 +107,7 @@ int RunOne(const Maker& maker, const Range& range)
     // Only where the data lies may legitimately differ after undo (a channel
     // grown by a range outside its data keeps its new extent); the timeline
     // reads as before where the channel had data. Read through FillBuffer:
-    // a grown channel is too long for Data().
+    // a grown channel may be too long to hold in one array.
     for (size_t c = 0; c < before.channels.size(); c++) {
         const test::ChannelState& was = before.channels[c];
         Channel* channel = document.manager.ChannelAt(int32_t(c));

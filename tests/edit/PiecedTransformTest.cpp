@@ -231,7 +231,6 @@ TEST(PiecedTransformTest, EveryTransformMatchesTheWholeRangeArrayRun)
             ASSERT_EQ(pieced.State(), whole.State())
                 << transform.name << " round " << round << " range " << start << ".." << end;
 
-            // Read without Data(), which would gather the blocks.
             ASSERT_EQ(action->Undo(), B_OK);
             ASSERT_EQ(action->Redo(), B_OK);
             if (inside) {

@@ -48,8 +48,8 @@ std::unique_ptr<Action> MakeAction(Kind kind, const CopyBuffer* copyBuffer)
     return nullptr;
 }
 
-/// A channel as the program can see it, read span by span: reading through
-/// Data() would gather the blocks into one and hide how edits share them.
+/// A channel as the program can see it, read span by span, as the mixer and
+/// the views read it.
 ChannelState Observe(Channel* channel)
 {
     ChannelState state;
