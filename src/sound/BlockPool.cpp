@@ -6,51 +6,22 @@
 #include <cerrno>
 #include <cstdint>
 
-#if defined(__SANITIZE_ADDRESS__)
-#define GLIMMET_ASAN 1
-#elif defined(__has_feature)
-#if __has_feature(address_sanitizer)
-#define GLIMMET_ASAN 1
-#endif
-#endif
-
-#ifdef GLIMMET_ASAN
-#include <sanitizer/asan_interface.h>
-#endif
-
 #ifndef MADV_POPULATE_WRITE
 #define MADV_POPULATE_WRITE 23
 #endif
 
+#include "sound/SanitizerPoison.h"
+
 namespace glimmet {
+
+using sanitizer::Poison;
+using sanitizer::Unpoison;
 
 namespace {
 
 constexpr size_t kPage = 4096;
 // Slabs start on a huge-page boundary so that huge pages can back them.
 constexpr size_t kSlabAlign = size_t(2) << 20;
-
-// The sanitizer does not watch mapped memory by itself: a free block is
-// poisoned so that a use after free is still caught.
-void Poison(void* start, size_t bytes)
-{
-#ifdef GLIMMET_ASAN
-    ASAN_POISON_MEMORY_REGION(start, bytes);
-#else
-    (void)start;
-    (void)bytes;
-#endif
-}
-
-void Unpoison(void* start, size_t bytes)
-{
-#ifdef GLIMMET_ASAN
-    ASAN_UNPOISON_MEMORY_REGION(start, bytes);
-#else
-    (void)start;
-    (void)bytes;
-#endif
-}
 
 /// Calls f(start, bytes) for each run of adjacent blocks, so that a system
 /// call covers as much as it can.

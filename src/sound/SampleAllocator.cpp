@@ -7,23 +7,16 @@
 #include <cstdint>
 #include <new>
 
-#if defined(__SANITIZE_ADDRESS__)
-#define GLIMMET_ASAN 1
-#elif defined(__has_feature)
-#if __has_feature(address_sanitizer)
-#define GLIMMET_ASAN 1
-#endif
-#endif
-
-#ifdef GLIMMET_ASAN
-#include <sanitizer/asan_interface.h>
-#endif
-
 #ifndef MADV_POPULATE_WRITE
 #define MADV_POPULATE_WRITE 23
 #endif
 
+#include "sound/SanitizerPoison.h"
+
 namespace glimmet {
+
+using sanitizer::Poison;
+using sanitizer::Unpoison;
 
 namespace {
 
@@ -40,29 +33,6 @@ size_t RoundUp(size_t bytes, size_t unit)
 size_t RoundUpToPage(size_t bytes)
 {
     return RoundUp(bytes, kPage);
-}
-
-// The sanitizer does not watch mapped memory by itself: a cached block is
-// poisoned so that a use after free is still caught, and the part of a block
-// beyond the array stays poisoned so that an overrun is too.
-void Poison(void* start, size_t bytes)
-{
-#ifdef GLIMMET_ASAN
-    ASAN_POISON_MEMORY_REGION(start, bytes);
-#else
-    (void)start;
-    (void)bytes;
-#endif
-}
-
-void Unpoison(void* start, size_t bytes)
-{
-#ifdef GLIMMET_ASAN
-    ASAN_UNPOISON_MEMORY_REGION(start, bytes);
-#else
-    (void)start;
-    (void)bytes;
-#endif
 }
 
 }  // namespace

@@ -11,6 +11,7 @@
 #include "edit/RemoveAction.h"
 #include "sound/BlockBuilder.h"
 #include "sound/Channel.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet {
 namespace {
@@ -19,21 +20,7 @@ using test::TestDocument;
 
 constexpr int64_t kBlock = BlockBuilder::kBlockSamples;
 
-std::vector<uint64_t> BlockIds(Channel& channel)
-{
-    std::vector<uint64_t> ids;
-    channel.ReadSpans(0, channel.FrameCount(), [&ids](const SampleSpan& span) { ids.push_back(span.block->Id()); });
-    return ids;
-}
-
-std::vector<int16_t> SamplesOf(Channel& channel)
-{
-    std::vector<int16_t> samples;
-    channel.ReadSpans(0, channel.FrameCount(), [&samples](const SampleSpan& span) {
-        samples.insert(samples.end(), span.samples, span.samples + span.count);
-    });
-    return samples;
-}
+using test::SamplesOf;
 
 size_t Shared(const std::vector<uint64_t>& a, const std::vector<uint64_t>& b)
 {
@@ -59,7 +46,7 @@ TEST(BlockSharingTest, AFadeOverAWholeChannelKeepsTheOldBlocksForItsUndo)
     TestDocument document;
     const int64_t count = 64 * kBlock;
     Channel* channel = AddLongChannel(document, count, 1);
-    const std::vector<uint64_t> original = BlockIds(*channel);
+    const std::vector<uint64_t> original = test::BlockIdsOf(*channel);
     const std::vector<int16_t> samples = SamplesOf(*channel);
     document.SetRange(0, count - 1);
     FadeInAction action(nullptr);
@@ -67,11 +54,11 @@ TEST(BlockSharingTest, AFadeOverAWholeChannelKeepsTheOldBlocksForItsUndo)
     // The snapshot shares every block: it holds no sample memory of its own.
     EXPECT_EQ(action.SnapshotBytes(), 0);
     ASSERT_EQ(action.Go(), B_OK);
-    EXPECT_EQ(Shared(original, BlockIds(*channel)), 0u);
+    EXPECT_EQ(Shared(original, test::BlockIdsOf(*channel)), 0u);
     EXPECT_NE(SamplesOf(*channel), samples);
     ASSERT_EQ(action.Undo(), B_OK);
     // The very blocks come back: the snapshot held them, not copies.
-    EXPECT_EQ(BlockIds(*channel), original);
+    EXPECT_EQ(test::BlockIdsOf(*channel), original);
     EXPECT_EQ(SamplesOf(*channel), samples);
 }
 
@@ -80,7 +67,7 @@ TEST(BlockSharingTest, CuttingASecondMakesOnlyTheBlocksAroundTheCut)
     TestDocument document;
     const int64_t count = 64 * kBlock;
     Channel* channel = AddLongChannel(document, count, 2);
-    const std::vector<uint64_t> original = BlockIds(*channel);
+    const std::vector<uint64_t> original = test::BlockIdsOf(*channel);
     const std::vector<int16_t> samples = SamplesOf(*channel);
     const int64_t start = 30 * kBlock + 123;
     document.SetRange(start, start + 44099);
@@ -89,12 +76,12 @@ TEST(BlockSharingTest, CuttingASecondMakesOnlyTheBlocksAroundTheCut)
     // Only the blocks cut at the range's two edges are copied.
     EXPECT_LE(action.SnapshotBytes(), 2 * kBlock * 2);
     ASSERT_EQ(action.Go(), B_OK);
-    const std::vector<uint64_t> cut = BlockIds(*channel);
+    const std::vector<uint64_t> cut = test::BlockIdsOf(*channel);
     EXPECT_EQ(channel->FrameCount(), count - 44100);
     EXPECT_LE(cut.size() - Shared(original, cut), 2u);
     ASSERT_EQ(action.Undo(), B_OK);
     EXPECT_EQ(SamplesOf(*channel), samples);
-    const std::vector<uint64_t> restored = BlockIds(*channel);
+    const std::vector<uint64_t> restored = test::BlockIdsOf(*channel);
     // Away from the cut every block is the one the channel had.
     EXPECT_GE(Shared(original, restored), original.size() - 4);
 }

@@ -9,6 +9,7 @@
 #include "edit/MoveSampleAction.h"
 #include "sound/BlockBuilder.h"
 #include "sound/Channel.h"
+#include "sound/ChannelSamples.h"
 
 namespace glimmet {
 namespace {
@@ -17,21 +18,7 @@ using test::TestDocument;
 
 constexpr int64_t kBlock = BlockBuilder::kBlockSamples;
 
-std::vector<uint64_t> BlockIds(Channel& channel)
-{
-    std::vector<uint64_t> ids;
-    channel.ReadSpans(0, channel.FrameCount(), [&ids](const SampleSpan& span) { ids.push_back(span.block->Id()); });
-    return ids;
-}
-
-std::vector<int16_t> SamplesOf(Channel& channel)
-{
-    std::vector<int16_t> samples;
-    channel.ReadSpans(0, channel.FrameCount(), [&samples](const SampleSpan& span) {
-        samples.insert(samples.end(), span.samples, span.samples + span.count);
-    });
-    return samples;
-}
+using test::SamplesOf;
 
 Channel* AddLongChannel(TestDocument& document, int64_t count)
 {
@@ -54,13 +41,13 @@ TEST(RedoPutBackTest, ARedoOfAFadeGivesBackTheBlocksItsGoMade)
     FadeInAction action(nullptr);
     ASSERT_EQ(action.SetTo(&document.manager, &document.position), B_OK);
     ASSERT_EQ(action.Go(), B_OK);
-    const std::vector<uint64_t> faded = BlockIds(*channel);
+    const std::vector<uint64_t> faded = test::BlockIdsOf(*channel);
     const std::vector<int16_t> fadedSamples = SamplesOf(*channel);
     for (int round = 0; round < 2; round++) {
         ASSERT_EQ(action.Undo(), B_OK);
         ASSERT_EQ(action.Redo(), B_OK);
         // Not computed again: the very blocks come back.
-        EXPECT_EQ(BlockIds(*channel), faded);
+        EXPECT_EQ(test::BlockIdsOf(*channel), faded);
         EXPECT_EQ(SamplesOf(*channel), fadedSamples);
     }
 }

@@ -20,6 +20,15 @@ inline std::vector<int16_t> SamplesOf(Channel& channel)
     return samples;
 }
 
+/// The identities of the blocks the channel reads, in order: lets a test see
+/// which blocks an edit shared and which it made.
+inline std::vector<uint64_t> BlockIdsOf(Channel& channel)
+{
+    std::vector<uint64_t> ids;
+    channel.ReadSpans(0, channel.FrameCount(), [&ids](const SampleSpan& span) { ids.push_back(span.block->Id()); });
+    return ids;
+}
+
 /// Where the channel's first sample is stored, or null without data: lets a
 /// test see whether an operation kept the channel's storage.
 inline const int16_t* FirstStoredSample(Channel& channel)
