@@ -110,18 +110,43 @@ void BlockSummary::CountChunks(const int16_t* samples, const int16_t* rowTable)
     }
 }
 
+void BlockSummary::Prefetch(int64_t firstChunk, int64_t endChunk) const
+{
+    if (firstChunk >= endChunk || firstChunk < 0 || endChunk > chunks_)
+        return;
+    const size_t span = size_t(rowSpan_);
+    const size_t bytes = span * sizeof(uint16_t);
+    for (int64_t boundary : {firstChunk, endChunk}) {
+        if (boundary == 0)
+            continue;
+        const char* row = reinterpret_cast<const char*>(running_.data() + size_t(boundary) * span);
+        for (size_t offset = 0; offset < bytes; offset += 64)
+            __builtin_prefetch(row + offset);
+    }
+}
+
 void BlockSummary::AddChunks(uint32_t* counts, uint32_t lastSlot, int64_t firstChunk, int64_t endChunk) const
 {
     if (firstChunk >= endChunk || firstChunk < 0 || endChunk > chunks_)
         return;
     const size_t span = size_t(rowSpan_);
-    const uint16_t* from = running_.data() + size_t(firstChunk) * span;
-    const uint16_t* to = running_.data() + size_t(endChunk) * span;
+    const uint16_t* __restrict to = running_.data() + size_t(endChunk) * span;
+    uint32_t* __restrict rows = counts + lowRow_;
     // Rows past lastSlot all land in the last slot, as counting would put
     // them; only that stretch needs the clamp.
     const size_t direct = std::min<size_t>(span, lastSlot >= uint32_t(lowRow_) ? lastSlot - uint32_t(lowRow_) : 0);
+    // The first boundary is all zeros: a run from a block's start, which
+    // every column reading a whole block takes, needs only its end.
+    if (firstChunk == 0) {
+        for (size_t i = 0; i < direct; ++i)
+            rows[i] += to[i];
+        for (size_t i = direct; i < span; ++i)
+            counts[lastSlot] += to[i];
+        return;
+    }
+    const uint16_t* __restrict from = running_.data() + size_t(firstChunk) * span;
     for (size_t i = 0; i < direct; ++i)
-        counts[size_t(lowRow_) + i] += uint16_t(to[i] - from[i]);
+        rows[i] += uint16_t(to[i] - from[i]);
     for (size_t i = direct; i < span; ++i)
         counts[lastSlot] += uint16_t(to[i] - from[i]);
 }

@@ -48,6 +48,10 @@ public:
     /// 0 <= firstChunk <= endChunk <= CountChunks().
     void AddChunks(uint32_t* counts, uint32_t lastSlot, int64_t firstChunk, int64_t endChunk) const;
 
+    /// Asks for the running counts AddChunks(firstChunk, endChunk) reads to
+    /// come into the cache.
+    void Prefetch(int64_t firstChunk, int64_t endChunk) const;
+
     /// Bytes held, for the memory budget test.
     size_t Bytes() const { return running_.size() * sizeof(uint16_t); }
 

@@ -1,6 +1,8 @@
 #pragma once
 
+#include <array>
 #include <cstdint>
+#include <memory>
 #include <vector>
 
 #include "sound/SampleBlock.h"
@@ -31,6 +33,9 @@ public:
     void Clear();
     /// Counts the span's samples from..to - 1 (offsets inside the span).
     void Add(const SampleSpan& span, int64_t from, int64_t to);
+    /// Asks the memory that counting the span's samples from..to - 1 would
+    /// read to come into the cache, without waiting for it.
+    void Prefetch(const SampleSpan& span, int64_t from, int64_t to);
     /// The counts so far, modulo 2^16, into slots counters.
     void Finish(uint16_t* counters) const;
 
@@ -46,6 +51,14 @@ private:
     static constexpr uint32_t kIncrement = 1;
     static constexpr uint32_t kDecrement = ~uint32_t(0);
 
+    struct KnownSummary {
+        const SampleBlock* block = nullptr;
+        std::shared_ptr<const BlockSummary> summary;
+    };
+
+    static bool InBlock(const SampleSpan& span);
+    std::shared_ptr<const BlockSummary> FittingSummary(const SampleBlock& block);
+    void Remember(const SampleBlock& block, std::shared_ptr<const BlockSummary> summary);
     void Count(const int16_t* samples, int64_t count, uint32_t step);
     void AddFromBlock(const SampleBlock& block, int64_t from, int64_t to);
     std::shared_ptr<const BlockSummary> SummaryFor(const SampleBlock& block, int64_t reading);
@@ -58,6 +71,9 @@ private:
     bool tableKeyKnown_ = false;
     int64_t summariesMade_ = 0;
     std::vector<const SampleBlock*>* wanted_ = nullptr;
+    // Blocks asked lately and their summary for this row table (or null).
+    std::array<KnownSummary, 8> known_;
+    size_t nextKnown_ = 0;
     // Four interleaved sets of counters keep consecutive samples of the
     // same row from waiting on each other.
     std::vector<uint32_t> partials_;

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "views/ColumnQuotients.h"
 #include "views/FrameMapping.h"
 
 namespace glimmet {
@@ -16,34 +17,6 @@ constexpr QRgb kEmptyPlain = qRgb(80, 80, 80);
 
 }  // namespace
 
-// k * count / total for every row of a column. A 64-bit division per pixel
-// would cost more than counting the column's samples from a summary, so the
-// quotient is estimated with the column's reciprocal and then corrected to
-// the exact integer quotient. Dividends stay far below 2^53 (a byte value
-// times at most 65535 samples per row), so nothing overflows.
-class ColumnQuotients {
-public:
-    explicit ColumnQuotients(int64_t total) : total_(total), reciprocal_(1.0 / double(total)) {}
-
-    int64_t Of(int64_t dividend) const
-    {
-        int64_t quotient = int64_t(double(dividend) * reciprocal_);
-        while (quotient > 0 && quotient * total_ > dividend)
-            --quotient;
-        while ((quotient + 1) * total_ <= dividend)
-            ++quotient;
-        return quotient;
-    }
-
-    // k - k * count / total in byte arithmetic.
-    uint8_t Fade(int64_t k, int64_t count) const { return uint8_t(k - Of(k * count)); }
-    uint8_t Rise(int64_t k, int64_t count) const { return uint8_t(Of(k * count)); }
-
-private:
-    int64_t total_;
-    double reciprocal_;
-};
-
 WaveformRenderer::WaveformRenderer(QImage& image, const int16_t* rowTable, int32_t rows, const WaveformScene& scene)
     : image_(image), rowTable_(rowTable), rows_(std::min(rows, image.height())), scene_(scene),
       histogram_(size_t(std::max(rows, image.height()) + 1), 0), counter_(rowTable, uint32_t(histogram_.size())),
@@ -56,12 +29,6 @@ WaveformRenderer::WaveformRenderer(QImage& image, const int16_t* rowTable, int32
         start += std::max<int64_t>(span.count, 0);
     }
     dataCount_ = std::min(start, scene_.channelFrameCount);
-}
-
-// One detach for the whole render instead of one per pixel.
-QRgb& WaveformRenderer::PixelAt(int32_t column, int32_t row)
-{
-    return reinterpret_cast<QRgb*>(pixels_ + ptrdiff_t(row) * stride_)[column];
 }
 
 int32_t WaveformRenderer::RenderColumns(float left, int32_t count, std::vector<RenderedColumn>* memo)
@@ -148,17 +115,56 @@ void WaveformRenderer::FillColumn(int32_t column, ColumnState state)
 void WaveformRenderer::RenderDataColumn(int32_t column, int64_t f0, int64_t f1, ColumnState state)
 {
     CountSamples(f0, f1);
+    // The next column most likely starts where this one ends and is as wide.
+    PrefetchFrames(f1 + 1, f1 + (f1 - f0 + 1));
     const ColumnQuotients total(f1 - f0 + 1);
-    const int32_t half = rows_ / 2;
-    int64_t count = 0;
-    for (int32_t row = rows_ - 1; row >= half; --row) {
-        count += histogram_[size_t(row)];
-        ShadeRow(column, row, count, total, state, true);
+    if (state.cursor && state.playmark) {
+        ShadeColumn(column, [&](int64_t count, bool) {
+            return qRgb(total.Fade(45, count), total.Fade(245, count), total.Fade(255, count));
+        });
+    } else if (state.playmark) {
+        ShadeColumn(column, [&](int64_t count, bool lowerPass) {
+            return qRgb(total.Fade(45, count), lowerPass ? total.Fade(245, count) : total.Fade(255, count),
+                        total.Fade(45, count));
+        });
+    } else if (state.cursor) {
+        ShadeColumn(column, [&](int64_t count, bool) {
+            return qRgb(total.Fade(45, count), total.Fade(45, count), total.Fade(255, count));
+        });
+    } else if (state.inRange) {
+        ShadeColumn(column, [&](int64_t count, bool) {
+            const uint8_t grey = total.Rise(255, count);
+            return qRgb(grey, grey, grey);
+        });
+    } else {
+        ShadeColumn(column, [&](int64_t count, bool) {
+            const uint8_t grey = total.Fade(245, count);
+            return qRgb(grey, grey, grey);
+        });
     }
-    count = 0;
-    for (int32_t row = 0; row < half; ++row) {
-        count += histogram_[size_t(row)];
-        ShadeRow(column, row, count, total, state, false);
+}
+
+// Rows whose histogram entry is empty keep the count, and so the colour, of
+// the row before them; quiet material leaves most rows empty.
+template <typename Shade>
+void WaveformRenderer::ShadeColumn(int32_t column, Shade&& shade)
+{
+    const int32_t half = rows_ / 2;
+    for (int pass = 0; pass < 2; ++pass) {
+        const bool lowerPass = pass == 0;
+        int64_t count = 0;
+        QRgb colour = shade(count, lowerPass);
+        const int32_t first = lowerPass ? rows_ - 1 : 0;
+        const int32_t end = lowerPass ? half - 1 : half;
+        const int32_t step = lowerPass ? -1 : 1;
+        for (int32_t row = first; row != end; row += step) {
+            const uint32_t added = histogram_[size_t(row)];
+            if (added != 0) {
+                count += added;
+                colour = shade(count, lowerPass);
+            }
+            PixelAt(column, row) = colour;
+        }
     }
 }
 
@@ -177,30 +183,18 @@ void WaveformRenderer::CountSamples(int64_t f0, int64_t f1)
     counter_.Finish(histogram_.data());
 }
 
-void WaveformRenderer::ShadeRow(int32_t column, int32_t row, int64_t count, const ColumnQuotients& total,
-                                ColumnState state, bool lowerPass)
+void WaveformRenderer::PrefetchFrames(int64_t f0, int64_t f1)
 {
-    uint8_t red;
-    uint8_t green;
-    uint8_t blue;
-    if (state.cursor && state.playmark) {
-        red = total.Fade(45, count);
-        green = total.Fade(245, count);
-        blue = total.Fade(255, count);
-    } else if (state.playmark) {
-        red = total.Fade(45, count);
-        green = lowerPass ? total.Fade(245, count) : total.Fade(255, count);
-        blue = total.Fade(45, count);
-    } else if (state.cursor) {
-        red = total.Fade(45, count);
-        green = total.Fade(45, count);
-        blue = total.Fade(255, count);
-    } else if (state.inRange) {
-        red = green = blue = total.Rise(255, count);
-    } else {
-        red = green = blue = total.Fade(245, count);
+    if (IsOutsideData(f0, f1))
+        return;
+    const int64_t from = f0 - scene_.channelFirstFrame;
+    const int64_t to = f1 - scene_.channelFirstFrame + 1;
+    auto next = std::upper_bound(spanStarts_.begin(), spanStarts_.end(), from);
+    size_t index = size_t(next - spanStarts_.begin()) - 1;
+    for (; index < spanStarts_.size() && spanStarts_[index] < to; ++index) {
+        const int64_t start = spanStarts_[index];
+        counter_.Prefetch(scene_.spans[index], std::max(from, start) - start, to - start);
     }
-    PixelAt(column, row) = qRgb(red, green, blue);
 }
 
 }  // namespace glimmet

@@ -11,8 +11,6 @@
 
 namespace glimmet {
 
-class ColumnQuotients;
-
 /// What one render of a channel's columns needs to know: the container's
 /// display range, range, cursor and play mark, and the channel's data.
 struct WaveformScene {
@@ -78,10 +76,15 @@ private:
     void FillColumn(int32_t column, ColumnState state);
     void RenderDataColumn(int32_t column, int64_t f0, int64_t f1, ColumnState state);
     void CountSamples(int64_t f0, int64_t f1);
+    void PrefetchFrames(int64_t f0, int64_t f1);
     bool Unchanged(std::vector<RenderedColumn>* memo, int32_t column, int64_t f0, int64_t f1, ColumnState state) const;
-    QRgb& PixelAt(int32_t column, int32_t row);
-    void ShadeRow(int32_t column, int32_t row, int64_t count, const ColumnQuotients& total, ColumnState state,
-                  bool lowerPass);
+    // One detach for the whole render instead of one per pixel.
+    QRgb& PixelAt(int32_t column, int32_t row)
+    {
+        return reinterpret_cast<QRgb*>(pixels_ + ptrdiff_t(row) * stride_)[column];
+    }
+    template <typename Shade>
+    void ShadeColumn(int32_t column, Shade&& shade);
 
     QImage& image_;
     const int16_t* rowTable_;
