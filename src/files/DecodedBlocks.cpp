@@ -1,6 +1,7 @@
 #include "files/DecodedBlocks.h"
 
 #include <algorithm>
+#include <vector>
 
 #include "files/FrameSpreader.h"
 #include "sound/BlockBuilder.h"
@@ -11,22 +12,45 @@ namespace glimmet {
 namespace {
 
 constexpr int64_t kBlockFrames = BlockBuilder::kBlockSamples;
+// Blocks are taken for each channel in runs of up to a huge page (32 blocks
+// of 64 KiB), all channels together at most this much ahead of the decode.
+constexpr int64_t kRunBytes = int64_t(8) << 20;
+constexpr int64_t kLongestRun = 32;
 
 }  // namespace
 
 DecodedBlocks::DecodedBlocks(int32_t channels)
-    : blocks_(size_t(std::max(0, channels))), lists_(size_t(std::max(0, channels)))
+    : blocks_(size_t(std::max(0, channels))), spares_(blocks_.size()), lists_(blocks_.size())
 {
 }
 
 DecodedBlocks::~DecodedBlocks() = default;
 
+// A channel's blocks come from the pool in runs, so that they lie side by
+// side: when the channel goes, the huge pages it filled come free whole and
+// go back to the system whole, to be had again as huge pages. Taken one
+// block at a time for all channels in turn, every huge page would hold both
+// channels and none would come free while either lives.
 bool DecodedBlocks::StartBlocks()
 {
-    for (std::shared_ptr<SampleBlock>& block : blocks_) {
-        block = SampleBlock::Allocate(kBlockFrames);
-        if (block == nullptr)
+    const int64_t run = std::clamp<int64_t>(
+        kRunBytes / (int64_t(blocks_.size()) * kBlockFrames * int64_t(sizeof(int16_t))), 1, kLongestRun);
+    for (size_t k = 0; k < blocks_.size(); ++k) {
+        std::vector<std::shared_ptr<SampleBlock>>& spare = spares_[k];
+        if (spare.empty()) {
+            for (int64_t i = 0; i < run; ++i) {
+                std::shared_ptr<SampleBlock> block = SampleBlock::Allocate(kBlockFrames);
+                if (block == nullptr)
+                    break;
+                spare.push_back(std::move(block));
+            }
+            // Taken from the back: the first allocated is used first.
+            std::reverse(spare.begin(), spare.end());
+        }
+        if (spare.empty())
             return false;
+        blocks_[k] = std::move(spare.back());
+        spare.pop_back();
     }
     return true;
 }
@@ -91,6 +115,7 @@ void DecodedBlocks::CloseBlocks()
                 lists_[k].Append(std::move(cut));
         }
         blocks_[k].reset();
+        spares_[k].clear();
     }
     filled_ = 0;
 }

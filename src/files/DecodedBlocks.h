@@ -12,9 +12,10 @@ class SampleBlock;
 
 /// The channels of a track as it decodes: interleaved frames are spread
 /// straight into one block per channel, and each full block joins its
-/// channel's list. Memory grows with what was decoded, a block at a time,
-/// whatever the file claims its length to be, and the samples are written
-/// once (no whole-channel array to cut into blocks afterwards).
+/// channel's list. Memory grows with what was decoded (blocks are taken at
+/// most 8 MiB ahead of it), whatever the file claims its length to be, and
+/// the samples are written once (no whole-channel array to cut into blocks
+/// afterwards).
 class DecodedBlocks {
 public:
     explicit DecodedBlocks(int32_t channels);
@@ -43,6 +44,8 @@ private:
     void CloseBlocks();
 
     std::vector<std::shared_ptr<SampleBlock>> blocks_;  // being filled, one per channel
+    // Per channel, blocks taken from the pool and not yet filled.
+    std::vector<std::vector<std::shared_ptr<SampleBlock>>> spares_;
     std::vector<BlockList> lists_;
     int64_t filled_ = 0;  // frames in blocks_
     int64_t frames_ = 0;

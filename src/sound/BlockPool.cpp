@@ -5,6 +5,9 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdint>
+#include <fstream>
+#include <sstream>
+#include <string>
 
 #ifndef MADV_POPULATE_WRITE
 #define MADV_POPULATE_WRITE 23
@@ -22,6 +25,39 @@ namespace {
 constexpr size_t kPage = 4096;
 // Slabs start on a huge-page boundary so that huge pages can back them.
 constexpr size_t kSlabAlign = size_t(2) << 20;
+constexpr size_t kHugePage = size_t(2) << 20;
+constexpr size_t kBlocksPerHugePage = kHugePage / BlockPool::kBlockBytes;
+// Huge pages are asked for only while this much more is free in huge runs,
+// so that the system keeps some for whoever else wants them.
+constexpr size_t kHugePagesSpare = size_t(256) << 20;
+
+/// Whether the system has at least bytes free in runs a huge page can take,
+/// so that asking for huge pages makes nobody wait for memory to be
+/// compacted (/proc/buddyinfo: free runs of 2^order pages per zone).
+bool HugePagesFree(size_t bytes)
+{
+    std::ifstream buddies("/proc/buddyinfo");
+    std::string line;
+    size_t free = 0;
+    while (std::getline(buddies, line)) {
+        std::istringstream fields(line);
+        std::string word;
+        // "Node 0, zone Normal c0 c1 ... c10"
+        for (int i = 0; i < 4 && fields >> word; ++i) {
+        }
+        size_t runs = 0;
+        for (int order = 0; fields >> runs; ++order) {
+            if (order >= 9)
+                free += runs * (size_t(4096) << order);
+        }
+    }
+    return free >= bytes;
+}
+
+uintptr_t HugePageOf(const void* block)
+{
+    return reinterpret_cast<uintptr_t>(block) & ~uintptr_t(kHugePage - 1);
+}
 
 /// Calls f(start, bytes) for each run of adjacent blocks, so that a system
 /// call covers as much as it can.
@@ -109,17 +145,56 @@ void BlockPool::Free(void* block)
         std::lock_guard guard(mutex_);
         warm_.push_back(block);
         inUse_--;
-        if (warm_.size() < limits_.warmReserve + batch)
+        // Looked at every sixteenth free past the reserve: a huge page of
+        // blocks takes 32 frees to come together.
+        if (warm_.size() < limits_.warmReserve + batch || (warm_.size() - limits_.warmReserve - batch) % 16 != 0)
             return;
-        // The blocks freed longest ago go back to the system; the newest
-        // stay warm for the next allocations.
-        const size_t count = warm_.size() - limits_.warmReserve;
-        surplus.assign(warm_.begin(), warm_.begin() + ptrdiff_t(count));
-        warm_.erase(warm_.begin(), warm_.begin() + ptrdiff_t(count));
+        surplus = TakeSurplus();
     }
+    if (surplus.empty())
+        return;
     Release(surplus);
     std::lock_guard guard(mutex_);
-    cold_.insert(cold_.end(), surplus.begin(), surplus.end());
+    ReturnCold(surplus);
+}
+
+std::vector<void*> BlockPool::TakeSurplus()
+{
+    const size_t batch = std::max<size_t>(1, limits_.slabBytes / kBlockBytes);
+    std::vector<void*> surplus;
+    // Whole huge pages among the warm blocks, found by sorting a copy.
+    std::vector<void*> sorted = warm_;
+    std::sort(sorted.begin(), sorted.end());
+    for (size_t first = 0; first + kBlocksPerHugePage <= sorted.size();) {
+        const size_t last = first + kBlocksPerHugePage - 1;
+        if (HugePageOf(sorted[first]) == reinterpret_cast<uintptr_t>(sorted[first])
+            && static_cast<char*>(sorted[first]) + (kHugePage - kBlockBytes) == static_cast<char*>(sorted[last])) {
+            surplus.insert(surplus.end(), sorted.begin() + ptrdiff_t(first), sorted.begin() + ptrdiff_t(last + 1));
+            first = last + 1;
+        } else {
+            ++first;
+        }
+    }
+    if (!surplus.empty()) {
+        const auto handedBack = [&](void* block) { return std::binary_search(surplus.begin(), surplus.end(), block); };
+        warm_.erase(std::remove_if(warm_.begin(), warm_.end(), handedBack), warm_.end());
+    }
+    // Blocks scattered over huge pages still partly in use stay warm up to
+    // a margin; beyond it the longest free go back one by one.
+    if (warm_.size() >= limits_.warmReserve + 2 * batch) {
+        const size_t count = warm_.size() - limits_.warmReserve;
+        surplus.insert(surplus.end(), warm_.begin(), warm_.begin() + ptrdiff_t(count));
+        warm_.erase(warm_.begin(), warm_.begin() + ptrdiff_t(count));
+    }
+    return surplus;
+}
+
+void BlockPool::ReturnCold(std::vector<void*>& blocks)
+{
+    std::sort(blocks.begin(), blocks.end());
+    const size_t middle = cold_.size();
+    cold_.insert(cold_.end(), blocks.begin(), blocks.end());
+    std::inplace_merge(cold_.begin(), cold_.begin() + ptrdiff_t(middle), cold_.end());
 }
 
 void BlockPool::ReleaseFree()
@@ -131,7 +206,7 @@ void BlockPool::ReleaseFree()
     }
     Release(blocks);
     std::lock_guard guard(mutex_);
-    cold_.insert(cold_.end(), blocks.begin(), blocks.end());
+    ReturnCold(blocks);
 }
 
 bool BlockPool::Refill()
@@ -148,7 +223,10 @@ bool BlockPool::Refill()
         return MapSlab();
     const bool populated = Populate(blocks);
     std::lock_guard guard(mutex_);
-    (populated ? warm_ : cold_).insert((populated ? warm_ : cold_).end(), blocks.begin(), blocks.end());
+    if (populated)
+        warm_.insert(warm_.end(), blocks.rbegin(), blocks.rend());  // lowest address handed out first
+    else
+        ReturnCold(blocks);
     return populated;
 }
 
@@ -160,7 +238,7 @@ bool BlockPool::MapSlab()
     char* slab = static_cast<char*>(MapAligned(bytes));
     if (slab == nullptr)
         return false;
-    if (limits_.hugePages)
+    if (limits_.hugePages && HugePagesFree(bytes + kHugePagesSpare))
         madvise(slab, bytes, MADV_HUGEPAGE);
     std::vector<void*> blocks;
     blocks.reserve(bytes / kBlockBytes);

@@ -38,10 +38,11 @@ public:
         size_t slabBytes = size_t(4) << 20;
         /// Warm free blocks kept beyond which freed blocks are handed back.
         size_t warmReserve = 64;
-        /// Ask for transparent huge pages on slabs. Off: opening an hour of
-        /// stereo was no faster with them (the kernel compacts memory to
-        /// find them), and handing back a single block splits a huge page.
-        bool hugePages = false;
+        /// Ask for transparent huge pages on slabs while the system has free
+        /// ones (never making it compact memory to find them). On a virtual
+        /// machine each small page costs a fault when first written, even
+        /// when populated beforehand; one huge page replaces 512 of them.
+        bool hugePages = true;
     };
 
     BlockPool();
@@ -71,6 +72,13 @@ public:
     size_t SlabsMapped();
 
 private:
+    /// Picks the warm blocks to hand back once too many are free: whole
+    /// huge pages first (handing back part of one splits it for good), and
+    /// beyond a margin the longest free. Called with mutex_ held.
+    std::vector<void*> TakeSurplus();
+    /// Adds blocks just handed back to cold_, keeping it sorted. Called with
+    /// mutex_ held.
+    void ReturnCold(std::vector<void*>& blocks);
     /// Fills warm_ from cold_ or a new slab; false when no memory.
     bool Refill();
     bool MapSlab();
@@ -83,7 +91,7 @@ private:
     std::mutex mutex_;
     // Guarded by mutex_.
     std::vector<void*> warm_;
-    std::vector<void*> cold_;
+    std::vector<void*> cold_;  // sorted by address, so refills take whole huge pages
     std::vector<void*> slabs_;
     size_t inUse_ = 0;
 };

@@ -72,6 +72,32 @@ TEST(BlockPool, HandsOutWholeWritableBlocksThatDoNotOverlap)
     EXPECT_EQ(pool.BlocksInUse(), 0u);
 }
 
+// Handing back part of a huge page splits it for good, so blocks freed
+// scattered over pages still in use stay warm (up to a margin), while a
+// huge page whose blocks are all free goes back whole.
+TEST(BlockPool, HandsBackWholeHugePagesAndKeepsScatteredBlocksWarm)
+{
+    BlockPool::Limits limits;
+    limits.warmReserve = 0;
+    BlockPool pool(limits);
+    const size_t perSlab = limits.slabBytes / BlockPool::kBlockBytes;
+    std::vector<void*> blocks;
+    for (size_t i = 0; i < 2 * perSlab; ++i)
+        blocks.push_back(pool.Allocate());
+    std::sort(blocks.begin(), blocks.end());
+    // Every other block, as two channels taken in turn would free them.
+    for (size_t i = 0; i < blocks.size(); i += 2)
+        pool.Free(blocks[i]);
+    EXPECT_EQ(pool.ColdBlocks(), 0u);
+    EXPECT_EQ(pool.WarmBlocks(), perSlab);
+    for (size_t i = 1; i < blocks.size(); i += 2)
+        pool.Free(blocks[i]);
+    const size_t perHugePage = (size_t(2) << 20) / BlockPool::kBlockBytes;
+    EXPECT_GE(pool.ColdBlocks(), blocks.size() - perSlab);
+    EXPECT_EQ(pool.ColdBlocks() % perHugePage, 0u);
+    EXPECT_EQ(pool.ColdBlocks() + pool.WarmBlocks(), blocks.size());
+}
+
 TEST(BlockPool, ReusesAFreedBlockWithoutMappingMore)
 {
     BlockPool pool;
