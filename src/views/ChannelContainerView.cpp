@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include <QLayout>
 #include <QPainter>
 #include <QWheelEvent>
 
@@ -370,8 +371,29 @@ void ChannelContainerView::LayOutAfterChanges()
         sliderCheckPending_ = false;
         CheckZoomSlider(true);
     }
-    LayoutChildren();
+    const int64_t passes = layoutPasses_;
+    GrowWithWindow();
+    if (layoutPasses_ == passes)
+        LayoutChildren();
     update();
+}
+
+// Views added make the container taller than the window's layout has made
+// it yet; that layout would resize it only from an event still queued.
+// Placing the views in the old height first would give each of them a
+// height it loses again at once, and so a picture of every view, the old
+// ones too, drawn twice per batch. The layouts from here up to the window
+// are brought up to date first; a resize on the way places the views.
+void ChannelContainerView::GrowWithWindow()
+{
+    if (height() >= minimumSizeHint().height())
+        return;
+    for (QWidget* ancestor = parentWidget(); ancestor != nullptr; ancestor = ancestor->parentWidget()) {
+        if (ancestor->layout() != nullptr)
+            ancestor->layout()->activate();
+        if (ancestor->isWindow())
+            break;
+    }
 }
 
 void ChannelContainerView::UpdateAll()
@@ -454,6 +476,7 @@ void ChannelContainerView::FollowFrameCount(int64_t count)
 
 void ChannelContainerView::LayoutChildren()
 {
+    layoutPasses_++;
     const int64_t frames = MaxFrameCount();
     Display().WidenToOneFramePerColumn(frames);
     UpdateZoomSlider(frames);

@@ -175,6 +175,7 @@ private:
     int64_t FrameCountWith(Channel* added);
     /// The batch's layout pass: places every view once.
     void LayOutAfterChanges();
+    void GrowWithWindow();
     void UpdateSizeLimits();
     void AddChannelAt(Channel* channel, int32_t index);
     void RemoveSampleViewAt(int32_t index);
@@ -198,6 +199,7 @@ private:
     bool burstCountKnown_ = false;
     // Channels were added since the slider was last told of the count.
     bool sliderCheckPending_ = false;
+    int64_t layoutPasses_ = 0;  // LayoutChildren runs, to see one in a call
 };
 
 }  // namespace glimmet

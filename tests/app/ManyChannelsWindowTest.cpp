@@ -61,5 +61,51 @@ TEST(ManyChannelsWindow, AppendingFilesOfManyChannelsDrawsEachViewAFewTimes)
     }
 }
 
+int64_t ColumnsRenderedBy(ChannelContainerView& container, int32_t first, int32_t end)
+{
+    int64_t columns = 0;
+    for (int32_t i = first; i < end; ++i)
+        columns += container.SampleViewAtIndex(i)->RenderedColumns();
+    return columns;
+}
+
+// A file appended to a document of the same length changes nothing the
+// views already there show: drawing its channels costs pictures of the new
+// views only, so a document of n channels is opened in time linear in n.
+// Each append makes the window taller; a view laid out before the window
+// has grown would get a height it loses again at once.
+TEST(ManyChannelsWindow, AppendingAFileDrawsOnlyTheViewsOfItsChannels)
+{
+    AppFixture fixture;
+    const std::filesystem::path file = fixture.Dir() / "many.wav";
+    constexpr int kFileChannels = 32;
+    WriteWav(file, Channels(kFileChannels, 2000));
+    QuillexWindow* window = OpenWindow(fixture);
+    window->SetAppendOnLoad(true);
+    for (int i = 0; i < 2; ++i) {
+        window->OpenFile(file);
+        Drain();
+    }
+    ChannelContainerView& container = *window->ContainerView();
+    ASSERT_EQ(container.CountChannelViews(), 2 * kFileChannels);
+    const int64_t width = container.SampleViewAtIndex(0)->Bitmap().width();
+    ASSERT_GT(width, 100);
+    const int32_t heightBefore = container.SampleViewAtIndex(0)->height();
+    const int64_t oldBefore = ColumnsRenderedBy(container, 0, 2 * kFileChannels);
+
+    window->OpenFile(file);
+    Drain();
+
+    ASSERT_EQ(container.CountChannelViews(), 3 * kFileChannels);
+    // The window grew with the document: the views kept their height.
+    EXPECT_EQ(container.SampleViewAtIndex(0)->height(), heightBefore);
+    EXPECT_EQ(ColumnsRenderedBy(container, 0, 2 * kFileChannels) - oldBefore, 0);
+    // A new view is drawn about once: its first, tiny picture, then its
+    // picture in place.
+    const int64_t added = ColumnsRenderedBy(container, 2 * kFileChannels, 3 * kFileChannels);
+    EXPECT_LE(added, kFileChannels * (width + 20));
+    EXPECT_GE(added, kFileChannels * width);
+}
+
 }  // namespace
 }  // namespace glimmet::test
