@@ -2,7 +2,6 @@
 
 #include <algorithm>
 
-#include <QLayout>
 #include <QPainter>
 #include <QWheelEvent>
 
@@ -12,6 +11,7 @@
 #include "sound/DocumentWindow.h"
 #include "support/MessageCodes.h"
 #include "support/MessageFields.h"
+#include "views/AncestorLayouts.h"
 #include "views/ContainerFrames.h"
 #include "views/SampleView.h"
 #include "views/ViewColors.h"
@@ -371,29 +371,17 @@ void ChannelContainerView::LayOutAfterChanges()
         sliderCheckPending_ = false;
         CheckZoomSlider(true);
     }
+    // Views added make the container taller than the window's layout has
+    // made it yet; that layout would resize it only from an event still
+    // queued. Placed in the old height first, every view, the old ones too,
+    // would get a height it loses again at once, and so two pictures per
+    // batch. A resize on the way up to date places the views itself.
     const int64_t passes = layoutPasses_;
-    GrowWithWindow();
+    if (height() < minimumSizeHint().height())
+        AncestorLayouts::Activate(this);
     if (layoutPasses_ == passes)
         LayoutChildren();
     update();
-}
-
-// Views added make the container taller than the window's layout has made
-// it yet; that layout would resize it only from an event still queued.
-// Placing the views in the old height first would give each of them a
-// height it loses again at once, and so a picture of every view, the old
-// ones too, drawn twice per batch. The layouts from here up to the window
-// are brought up to date first; a resize on the way places the views.
-void ChannelContainerView::GrowWithWindow()
-{
-    if (height() >= minimumSizeHint().height())
-        return;
-    for (QWidget* ancestor = parentWidget(); ancestor != nullptr; ancestor = ancestor->parentWidget()) {
-        if (ancestor->layout() != nullptr)
-            ancestor->layout()->activate();
-        if (ancestor->isWindow())
-            break;
-    }
 }
 
 void ChannelContainerView::UpdateAll()
@@ -411,25 +399,6 @@ void ChannelContainerView::MessageReceived(const Message& message)
         return;
     }
     contextMenu_.Apply(message.what);
-}
-
-SampleView* ChannelContainerView::DragTargetAt(QPointF point) const
-{
-    if (SampleView* view = SampleViewAt(point))
-        return view;
-    if (sampleViews_.empty())
-        return nullptr;
-    const float y = float(point.y());
-    if (y < 0)
-        return sampleViews_.front();
-    if (y > Bounds().bottom - zoomSliderHeight_)
-        return sampleViews_.back();
-    for (SampleView* view : sampleViews_) {
-        const ViewRect frame = view->Frame();
-        if (frame.top - 1 <= y && y <= frame.bottom + 1)
-            return view;
-    }
-    return nullptr;
 }
 
 // Layout

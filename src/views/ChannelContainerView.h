@@ -104,10 +104,8 @@ public:
     void RangeChanged();
     /// Re-renders the columns left .. right of view; null is ignored.
     void RedrawColumns(SampleView* view, float left, float right);
-    /// The channel a range drag at point (container coordinates) reaches:
-    /// above the first view the first, below the last (into the zoom
-    /// slider) the last, in the gap around a view that view; else null.
-    SampleView* DragTargetAt(QPointF point) const;
+    /// The height the last layout gave the zoom slider.
+    float ZoomSliderHeight() const { return zoomSliderHeight_; }
 
     /// Redraws every channel view.
     void UpdateAll();
@@ -175,7 +173,6 @@ private:
     int64_t FrameCountWith(Channel* added);
     /// The batch's layout pass: places every view once.
     void LayOutAfterChanges();
-    void GrowWithWindow();
     void UpdateSizeLimits();
     void AddChannelAt(Channel* channel, int32_t index);
     void RemoveSampleViewAt(int32_t index);

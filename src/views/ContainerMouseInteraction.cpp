@@ -95,7 +95,7 @@ void ContainerMouseInteraction::DoubleClicked(SampleView* view, QPointF point, Q
 void ContainerMouseInteraction::MouseMoved(QPointF point)
 {
     if (IsDragging()) {
-        SampleView* target = container_.DragTargetAt(point);
+        SampleView* target = DragTargetAt(point);
         // Clicks are mapped in sample view coordinates, drags in container
         // coordinates plus one.
         if (target != nullptr)
@@ -103,6 +103,30 @@ void ContainerMouseInteraction::MouseMoved(QPointF point)
     } else if (IsMoving()) {
         Moving(float(point.x()));
     }
+}
+
+// The channel a range drag reaches: above the first view the first, below
+// the last (into the zoom slider) the last, in the gap around a view that
+// view; else none.
+SampleView* ContainerMouseInteraction::DragTargetAt(QPointF point) const
+{
+    if (SampleView* view = container_.SampleViewAt(point))
+        return view;
+    const int32_t count = container_.CountChannelViews();
+    if (count == 0)
+        return nullptr;
+    const float y = float(point.y());
+    if (y < 0)
+        return container_.SampleViewAtIndex(0);
+    if (y > container_.Bounds().bottom - container_.ZoomSliderHeight())
+        return container_.SampleViewAtIndex(count - 1);
+    for (int32_t i = 0; i < count; ++i) {
+        SampleView* view = container_.SampleViewAtIndex(i);
+        const ViewRect frame = view->Frame();
+        if (frame.top - 1 <= y && y <= frame.bottom + 1)
+            return view;
+    }
+    return nullptr;
 }
 
 void ContainerMouseInteraction::MouseUp()

@@ -47,6 +47,7 @@ public:
     void AllowMoveRedraw() { moveRedrawPermission_ = true; }
 
 private:
+    SampleView* DragTargetAt(QPointF point) const;
     void ExtendRange(SampleView* view, float x);
     void RedrawDragEdge(SampleView* view, bool endSide, int64_t oldStart, int64_t oldEnd);
 
