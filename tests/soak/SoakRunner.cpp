@@ -15,8 +15,11 @@ namespace glimmet::test {
 std::vector<SoakStep> GenerateSoakSteps(uint64_t seed, size_t count, const SoakOptions& options)
 {
     std::mt19937_64 random(seed);
-    // Weights out of 100: mostly edits and undo runs, some channel work.
-    static const int kWeights[SoakStep::OpCount] = {28, 6, 4, 10, 4, 6, 3, 3, 3, 6, 2, 3, 3, 3, 8, 7, 1};
+    // Weights out of 100: mostly edits and undo runs, some channel work, a
+    // save now and then (each one mixes and writes the whole document).
+    static const int kWeights[SoakStep::OpCount] = {19, 6, 4, 10, 4, 5, 3, 3, 3, 5, 2, 2, 2, 3, 8, 7, 1, 7, 2, 2, 1,
+        1};
+    static_assert(SoakStep::OpCount == 22);
     std::vector<SoakStep> steps(count);
     for (SoakStep& step : steps) {
         int pick = int(random() % 100);
@@ -26,7 +29,8 @@ std::vector<SoakStep> GenerateSoakSteps(uint64_t seed, size_t count, const SoakO
         step.op = SoakStep::Op(op);
         for (uint64_t& r : step.r)
             r = random();
-        const bool ranged = step.op == SoakStep::Transform || step.op == SoakStep::Truncate;
+        const bool ranged
+            = step.op == SoakStep::Transform || step.op == SoakStep::Truncate || step.op == SoakStep::CurveEffect;
         step.huge = ranged && int(random() % 1000) < options.hugePerMille;
     }
     return steps;
