@@ -28,10 +28,11 @@ void SoakActions::Go(SoakModel& model, SoakRecord& r)
 }
 
 void SoakActions::Pass(SoakModel& model, const SoakRecord& r, int64_t history,
-    const std::function<void(std::vector<int16_t>&)>& change, bool write)
+    const std::function<void(std::vector<int16_t>&)>& change, bool write, std::vector<int16_t>* kept)
 {
     const int64_t n = r.end - r.start + 1;
-    std::vector<int16_t> buffer(size_t(n + history), 0);
+    std::vector<int16_t> own(size_t(n + history), 0);
+    std::vector<int16_t>& buffer = kept != nullptr ? *kept : own;
     for (SoakChannel& c : model.channels) {
         if (!c.state.selected)
             continue;
@@ -79,20 +80,23 @@ void SoakActions::Maximize(SoakModel& model, const SoakRecord& r)
     if (r.end - r.start + 1 < 1 || r.start < 0)
         return;
     using Ref = TransformReference;
+    // Both passes share one working buffer: a channel that cannot be read
+    // in the second pass gets what the last one of the first left.
+    std::vector<int16_t> buffer(size_t(r.end - r.start + 1), 0);
     int peak = 0;
     Pass(model, r, 0, [&peak](auto& b) {
         for (int16_t v : b) {
             if (std::abs(int(v)) > std::abs(peak))
                 peak = v;
         }
-    }, false);
+    }, false, &buffer);
     if (std::abs(peak) > 32766)
         return;
     const float factor = peak == 0 ? std::numeric_limits<float>::infinity() : std::fabs(32767.0f / float(peak));
     Pass(model, r, 0, [factor](auto& b) {
         for (int16_t& v : b)
             v = Ref::Low16(double(factor) * v);
-    }, true);
+    }, true, &buffer);
 }
 
 void SoakActions::Filter(SoakModel& model, const SoakRecord& r)

@@ -28,9 +28,10 @@ private:
     /// writes the range back when write is set. A channel whose part cannot
     /// be read (it starts exactly at the channel's end) gets what the last
     /// one left in the buffer: transformed in place without history, as
-    /// read with it.
+    /// read with it. kept, when given, is the working buffer, shared with
+    /// another pass.
     static void Pass(SoakModel& model, const SoakRecord& r, int64_t history,
-        const std::function<void(std::vector<int16_t>&)>& change, bool write);
+        const std::function<void(std::vector<int16_t>&)>& change, bool write, std::vector<int16_t>* kept = nullptr);
 };
 
 }  // namespace glimmet::test

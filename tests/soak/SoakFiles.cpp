@@ -33,7 +33,13 @@ struct Side {
         if (count == 0)
             return 0;
         const float value = count == 1 ? sum : SoakFiles::SoftClip(sum);
-        return int16_t(std::lrintf(value * 32767.0f));
+        // Rounded to nearest; what leaves the 16-bit range (the curve falls
+        // below -1 for sums far past it) or is not a number stores -32768,
+        // as a 16-bit integer store of the FPU does.
+        const double rounded = std::nearbyint(double(value * 32767.0f));
+        if (!(rounded >= -32768.0 && rounded <= 32767.0))
+            return -32768;
+        return int16_t(rounded);
     }
 };
 
@@ -64,20 +70,33 @@ std::vector<std::vector<int16_t>> SoakFiles::SaveMix(const std::vector<SoakChann
     for (const SoakChannel& c : channels)
         total = std::max(total, ModelChannel::End(c.state));
     std::vector<std::vector<int16_t>> mix(2, std::vector<int16_t>(size_t(total), 0));
-    for (int64_t t = 0; t < total; t++) {
-        Side left;
-        Side right;
-        for (const SoakChannel& c : channels) {
-            if (c.state.muted)
-                continue;
-            const float value = float(ModelChannel::At(c.state, t - c.state.first)) * 3.0517578125e-05f;
-            if (c.state.pan != Channel::kPanRight)
-                left.Add(value);
-            if (c.state.pan != Channel::kPanLeft)
-                right.Add(value);
+    // The save asks for the mix a buffer at a time, and the mixer reads
+    // every channel's part of it as one request, with the quirks of such a
+    // read: a part that cannot be read (it starts exactly at the channel's
+    // end) is silence, and so is one that ends exactly at its first frame.
+    std::vector<std::vector<int16_t>> parts(channels.size());
+    for (int64_t t0 = 0; t0 < total; t0 += kFramesPerBuffer) {
+        const int64_t n = std::min(kFramesPerBuffer, total - t0);
+        for (size_t k = 0; k < channels.size(); k++) {
+            if (!ModelChannel::Fill(channels[k].state, parts[k], t0, n))
+                parts[k].assign(size_t(n), 0);
         }
-        mix[0][size_t(t)] = left.Sample();
-        mix[1][size_t(t)] = right.Sample();
+        for (int64_t i = 0; i < n; i++) {
+            Side left;
+            Side right;
+            for (size_t k = 0; k < channels.size(); k++) {
+                const ChannelState& c = channels[k].state;
+                if (c.muted)
+                    continue;
+                const float value = float(parts[k][size_t(i)]) * 3.0517578125e-05f;
+                if (c.pan != Channel::kPanRight)
+                    left.Add(value);
+                if (c.pan != Channel::kPanLeft)
+                    right.Add(value);
+            }
+            mix[0][size_t(t0 + i)] = left.Sample();
+            mix[1][size_t(t0 + i)] = right.Sample();
+        }
     }
     return mix;
 }

@@ -14,6 +14,8 @@ namespace glimmet::test {
 /// rules of the save mix independently of the mixer.
 class SoakFiles {
 public:
+    /// Frames the save mixes at a time.
+    static constexpr int64_t kFramesPerBuffer = 1024;
     /// The stereo 16-bit mix of channels from frame 0 to the end of the
     /// longest: left samples, then right samples.
     static std::vector<std::vector<int16_t>> SaveMix(const std::vector<SoakChannel>& channels);

@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <random>
 #include <sstream>
+#include <string>
 
 #include "SoakModel.h"
 #include "SoakSession.h"
@@ -55,7 +56,8 @@ SoakResult RunSoakSteps(uint64_t seed, const std::vector<SoakStep>& steps)
         } catch (const std::exception& error) {
             // The model's vectors or the document ran out of memory: a
             // failure of this step like any other, so that it shrinks.
-            result.log.push_back(std::string("step threw ") + error.what());
+            result.log.push_back("step (operation " + std::to_string(int(steps[i].op)) + (steps[i].huge ? ", huge" : "")
+                + ") threw " + error.what());
             result.failedAt = long(i);
             result.difference = result.log.back();
             return result;
