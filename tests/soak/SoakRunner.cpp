@@ -40,9 +40,11 @@ std::vector<SoakStep> GenerateSoakSteps(uint64_t seed, size_t count, const SoakO
 SoakResult RunSoakSteps(uint64_t seed, const std::vector<SoakStep>& steps)
 {
     SoakResult result;
-    // The edits' complaints ("what the....?") are expected here by the
-    // thousand; kept off the terminal so a failure's report stands out.
+    // The edits' complaints ("what the....?") and the stretch's reports on
+    // the error channel are expected here by the thousand; kept off the
+    // terminal so a failure's report stands out.
     DiagnosticsCapture quiet;
+    DiagnosticsCapture quietErrors(Diagnostics::Channel::Error);
     SoakSession session(seed);
     std::string difference = session.Difference();
     if (!difference.empty()) {
