@@ -4,8 +4,8 @@
 #include <cmath>
 #include <limits>
 
+#include "SoakActions.h"
 #include "edit/ModelChannel.h"
-#include "edit/TransformReference.h"
 #include "sound/Channel.h"
 #include "support/FrameArithmetic.h"
 
@@ -27,16 +27,26 @@ const char* SoakKindName(Kind kind)
     case Kind::Move: return "Move Sample";
     case Kind::AddChannel: return "Add Channel";
     case Kind::RemoveChannel: return "Remove Channel";
+    case Kind::Filter: return "FIR Filter";
+    case Kind::Distort: return "Distortion";
+    case Kind::PeakDistort: return "Peak Distort";
+    case Kind::Envelope: return "Envelope";
+    case Kind::Stretch: return "Time Stretch";
     }
     return "";
 }
 
 namespace {
 
+/// The actions that rewrite the range in place, whose range starting
+/// before frame 0 is never written back.
 bool IsTransform(Kind kind)
 {
-    return kind == Kind::FadeIn || kind == Kind::FadeOut || kind == Kind::Maximize || kind == Kind::Revert
-        || kind == Kind::RevertPhases;
+    switch (kind) {
+    case Kind::FadeIn: case Kind::FadeOut: case Kind::Maximize: case Kind::Revert: case Kind::RevertPhases:
+    case Kind::Filter: case Kind::Distort: case Kind::PeakDistort: case Kind::Envelope: return true;
+    default: return false;
+    }
 }
 
 }  // namespace
@@ -157,6 +167,18 @@ void SoakModel::Perform(Kind kind, int64_t cursor, int32_t focused)
     redo.clear();
 }
 
+void SoakModel::PerformWith(SoakRecord record, int64_t cursor, int32_t focused)
+{
+    SoakRecord r = Bind(record.kind, cursor, focused);
+    r.curve = record.curve;
+    r.taps = record.taps;
+    r.dialog = record.dialog;
+    r.stretch = record.stretch;
+    Go(r);
+    undo.push_back(std::move(r));
+    redo.clear();
+}
+
 void SoakModel::RecordMove(uint64_t id, int64_t before, int64_t after)
 {
     SoakRecord r;
@@ -187,6 +209,10 @@ bool SoakModel::Undo()
 {
     if (undo.empty())
         return false;
+    if (undo.back().kind == Kind::Stretch) {
+        undo.pop_back();
+        return false;
+    }
     UndoRecord(undo.back());
     redo.push_back(std::move(undo.back()));
     undo.pop_back();
@@ -227,15 +253,7 @@ bool SoakModel::Copy()
 
 void SoakModel::Go(SoakRecord& r)
 {
-    switch (r.kind) {
-    case Kind::Remove: return GoRemove(r);
-    case Kind::Paste: return GoPaste(r);
-    case Kind::Truncate: return GoTruncate(r);
-    case Kind::RemoveChannel: return GoRemoveChannel(r);
-    case Kind::Move:
-    case Kind::AddChannel: return;
-    default: return GoTransform(r);
-    }
+    SoakActions::Go(*this, r);
 }
 
 void SoakModel::Shift(uint64_t id, int64_t frames, bool back)
@@ -367,130 +385,6 @@ void SoakModel::RestoreRange(const SoakRecord& r)
 {
     SetRangeStart(r.start);
     SetRangeEnd(r.end);
-}
-
-void SoakModel::GoTransform(const SoakRecord& r)
-{
-    const int64_t n = r.end - r.start + 1;
-    // Nothing can be written back before frame 0, so such a range changes
-    // nothing whatever the transform computes.
-    if (n < 1 || r.start < 0)
-        return;
-    // One working buffer for all channels: a channel that cannot be read
-    // (the range starts exactly at its end) gets what the last one left.
-    std::vector<int16_t> buffer(size_t(n), 0);
-    auto pass = [&](const std::function<void(std::vector<int16_t>&)>& change, bool write) {
-        for (SoakChannel& c : channels) {
-            if (!c.state.selected)
-                continue;
-            std::vector<int16_t> filled;
-            if (ModelChannel::Fill(c.state, filled, r.start, n))
-                buffer = filled;
-            change(buffer);
-            if (write)
-                Replace(c, buffer, r.start, r.end);
-        }
-    };
-    using Ref = TransformReference;
-    switch (r.kind) {
-    case Kind::FadeIn: pass([](auto& b) { b = Ref::FadeIn(b); }, true); break;
-    case Kind::FadeOut: pass([](auto& b) { b = Ref::FadeOut(b); }, true); break;
-    case Kind::Revert: pass([](auto& b) { b = Ref::Revert(b); }, true); break;
-    case Kind::RevertPhases: pass([](auto& b) { b = Ref::RevertPhases(b); }, true); break;
-    default: {
-        int peak = 0;
-        pass([&peak](auto& b) {
-            for (int16_t v : b) {
-                if (std::abs(int(v)) > std::abs(peak))
-                    peak = v;
-            }
-        }, false);
-        if (std::abs(peak) > 32766)
-            break;
-        const float factor = peak == 0 ? std::numeric_limits<float>::infinity() : std::fabs(32767.0f / float(peak));
-        pass([factor](auto& b) {
-            for (int16_t& v : b)
-                v = Ref::Low16(double(factor) * v);
-        }, true);
-    }
-    }
-}
-
-void SoakModel::GoRemove(const SoakRecord& r)
-{
-    bool cut = false;
-    for (SoakChannel& c : channels) {
-        if (!c.state.selected)
-            continue;
-        Remove(c, r.start, r.end);
-        c.state.selected = false;
-        cut = true;
-    }
-    if (cut) {
-        SetRangeStart(-1);
-        SetRangeEnd(-1);
-    }
-}
-
-void SoakModel::GoPaste(SoakRecord& r)
-{
-    r.firstChannel = -1;
-    for (size_t i = 0; i < channels.size(); i++) {
-        if (channels[i].state.selected) {
-            r.firstChannel = int32_t(i);
-            break;
-        }
-    }
-    r.hadBuffer = !copyBuffer.empty();
-    if (!r.hadBuffer)
-        return;
-    r.pasted = 0;
-    const int64_t frames = int64_t(copyBuffer[0].size());
-    const bool replace = r.firstChannel >= 0 && r.start >= 0 && r.start <= r.end;
-    // Inserting goes into the channel focused now, which for a redo may not
-    // be the one focused when the paste was first made; with none focused
-    // it starts at the first channel.
-    if (!replace)
-        r.firstChannel = std::max(focus, 0);
-    for (size_t i = 0; i < copyBuffer.size(); i++) {
-        const size_t target = size_t(r.firstChannel) + i;
-        if (target >= channels.size())
-            break;
-        if (replace) {
-            Replace(channels[target], copyBuffer[i], r.start, r.end);
-        } else {
-            Insert(channels[target], copyBuffer[i], r.cursor);
-            channels[target].state.selected = true;
-        }
-        r.pasted++;
-    }
-    r.pasteStart = replace ? r.start : r.cursor;
-    r.pasteEnd = r.cursor + frames - 1;
-    if (!replace)
-        SetRangeStart(r.pasteStart);
-    SetRangeEnd(r.pasteEnd);
-}
-
-void SoakModel::GoTruncate(const SoakRecord& r)
-{
-    for (SoakChannel& c : channels) {
-        if (!c.state.selected)
-            continue;
-        Remove(c, r.end + 1, ModelChannel::End(c.state) - 1);
-        Remove(c, 0, r.start - 1);
-        c.state.selected = false;
-    }
-}
-
-void SoakModel::GoRemoveChannel(SoakRecord& r)
-{
-    r.removedOne = false;
-    if (r.focused < 0 || size_t(r.focused) >= channels.size())
-        return;
-    r.index = r.focused;
-    r.held = channels[size_t(r.index)];
-    channels.erase(channels.begin() + r.index);
-    r.removedOne = true;
 }
 
 }  // namespace glimmet::test

@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "SoakEffects.h"
 #include "edit/TestDocument.h"
 
 namespace glimmet::test {
@@ -24,7 +25,7 @@ struct SoakChannel {
 struct SoakRecord {
     enum class Kind {
         FadeIn, FadeOut, Maximize, Revert, RevertPhases, Remove, Paste, Truncate,
-        Move, AddChannel, RemoveChannel
+        Move, AddChannel, RemoveChannel, Filter, Distort, PeakDistort, Envelope, Stretch
     };
     Kind kind = Kind::FadeIn;
     int64_t start = 0;
@@ -57,6 +58,14 @@ struct SoakRecord {
     bool removedOne = false;
     int32_t index = 0;
     SoakChannel held;
+    // The curve effects: the curve the dialog gives now (Distort, Peak
+    // Distort and Envelope read it again at every redo), the filter's tap
+    // count, and the session's fake dialog while the action keeps it.
+    SoakCurve curve;
+    int32_t taps = 0;
+    void* dialog = nullptr;
+    // Time Stretch: the factor typed.
+    float stretch = 0.0f;
 };
 
 const char* SoakKindName(SoakRecord::Kind kind);
@@ -88,6 +97,10 @@ public:
     void RecordMove(uint64_t id, int64_t before, int64_t after);
     /// Adds a fresh channel the way the engine numbers its channels.
     void RecordAddChannel(uint64_t id, int32_t focused);
+    /// Binds and runs a curve effect or a stretch with its parameters.
+    void PerformWith(SoakRecord record, int64_t cursor, int32_t focused);
+    /// False also for a time stretch, which cannot be undone: it leaves the
+    /// history, its change staying.
     bool Undo();
     bool Redo();
     /// "Copy": false, keeping the old buffer, with nothing selected or no
@@ -108,11 +121,6 @@ private:
     void UndoPaste(const SoakRecord& r);
     void Walk(const std::vector<int32_t>& indexes, const std::function<void(SoakChannel&, size_t)>& visit);
     void RestoreRange(const SoakRecord& r);
-    void GoTransform(const SoakRecord& r);
-    void GoRemove(const SoakRecord& r);
-    void GoPaste(SoakRecord& r);
-    void GoTruncate(const SoakRecord& r);
-    void GoRemoveChannel(SoakRecord& r);
     void Shift(uint64_t id, int64_t frames, bool back);
 };
 

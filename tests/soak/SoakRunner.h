@@ -14,11 +14,13 @@ namespace glimmet::test {
 struct SoakStep {
     enum Op : uint8_t {
         Transform, Remove, Cut, Paste, Truncate, Copy, ForeignCopy, AddChannel, RemoveChannel, Move,
-        HugeMove, Mute, Pan, Select, UndoRun, RedoRun, DeleteHistory, OpCount
+        HugeMove, Mute, Pan, Select, UndoRun, RedoRun, DeleteHistory, CurveEffect, Stretch, Redraw, Save,
+        FailedSave, OpCount
     };
     Op op = Transform;
     /// The range is one of the absurd ones a user can type (-2^31,
-    /// -1000000000, 2^31 - 1); only for transforms and Truncate.
+    /// -1000000000, 2^31 - 1); only for transforms, curve effects and
+    /// Truncate.
     bool huge = false;
     uint64_t r[4] = {0, 0, 0, 0};
 };

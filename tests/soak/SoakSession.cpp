@@ -3,6 +3,9 @@
 #include <algorithm>
 #include <sstream>
 
+#include "SoakDialogs.h"
+#include "SoakFiles.h"
+
 #include "edit/AddChannelAction.h"
 #include "edit/FadeInAction.h"
 #include "edit/FadeOutAction.h"
@@ -43,7 +46,7 @@ std::unique_ptr<Action> MakeAction(Kind kind, const CopyBuffer* copyBuffer)
     case Kind::Truncate: return std::make_unique<TruncateAction>(nullptr);
     case Kind::AddChannel: return std::make_unique<AddChannelAction>(nullptr);
     case Kind::RemoveChannel: return std::make_unique<RemoveChannelAction>(nullptr);
-    case Kind::Move: break;
+    default: break;
     }
     return nullptr;
 }
@@ -77,6 +80,13 @@ std::string Mismatch(size_t index, const ChannelState& seen, const ChannelState&
         out << "flags " << seen << "; expected " << expected;
     }
     return out.str();
+}
+
+/// The actions made with a dialog, whose parameters the record carries.
+bool HasDialog(Kind kind)
+{
+    return kind == Kind::Filter || kind == Kind::Distort || kind == Kind::PeakDistort || kind == Kind::Envelope
+        || kind == Kind::Stretch;
 }
 
 std::string NameOr(const char* name)
@@ -195,17 +205,30 @@ void SoakSession::ChooseRange(const SoakStep& step, bool shorten)
 
 std::string SoakSession::Act(Kind kind, const SoakStep& step)
 {
+    SoakRecord record;
+    record.kind = kind;
+    return Act(record, step);
+}
+
+std::string SoakSession::Act(SoakRecord record, const SoakStep& step)
+{
+    const Kind kind = record.kind;
     const int64_t cursor = step.r[0] % 4 == 0 ? model_.rangeStart : Frame(step.r[3] >> 3);
     const int32_t focus = int32_t((step.r[3] >> 50) % (model_.channels.size() + 1)) - 1;
     document_.position.SetCursorFrame(cursor);
     document_.position.SetFocusIndex(focus);
     model_.focus = focus;
-    std::unique_ptr<Action> action = MakeAction(kind, &copyBuffer_);
+    std::unique_ptr<Action> action = HasDialog(kind) ? SoakDialogs::Make(record) : MakeAction(kind, &copyBuffer_);
     std::ostringstream out;
     out << SoakKindName(kind) << " over " << model_.rangeStart << ".." << model_.rangeEnd << ", cursor " << cursor
         << ", focus " << focus << ", selected";
     for (const SoakChannel& c : model_.channels)
         out << ' ' << (c.state.selected ? 1 : 0);
+    if (kind == Kind::Stretch)
+        out << ", factor " << record.stretch;
+    else if (HasDialog(kind))
+        out << ", curve " << record.curve.y0 << ".." << record.curve.y1 << (record.curve.readable ? "" : " unreadable")
+            << (kind == Kind::Filter ? ", taps " + std::to_string(record.taps) : std::string());
     if (action->SetTo(&document_.manager, &document_.position) != B_OK)
         return out.str() + " (refused to bind)";
     Action* raw = action.get();
@@ -214,6 +237,8 @@ std::string SoakSession::Act(Kind kind, const SoakStep& step)
     raw->Go();
     if (kind == Kind::AddChannel)
         model_.RecordAddChannel(document_.manager.ChannelAt(document_.manager.CountChannels() - 1)->Id(), focus);
+    else if (HasDialog(kind))
+        model_.PerformWith(record, cursor, focus);
     else
         model_.Perform(kind, cursor, focus);
     return out.str();
@@ -257,11 +282,17 @@ std::string SoakSession::Edit(const SoakStep& step)
     }
     // Nor grow without bound: ranges reaching past the data and pastes
     // lengthen channels, and a long document makes every step slow.
-    if (model_.Total() > kLongDocument && (op == SoakStep::Transform || op == SoakStep::Paste))
+    if (model_.Total() > kLongDocument
+        && (op == SoakStep::Transform || op == SoakStep::Paste || op == SoakStep::CurveEffect || op == SoakStep::Stretch))
         op = SoakStep::Remove;
     ChooseSelection(step.r[1]);
     ChooseRange(step, op == SoakStep::Remove && model_.Total() > kLongDocument);
+    if (op == SoakStep::Stretch)
+        ChooseShortRange(step);
+    static const Kind kCurveKinds[4] = {Kind::Filter, Kind::Distort, Kind::PeakDistort, Kind::Envelope};
     switch (op) {
+    case SoakStep::CurveEffect: return Act(SoakDialogs::Draw(kCurveKinds[step.r[0] % 4], step), step);
+    case SoakStep::Stretch: return Act(SoakDialogs::Draw(Kind::Stretch, step), step);
     case SoakStep::Transform: return Act(Kind(step.r[0] % 5), step);
     case SoakStep::Remove: return Act(Kind::Remove, step);
     case SoakStep::Cut: return CopyStep() + "; " + Act(Kind::Remove, step);
@@ -375,6 +406,37 @@ std::string SoakSession::DeleteHistory()
     return "Delete History";
 }
 
+void SoakSession::ChooseShortRange(const SoakStep& step)
+{
+    // Short enough for the vocoder to leave the stretch silent (see
+    // SoakEffects), sometimes empty, sometimes before frame 0.
+    const int64_t start = Frame(step.r[2]);
+    const int64_t length = int64_t((step.r[3] >> 8) % 3000) - (step.r[3] % 8 == 0 ? 1000 : 0);
+    document_.SetRange(start, start + length);
+    model_.SetRangeStart(start);
+    model_.SetRangeEnd(start + length);
+}
+
+std::string SoakSession::Redraw(const SoakStep& step)
+{
+    // The effect on top of the undo stack is taken back first, so that
+    // the dialog redrawn is the one the redo reads.
+    std::string done;
+    if ((model_.redo.empty() || model_.redo.back().dialog == nullptr) && !model_.undo.empty()
+        && model_.undo.back().dialog != nullptr)
+        done = Runs(true, 1) + "; ";
+    if (model_.redo.empty() || model_.redo.back().dialog == nullptr)
+        return "Redraw: no kept dialog to redo";
+    SoakRecord& top = model_.redo.back();
+    SoakDialogs::Redraw(top, SoakDialogs::DrawCurve(step.r[1]));
+    std::ostringstream out;
+    out << done << "Redraw the dialog of " << SoakKindName(top.kind) << " to " << top.curve.y0 << ".."
+        << top.curve.y1 << (top.curve.readable ? "" : " unreadable");
+    if (step.r[2] % 4 != 0)
+        out << "; " << Runs(false, 1);
+    return out.str();
+}
+
 std::string SoakSession::Apply(const SoakStep& step)
 {
     // Undoing a long history can give back far more than the document
@@ -389,7 +451,12 @@ std::string SoakSession::Apply(const SoakStep& step)
     case SoakStep::Cut:
     case SoakStep::Paste:
     case SoakStep::Truncate:
-    case SoakStep::Copy: return Edit(step);
+    case SoakStep::Copy:
+    case SoakStep::CurveEffect:
+    case SoakStep::Stretch: return Edit(step);
+    case SoakStep::Redraw: return Redraw(step);
+    case SoakStep::Save: return SoakFiles::SaveAndReopen(document_, history_, model_, mismatch_);
+    case SoakStep::FailedSave: return SoakFiles::FailedSave(document_, history_, mismatch_);
     case SoakStep::ForeignCopy: return ForeignCopy(step);
     case SoakStep::Move: return Move(step, false);
     case SoakStep::HugeMove: return Move(step, true);

@@ -33,6 +33,11 @@ public:
 
 private:
     std::string Act(SoakRecord::Kind kind, const SoakStep& step);
+    /// Binds, records and runs the action record names, with the
+    /// parameters it carries when the action has a dialog.
+    std::string Act(SoakRecord record, const SoakStep& step);
+    std::string Redraw(const SoakStep& step);
+    void ChooseShortRange(const SoakStep& step);
     std::string Edit(const SoakStep& step);
     std::string ChannelStep(const SoakStep& step);
     std::string Move(const SoakStep& step, bool huge);
