@@ -148,16 +148,21 @@ protected:
     /// channel whatever the range's length.
     status_t TransformSelectedRanges(const PieceTransform& transform);
 
+    /// For a Go that runs its own RangeTransformer instead of
+    /// TransformSelectedRanges: call RecordGoInput before the transformer
+    /// reads anything and RecordGoOutput (with what it returned, and false
+    /// when the transformer failed) once it wrote its results, both under
+    /// the document lock, so that a redo can put those results back.
+    /// RecordGoInput is true when the result can be put back later.
+    bool RecordGoInput();
+    /// Keeps what the transform made when recorded, else forgets the record.
+    void RecordGoOutput(bool recorded);
+
 private:
     void TakeSnapshot();
     /// Puts back the results the last Go made; false, changing nothing,
     /// unless every recorded channel holds again what that Go read.
     bool PutResultBack();
-    /// Keeps what the transform is about to read (true) when the result
-    /// can be put back later; caller holds the document lock.
-    bool RecordGoInput();
-    /// Keeps what the transform made when recorded, else forgets the record.
-    void RecordGoOutput(bool recorded);
     void ForgetGoRecord();
     bool RangeInside(Channel* channel) const;
 

@@ -91,14 +91,20 @@ void HistorySpill::Trim(const std::vector<const BlockRef*>& kept)
         if ((*entry->ref)->IsResident())
             residentHistory_ += (*entry->ref)->Bytes();
     }
-    if (!toWrite.empty())
-        Queue(std::move(toWrite));
+    Queue(std::move(toWrite));
 }
 
 void HistorySpill::Queue(std::vector<BlockRef> blocks)
 {
     {
         std::lock_guard guard(lock_);
+        if (blocks.empty()) {
+            // Nothing to write, but blocks read back may have left space
+            // to hand back: that is the worker's too, as it can be slow.
+            if (file_ == nullptr || file_->UnpunchedBytes() == 0)
+                return;
+            punchWanted_ = true;
+        }
         if (file_ == nullptr)
             file_ = SpillFile::Create();
         if (file_ == nullptr)
@@ -115,10 +121,11 @@ void HistorySpill::Work()
 {
     std::unique_lock guard(lock_);
     for (;;) {
-        wake_.wait(guard, [this] { return stopping_ || !queue_.empty(); });
+        wake_.wait(guard, [this] { return stopping_ || !queue_.empty() || punchWanted_; });
         if (stopping_)
             return;
         busy_ = true;
+        const bool wrote = !queue_.empty();
         while (!queue_.empty() && !stopping_) {
             BlockRef block = std::move(queue_.front());
             queue_.pop_front();
@@ -131,9 +138,19 @@ void HistorySpill::Work()
             file.reset();
             guard.lock();
         }
+        punchWanted_ = false;
+        if (std::shared_ptr<SpillFile> file = file_; file != nullptr && !stopping_) {
+            // Space of blocks read back goes back to the disk here rather
+            // than in the undo that read them: making a hole may first
+            // write out what the space held.
+            guard.unlock();
+            file->PunchReleased();
+            file.reset();
+            guard.lock();
+        }
         busy_ = false;
         idle_.notify_all();
-        if (!stopping_) {
+        if (wrote && !stopping_) {
             guard.unlock();
             {
                 // Held during the call, so that once SetWrittenCallback has

@@ -25,7 +25,8 @@ class SpillFile;
 /// held: nothing else can get a new reference. Only such blocks are
 /// dropped, and only there. Writing the copies happens on a worker thread
 /// of its own; a block written but not yet dropped is dropped by the next
-/// Trim if it still qualifies.
+/// Trim if it still qualifies. The worker also hands back the file space
+/// of blocks read back, which may wait on the disk.
 class HistorySpill {
 public:
     HistorySpill();
@@ -48,7 +49,8 @@ public:
     /// Called on the worker thread whenever it has written everything it
     /// was given, so the owner can have Trim run again on its own thread.
     void SetWrittenCallback(std::function<void()> callback);
-    /// Blocks until the worker has written everything queued.
+    /// Blocks until the worker has written everything queued (and handed
+    /// back the file space of blocks read back).
     void WaitUntilWritten();
     /// Lets go of the scratch file; blocks still stored there keep it open
     /// until they are freed or read back. For when the history is emptied.
@@ -71,6 +73,7 @@ private:
     std::condition_variable idle_;
     std::deque<BlockRef> queue_;
     bool busy_ = false;
+    bool punchWanted_ = false;  // space released in the file to hand back
     bool stopping_ = false;
     std::shared_ptr<SpillFile> file_;
     std::thread worker_;

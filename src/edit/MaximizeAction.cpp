@@ -24,6 +24,7 @@ status_t MaximizeAction::Go()
     // Both passes are one step for the playback thread, and share one
     // working buffer.
     std::lock_guard guard(Manager()->DocumentLock());
+    const bool recorded = RecordGoInput();
     RangeTransformer transformer(Manager(), RangeStart(), RangeEnd());
     int16_t peak = 0;
     // Silence never raises the peak.
@@ -38,6 +39,9 @@ status_t MaximizeAction::Go()
             },
             int16_t(0)});
     }
+    // A range left as it was is a result too: a redo then puts back the
+    // very blocks the range holds.
+    RecordGoOutput(recorded && transformer.InitCheck() == B_OK);
     return transformer.InitCheck();
 }
 

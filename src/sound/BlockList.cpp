@@ -28,10 +28,13 @@ size_t BlockList::Find(int64_t index) const
 
 bool BlockList::MakeResident() const
 {
-    bool ok = true;
-    for (const BlockRef& block : blocks_)
-        ok = block->MakeResident() && ok;
-    return ok;
+    std::vector<const SampleBlock*> dropped;
+    for (const BlockRef& block : blocks_) {
+        if (!block->IsResident())
+            dropped.push_back(block.get());
+    }
+    // All at once: the reads then go in order of place in the file.
+    return dropped.empty() || SampleBlock::MakeResident(dropped);
 }
 
 void BlockList::CopyOut(int64_t index, int64_t count, int16_t* destination) const

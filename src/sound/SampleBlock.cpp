@@ -123,8 +123,120 @@ bool SampleBlock::HasFileCopy() const
 
 bool SampleBlock::MakeResident() const
 {
-    if (IsResident())
-        return true;
+    return IsResident() || SlowMakeResident();
+}
+
+/// A dropped block on its way back: where its copy lies, and the memory it
+/// is read into.
+struct SampleBlock::ReadBack {
+    const SampleBlock* block = nullptr;
+    std::shared_ptr<SpillFile> file;
+    int64_t offset = -1;
+    uint64_t drops = 0;
+    int16_t* samples = nullptr;
+    bool pooled = false;
+};
+
+bool SampleBlock::MakeResident(const std::vector<const SampleBlock*>& blocks)
+{
+    // Batches bound the memory read ahead of being handed to its block.
+    constexpr size_t kBatch = 1024;
+    bool ok = true;
+    std::vector<ReadBack> batch;
+    for (const SampleBlock* block : blocks) {
+        if (block == nullptr || block->IsResident())
+            continue;
+        ReadBack entry;
+        {
+            std::lock_guard guard(block->residencyLock_);
+            if (block->samples_.load(std::memory_order_relaxed) != nullptr)
+                continue;
+            if (block->file_ == nullptr) {
+                ok = false;
+                continue;
+            }
+            entry.file = block->file_;
+            entry.offset = block->fileOffset_;
+            entry.drops = block->drops_;
+        }
+        entry.block = block;
+        batch.push_back(std::move(entry));
+        if (batch.size() == kBatch) {
+            ok = ReadBatch(batch) && ok;
+            batch.clear();
+        }
+    }
+    if (!batch.empty())
+        ok = ReadBatch(batch) && ok;
+    return ok;
+}
+
+bool SampleBlock::ReadBatch(std::vector<ReadBack>& batch)
+{
+    // The same file for the whole batch nearly always; blocks of a file the
+    // history let go of meanwhile are read one by one.
+    const std::shared_ptr<SpillFile> file = batch.front().file;
+    std::vector<SpillFile::Piece> pieces;
+    pieces.reserve(batch.size());
+    bool ok = true;
+    for (ReadBack& entry : batch) {
+        entry.samples = NewSamples(entry.block->count_, &entry.pooled);
+        if (entry.samples == nullptr) {
+            ok = false;
+            continue;
+        }
+        if (entry.file != file) {
+            if (!entry.file->Read(entry.offset, entry.samples, entry.block->Bytes())) {
+                FreeSamples(entry.samples, entry.pooled);
+                entry.samples = nullptr;
+                ok = false;
+            }
+            continue;
+        }
+        pieces.push_back(SpillFile::Piece{entry.offset, entry.samples, entry.block->Bytes()});
+    }
+    if (!file->ReadMany(pieces)) {
+        // Which piece failed is not known: those blocks go the slow way.
+        for (ReadBack& entry : batch) {
+            if (entry.samples != nullptr && entry.file == file) {
+                FreeSamples(entry.samples, entry.pooled);
+                entry.samples = nullptr;
+            }
+        }
+        ok = false;
+    }
+    for (ReadBack& entry : batch) {
+        const SampleBlock& block = *entry.block;
+        bool installed = false;
+        if (entry.samples != nullptr) {
+            std::lock_guard guard(block.residencyLock_);
+            installed = block.InstallLocked(entry.samples, entry.pooled, entry.drops);
+        }
+        if (!installed && entry.samples != nullptr)
+            FreeSamples(entry.samples, entry.pooled);
+        if (!block.IsResident() && !block.SlowMakeResident())
+            ok = false;
+    }
+    return ok;
+}
+
+bool SampleBlock::InstallLocked(int16_t* samples, bool pooled, uint64_t drops) const
+{
+    if (samples_.load(std::memory_order_relaxed) != nullptr || file_ == nullptr || drops_ != drops)
+        return false;
+    ResidentCounter().fetch_add(Bytes(), std::memory_order_relaxed);
+    pooled_ = pooled;
+    samples_.store(samples, std::memory_order_release);
+    // A block read back is usually headed for a channel, where it may live
+    // long after the history is gone: its copy must not keep the file open.
+    file_->Release(fileOffset_, Bytes());
+    file_.reset();
+    fileOffset_ = -1;
+    return true;
+}
+
+bool SampleBlock::SlowMakeResident() const
+{
     std::lock_guard guard(residencyLock_);
     if (samples_.load(std::memory_order_relaxed) != nullptr)
         return true;
@@ -134,18 +246,10 @@ bool SampleBlock::MakeResident() const
     int16_t* samples = NewSamples(count_, &pooled);
     if (samples == nullptr)
         return false;
-    if (!file_->Read(fileOffset_, samples, Bytes())) {
+    if (!file_->Read(fileOffset_, samples, Bytes()) || !InstallLocked(samples, pooled, drops_)) {
         FreeSamples(samples, pooled);
         return false;
     }
-    ResidentCounter().fetch_add(Bytes(), std::memory_order_relaxed);
-    pooled_ = pooled;
-    samples_.store(samples, std::memory_order_release);
-    // A block read back is usually headed for a channel, where it may live
-    // long after the history is gone: its copy must not keep the file open.
-    file_->Release(fileOffset_, Bytes());
-    file_.reset();
-    fileOffset_ = -1;
     return true;
 }
 
@@ -191,6 +295,7 @@ bool SampleBlock::DropSamples() const
     if (file_ == nullptr || samples == nullptr)
         return false;
     samples_.store(nullptr, std::memory_order_release);
+    drops_++;
     ResidentCounter().fetch_sub(Bytes(), std::memory_order_relaxed);
     FreeSamples(samples, pooled_);
     return true;

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <memory>
 #include <mutex>
+#include <vector>
 
 namespace glimmet {
 
@@ -72,6 +73,12 @@ public:
     /// Brings the samples back into memory when they were dropped; false
     /// when they could be neither allocated nor read.
     bool MakeResident() const;
+    /// MakeResident for many blocks at once: what they need from their
+    /// files is read in order of place in the file, runs that lie end to
+    /// end in one call, instead of a read per block. An undo brings back
+    /// thousands of blocks that were written out one after another. True
+    /// when every block is resident afterwards.
+    static bool MakeResident(const std::vector<const SampleBlock*>& blocks);
     /// Stores a copy of the samples in file unless one is stored already;
     /// false when the write failed. The samples must be resident: only
     /// DropSamples takes them away, and not before a copy exists.
@@ -86,6 +93,15 @@ public:
 private:
     SampleBlock(int16_t* samples, bool pooled, int64_t count);
     const int16_t* LoadSamples() const;
+    struct ReadBack;
+    /// Reads one batch of blocks back; see MakeResident.
+    static bool ReadBatch(std::vector<ReadBack>& batch);
+    /// Puts samples read from file at offset in place of the dropped
+    /// ones; false, changing nothing, unless the block is still dropped as
+    /// it was on its drops-th drop. Caller holds residencyLock_.
+    bool InstallLocked(int16_t* samples, bool pooled, uint64_t drops) const;
+    /// Reads the block back on its own, under its lock throughout.
+    bool SlowMakeResident() const;
     /// Memory for count samples: full-size blocks come from the BlockPool,
     /// other sizes from new[]; null when none can be had.
     static int16_t* NewSamples(int64_t count, bool* pooled);
@@ -102,6 +118,9 @@ private:
     mutable std::mutex residencyLock_;
     mutable std::shared_ptr<SpillFile> file_;
     mutable int64_t fileOffset_ = -1;
+    // How often the samples were dropped: a read that began before the
+    // block came back and went again must not install what it read.
+    mutable uint64_t drops_ = 0;
     mutable std::mutex summaryLock_;
     mutable std::shared_ptr<const BlockSummary> summary_;
 };
