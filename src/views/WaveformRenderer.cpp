@@ -171,15 +171,8 @@ void WaveformRenderer::ShadeColumn(int32_t column, Shade&& shade)
 // The column's frames, span by span.
 void WaveformRenderer::CountSamples(int64_t f0, int64_t f1)
 {
-    const int64_t from = f0 - scene_.channelFirstFrame;
-    const int64_t to = f1 - scene_.channelFirstFrame + 1;
     counter_.Clear();
-    auto next = std::upper_bound(spanStarts_.begin(), spanStarts_.end(), from);
-    size_t index = size_t(next - spanStarts_.begin()) - 1;
-    for (; index < spanStarts_.size() && spanStarts_[index] < to; ++index) {
-        const int64_t start = spanStarts_[index];
-        counter_.Add(scene_.spans[index], std::max(from, start) - start, to - start);
-    }
+    ForEachSpanPart(f0, f1, [this](const SampleSpan& span, int64_t from, int64_t to) { counter_.Add(span, from, to); });
     counter_.Finish(histogram_.data());
 }
 
@@ -187,13 +180,22 @@ void WaveformRenderer::PrefetchFrames(int64_t f0, int64_t f1)
 {
     if (IsOutsideData(f0, f1))
         return;
+    ForEachSpanPart(
+        f0, f1, [this](const SampleSpan& span, int64_t from, int64_t to) { counter_.Prefetch(span, from, to); });
+}
+
+// Calls f(span, from, to) for the part of every span that frames f0..f1
+// cover, as offsets inside the span (to may lie past its end).
+template <typename F>
+void WaveformRenderer::ForEachSpanPart(int64_t f0, int64_t f1, F&& f) const
+{
     const int64_t from = f0 - scene_.channelFirstFrame;
     const int64_t to = f1 - scene_.channelFirstFrame + 1;
     auto next = std::upper_bound(spanStarts_.begin(), spanStarts_.end(), from);
     size_t index = size_t(next - spanStarts_.begin()) - 1;
     for (; index < spanStarts_.size() && spanStarts_[index] < to; ++index) {
         const int64_t start = spanStarts_[index];
-        counter_.Prefetch(scene_.spans[index], std::max(from, start) - start, to - start);
+        f(scene_.spans[index], std::max(from, start) - start, to - start);
     }
 }
 

@@ -77,6 +77,8 @@ private:
     void RenderDataColumn(int32_t column, int64_t f0, int64_t f1, ColumnState state);
     void CountSamples(int64_t f0, int64_t f1);
     void PrefetchFrames(int64_t f0, int64_t f1);
+    template <typename F>
+    void ForEachSpanPart(int64_t f0, int64_t f1, F&& f) const;
     bool Unchanged(std::vector<RenderedColumn>* memo, int32_t column, int64_t f0, int64_t f1, ColumnState state) const;
     // One detach for the whole render instead of one per pixel.
     QRgb& PixelAt(int32_t column, int32_t row)
