@@ -290,8 +290,7 @@ void Action::VisitKeptBlocks(const BlockVisitor& visit) const
 {
     for (const SavedChannel& record : savedChannels_) {
         for (const SampleSlice* slice : {&record.data, &record.redo, &record.undone}) {
-            for (size_t i = 0; i < slice->blocks.BlockCount(); ++i)
-                visit(slice->blocks.BlockAt(i));
+            slice->blocks.ForEachBlock(visit);
         }
     }
 }

@@ -118,8 +118,7 @@ void TruncateAction::VisitKeptBlocks(const BlockVisitor& visit) const
     Action::VisitKeptBlocks(visit);
     for (const KeptChannel& record : records_) {
         for (const SampleSlice* slice : {&record.head, &record.tail}) {
-            for (size_t i = 0; i < slice->blocks.BlockCount(); ++i)
-                visit(slice->blocks.BlockAt(i));
+            slice->blocks.ForEachBlock(visit);
         }
     }
 }

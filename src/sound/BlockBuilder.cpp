@@ -142,9 +142,22 @@ void BlockBuilder::AppendRange(const BlockList& list, int64_t index, int64_t cou
     index = std::max<int64_t>(index, 0);
     if (index >= stop)
         return;
+    const size_t wholeEnd = list.BlocksBefore(stop);
     for (size_t position = list.Find(index); ok_ && index < stop; ++position) {
+        int64_t start = list.StartOf(position);
+        if (pendingCount_ == 0 && index == start && position < wholeEnd) {
+            // Whole blocks with nothing pending go in as they are, whole
+            // runs of references shared.
+            list_.AppendBlocks(list, position, wholeEnd - position);
+            position = wholeEnd;
+            if (position == list.BlockCount())
+                break;
+            index = start = list.StartOf(position);
+            if (index >= stop)
+                break;
+        }
         const BlockRef& block = list.BlockAt(position);
-        const int64_t offset = index - list.StartOf(position);
+        const int64_t offset = index - start;
         const int64_t part = std::min(block->Count() - offset, stop - index);
         if (offset == 0 && part == block->Count())
             AppendBlock(block);
