@@ -10,8 +10,10 @@
 #include "files/MediaTrack.h"
 #include "files/MemoryBudget.h"
 #include "sound/BlockBuilder.h"
+#include "sound/BlockPool.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
+#include "sound/PoolWarmer.h"
 #include "support/Diagnostics.h"
 #include "support/MessageCodes.h"
 
@@ -20,6 +22,8 @@ namespace glimmet {
 namespace {
 
 constexpr const char* kTitlePrefix = "Glimmet - ";
+/// How far ahead of the decoding block memory is faulted in: a few slabs.
+constexpr size_t kWarmAheadBlocks = 256;
 
 bool IsAudio(const media_format& format)
 {
@@ -180,6 +184,9 @@ std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* t
         return {};
     }
 
+    // Providing the pages of a long file's blocks is a good part of the
+    // work of loading it; another core does it ahead of the decoding.
+    PoolWarmer warmer(BlockPool::Shared(), size_t(claimed / int64_t(BlockPool::kBlockBytes)), kWarmAheadBlocks);
     DecodedBlocks blocks{int32_t(channelCount)};
     int64_t seekTo = 0;
     track->SeekToFrame(&seekTo, 0);

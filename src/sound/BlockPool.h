@@ -64,6 +64,9 @@ public:
 
     /// Hands back the pages of every warm free block now.
     void ReleaseFree();
+    /// Faults in one more batch of free blocks, cold ones or a new slab;
+    /// false when the memory cannot be had.
+    bool WarmBatch() { return Refill(); }
 
     /// Blocks handed out and not freed.
     size_t BlocksInUse();
