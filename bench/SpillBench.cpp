@@ -22,6 +22,9 @@
 #include <fstream>
 #include <memory>
 #include <string>
+#include <sys/mman.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
 #include <unistd.h>
 #include <vector>
 
@@ -93,6 +96,43 @@ double BaselineMilliseconds(int64_t bytes)
     return read + 3 * bench::MemcpyNanoseconds(size_t(bytes), 3, 1) / 1e6;
 }
 
+/// The share of the file behind fd that is in the page cache, in percent;
+/// -1 when it cannot be told. Reading back from a cold file is the disk's
+/// speed, not the program's.
+double CachedPercent(int fd)
+{
+    struct stat status {};
+    if (fd < 0 || ::fstat(fd, &status) != 0 || status.st_size == 0)
+        return -1;
+    void* map = ::mmap(nullptr, size_t(status.st_size), PROT_READ, MAP_SHARED, fd, 0);
+    if (map == MAP_FAILED)
+        return -1;
+    const long page = ::sysconf(_SC_PAGE_SIZE);
+    std::vector<unsigned char> pages(size_t((status.st_size + page - 1) / page));
+    double percent = -1;
+    if (::mincore(map, size_t(status.st_size), pages.data()) == 0)
+        percent = 100.0 * double(std::count_if(pages.begin(), pages.end(), [](unsigned char p) { return p & 1; }))
+            / double(pages.size());
+    ::munmap(map, size_t(status.st_size));
+    return percent;
+}
+
+/// CPU time of the calling thread so far, in milliseconds, and how often it
+/// was taken off a core against its will: on a loaded machine wall time
+/// alone cannot tell slow code from a thread left waiting for a core.
+struct ThreadTimes {
+    double cpu = 0;
+    long preempted = 0;
+
+    static ThreadTimes Now()
+    {
+        rusage usage {};
+        ::getrusage(RUSAGE_THREAD, &usage);
+        const auto ms = [](const timeval& t) { return double(t.tv_sec) * 1e3 + double(t.tv_usec) / 1e3; };
+        return ThreadTimes{ms(usage.ru_utime) + ms(usage.ru_stime), usage.ru_nivcsw};
+    }
+};
+
 struct Document {
     ChannelManager manager{nullptr};
     EditPosition position;
@@ -143,9 +183,12 @@ void BM_TenFadesAndUndosWithinBudget(benchmark::State& state)
         }
         for (int i = 10; i > 0; i--) {
             const int64_t residentBefore = SampleBlock::ResidentBytes();
+            const double cached = CachedPercent(history.SpillDescriptor());
+            const ThreadTimes timesBefore = ThreadTimes::Now();
             const auto begin = std::chrono::steady_clock::now();
             history.Undo();
             const double undo = Milliseconds(std::chrono::steady_clock::now() - begin);
+            const ThreadTimes timesAfter = ThreadTimes::Now();
             const int64_t readBack = std::max<int64_t>(0, SampleBlock::ResidentBytes() - residentBefore);
             const double baseline = readBack > 0 ? BaselineMilliseconds(readBack) : 0;
             history.SettleMemory();
@@ -155,6 +198,9 @@ void BM_TenFadesAndUndosWithinBudget(benchmark::State& state)
                 i, undo, Megabytes(readBack), baseline, baseline > 0 ? undo / baseline : 0.0, Megabytes(rss),
                 Megabytes(bound), rss <= bound ? "" : "  OVER", Megabytes(SampleBlock::ResidentBytes()),
                 Megabytes(int64_t(BlockPool::Shared().WarmBlocks() * BlockPool::kBlockBytes)));
+            std::printf("         undo on a core %.1f ms, preempted %ld times; scratch file %.0f%% in the page cache "
+                        "before it\n",
+                timesAfter.cpu - timesBefore.cpu, timesAfter.preempted - timesBefore.preempted, cached);
             if (baseline > 0)
                 worstRatio = std::max(worstRatio, undo / baseline);
         }

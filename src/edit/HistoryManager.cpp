@@ -50,7 +50,9 @@ status_t HistoryManager::Move(Stack& from, Stack& to, Step step)
 status_t HistoryManager::Undo()
 {
     std::lock_guard guard(*this);
+    spill_->Pause();
     const status_t status = Move(undoStack_, redoStack_, [](Action& action) { return action.Undo(); });
+    spill_->Resume();
     Trim();
     return status;
 }
@@ -58,7 +60,9 @@ status_t HistoryManager::Undo()
 status_t HistoryManager::Redo()
 {
     std::lock_guard guard(*this);
+    spill_->Pause();
     const status_t status = Move(redoStack_, undoStack_, [](Action& action) { return action.Redo(); });
+    spill_->Resume();
     Trim();
     return status;
 }
@@ -111,14 +115,23 @@ bool HistoryManager::IsSaved()
 void HistoryManager::Trim()
 {
     std::vector<const BlockRef*> kept;
-    const auto collect = [&kept](const Stack& stack) {
-        for (const Entry& entry : stack)
-            entry.action->VisitKeptBlocks([&kept](const BlockRef& block) { kept.push_back(&block); });
+    const auto collect = [&kept](const Entry& entry) {
+        entry.action->VisitKeptBlocks([&kept](const BlockRef& block) { kept.push_back(&block); });
     };
-    // Oldest first: the bottom of the undo stack, then the redo stack from
-    // the action undone first.
-    collect(undoStack_);
-    collect(redoStack_);
+    // Farthest from the document's state first: the next undo needs the top
+    // of the undo stack and the next redo the top of the redo stack, so
+    // those are the last to leave memory. At equal distance the redo entry
+    // goes first, as undoing again is the likelier next step after an undo.
+    size_t undo = 0;
+    size_t redo = 0;
+    while (undo < undoStack_.size() || redo < redoStack_.size()) {
+        const size_t undoDistance = undoStack_.size() - undo;
+        const size_t redoDistance = redoStack_.size() - redo;
+        if (redo < redoStack_.size() && (undo == undoStack_.size() || redoDistance >= undoDistance))
+            collect(redoStack_[redo++]);
+        else
+            collect(undoStack_[undo++]);
+    }
     spill_->Trim(kept);
 }
 

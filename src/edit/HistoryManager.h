@@ -19,7 +19,8 @@ class HistorySpill;
 /// for its whole duration, including the call into the action, so the lock
 /// order is always history lock, then document lock. Both stacks grow
 /// without bound; the blocks only they hold stay in memory up to a budget,
-/// the oldest beyond it move to a scratch file (see HistorySpill).
+/// those farthest from the next undo or redo move beyond it to a scratch
+/// file (see HistorySpill).
 /// Every operation runs on the thread that edits the document.
 class HistoryManager : public Locker {
 public:
@@ -62,7 +63,7 @@ public:
     /// default HistorySpill::DefaultBudget().
     void SetMemoryBudget(int64_t bytes);
     int64_t MemoryBudget();
-    /// Moves the oldest blocks beyond the budget out of memory: drops what
+    /// Moves the farthest blocks beyond the budget out of memory: drops what
     /// has been written, hands more to the writer. Every change of the
     /// history does it; the owner calls it after an action has run and
     /// when the writer reports (see SetSpillWrittenCallback).

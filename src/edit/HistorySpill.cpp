@@ -14,7 +14,7 @@ namespace glimmet {
 namespace {
 
 /// How many references the history keeps to one block, and where the block
-/// first turned up (its age).
+/// last turned up (how soon the history may need it back).
 struct KeptBlock {
     const BlockRef* ref = nullptr;
     long references = 0;
@@ -56,12 +56,13 @@ void HistorySpill::Trim(const std::vector<const BlockRef*>& kept)
 {
     std::unordered_map<const SampleBlock*, KeptBlock> counts;
     counts.reserve(kept.size());
+    size_t order = 0;
     for (const BlockRef* ref : kept) {
+        // A block kept by several entries is ranked by the nearest of them,
+        // the one that will need it first.
         KeptBlock& entry = counts[ref->get()];
-        if (entry.ref == nullptr) {
-            entry.ref = ref;
-            entry.order = counts.size();
-        }
+        entry.ref = ref;
+        entry.order = order++;
         ++entry.references;
     }
     // Blocks held by nothing but the history: a channel, the copy buffer, a
@@ -127,6 +128,9 @@ void HistorySpill::Work()
         busy_ = true;
         const bool wrote = !queue_.empty();
         while (!queue_.empty() && !stopping_) {
+            WaitWhilePaused(guard);
+            if (stopping_ || queue_.empty())
+                break;
             BlockRef block = std::move(queue_.front());
             queue_.pop_front();
             std::shared_ptr<SpillFile> file = file_;
@@ -138,6 +142,7 @@ void HistorySpill::Work()
             file.reset();
             guard.lock();
         }
+        WaitWhilePaused(guard);
         punchWanted_ = false;
         if (std::shared_ptr<SpillFile> file = file_; file != nullptr && !stopping_) {
             // Space of blocks read back goes back to the disk here rather
@@ -162,6 +167,26 @@ void HistorySpill::Work()
             guard.lock();
         }
     }
+}
+
+void HistorySpill::WaitWhilePaused(std::unique_lock<std::mutex>& guard)
+{
+    wake_.wait(guard, [this] { return stopping_ || pauses_ == 0; });
+}
+
+void HistorySpill::Pause()
+{
+    std::lock_guard guard(lock_);
+    ++pauses_;
+}
+
+void HistorySpill::Resume()
+{
+    {
+        std::lock_guard guard(lock_);
+        --pauses_;
+    }
+    wake_.notify_all();
 }
 
 void HistorySpill::SetWrittenCallback(std::function<void()> callback)

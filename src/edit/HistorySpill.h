@@ -16,7 +16,7 @@ namespace glimmet {
 class SpillFile;
 
 /// Keeps the memory of the blocks only the history holds under a budget by
-/// moving the oldest of them to a scratch file.
+/// moving those the history is least likely to need soon to a scratch file.
 ///
 /// Trim runs on the thread that edits documents, with the history lock
 /// held; it is handed every block reference the history keeps. A block
@@ -41,8 +41,9 @@ public:
     void SetBudget(int64_t bytes) { budget_ = bytes < 0 ? 0 : bytes; }
     int64_t Budget() const { return budget_; }
 
-    /// kept holds every reference the history keeps, oldest history first
-    /// (repeats included). Drops what is already written and queues more
+    /// kept holds every reference the history keeps, the entries farthest
+    /// from the document's state first (repeats included; a block counts as
+    /// where it last appears). Drops what is already written and queues more
     /// for writing until the history's resident blocks fit the budget.
     void Trim(const std::vector<const BlockRef*>& kept);
 
@@ -56,6 +57,14 @@ public:
     /// until they are freed or read back. For when the history is emptied.
     void ReleaseFile();
 
+    /// Hold the worker back from the scratch file while the history reads
+    /// blocks back (an undo or a redo), so those reads have the file and the
+    /// disk to themselves: the worker would otherwise write out or punch
+    /// the very blocks the read-back just let go of. Neither call blocks;
+    /// every Pause is followed by one Resume on the same thread.
+    void Pause();
+    void Resume();
+
     /// The scratch file's descriptor, or -1 when there is none (for tests).
     int FileDescriptor();
     /// Bytes of history blocks resident after the last Trim.
@@ -64,6 +73,8 @@ public:
 private:
     void Queue(std::vector<BlockRef> blocks);
     void Work();
+    /// Returns, lock_ held, once no Pause is in force (or on stopping).
+    void WaitWhilePaused(std::unique_lock<std::mutex>& guard);
 
     int64_t budget_;
     int64_t residentHistory_ = 0;
@@ -75,6 +86,7 @@ private:
     bool busy_ = false;
     bool punchWanted_ = false;  // space released in the file to hand back
     bool stopping_ = false;
+    int pauses_ = 0;
     std::shared_ptr<SpillFile> file_;
     std::thread worker_;
 

@@ -5,11 +5,13 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <chrono>
 #include <cmath>
 #include <cstdlib>
 #include <filesystem>
 #include <random>
 #include <string>
+#include <sys/stat.h>
 #include <thread>
 #include <unistd.h>
 #include <vector>
@@ -18,6 +20,7 @@
 #include "edit/FadeInAction.h"
 #include "edit/FadeOutAction.h"
 #include "edit/HistoryManager.h"
+#include "edit/HistorySpill.h"
 #include "sound/BlockBuilder.h"
 #include "sound/SampleBlock.h"
 
@@ -185,6 +188,76 @@ TEST_F(HistorySpillTest, BudgetComesFromTheEnvironment)
         ::setenv("GLIMMET_HISTORY_BUDGET", saved.c_str(), 1);
     else
         ::unsetenv("GLIMMET_HISTORY_BUDGET");
+}
+
+/// The blocks the document's channels are made of right now. The history
+/// keeps them alive once an edit has replaced them.
+std::vector<const SampleBlock*> BlocksOf(ChannelManager& manager)
+{
+    std::vector<const SampleBlock*> blocks;
+    for (int32_t c = 0; Channel* channel = manager.ChannelAt(c); c++) {
+        channel->ReadSpans(0, channel->FrameCount(),
+            [&blocks](const SampleSpan& span) { blocks.push_back(span.block); });
+    }
+    return blocks;
+}
+
+TEST_F(HistorySpillTest, WhatTheNextUndoNeedsStaysInMemoryLongest)
+{
+    MakeDocument();
+    HistoryManager history;
+    history.SetMemoryBudget(3 * kDocumentBytes + kInUseBytes);
+    Perform<FadeInAction>(document, history);
+    const std::vector<const SampleBlock*> afterFirstFade = BlocksOf(document.manager);
+    for (int i = 0; i < 3; i++)
+        Perform<FadeInAction>(document, history);
+    history.SettleMemory();
+    ASSERT_EQ(history.Undo(), B_OK);
+    ASSERT_EQ(history.Undo(), B_OK);
+    history.SettleMemory();
+    for (const SampleBlock* block : afterFirstFade)
+        ASSERT_TRUE(block->IsResident()) << "the history fitted its budget";
+
+    // Room for two of the three states the history holds in memory: the
+    // next undo's (after the first fade), the next redo's (after the third)
+    // and the one a second redo would need (after the fourth) goes.
+    history.SetMemoryBudget(2 * kDocumentBytes + kInUseBytes);
+    history.SettleMemory();
+    for (const SampleBlock* block : afterFirstFade)
+        EXPECT_TRUE(block->IsResident()) << "block " << block->Id() << " needed by the next undo left memory";
+    EXPECT_EQ(history.Undo(), B_OK);
+}
+
+int64_t FileBytes(int fd)
+{
+    struct stat status {};
+    return fd >= 0 && ::fstat(fd, &status) == 0 ? int64_t(status.st_size) : -1;
+}
+
+TEST(HistorySpillPause, TheWorkerLeavesTheFileAloneWhilePaused)
+{
+    HistorySpill spill;
+    spill.SetBudget(0);
+    const std::vector<int16_t> samples(size_t(BlockBuilder::kBlockSamples), 7);
+    std::vector<BlockRef> blocks;
+    for (int i = 0; i < 16; i++)
+        blocks.push_back(SampleBlock::CopyOf(samples.data(), int64_t(samples.size())));
+    std::vector<const BlockRef*> kept;
+    // These references play the history's: nothing else holds the blocks.
+    for (const BlockRef& block : blocks)
+        kept.push_back(&block);
+    spill.Pause();
+    spill.Trim(kept);
+    ASSERT_GE(spill.FileDescriptor(), 0) << "nothing was handed to the worker";
+    // Long enough for the worker to have written something if it were free to.
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
+    EXPECT_EQ(FileBytes(spill.FileDescriptor()), 0);
+    spill.Resume();
+    spill.WaitUntilWritten();
+    EXPECT_EQ(FileBytes(spill.FileDescriptor()), int64_t(blocks.size()) * blocks.front()->Bytes());
+    spill.Trim(kept);
+    for (const BlockRef& block : blocks)
+        EXPECT_FALSE(block->IsResident());
 }
 
 /// Mixing reads the channels the whole time while the history writes
