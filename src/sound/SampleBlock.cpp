@@ -5,6 +5,7 @@
 #include <new>
 
 #include "sound/BlockPool.h"
+#include "sound/PoolWarmer.h"
 #include "sound/SpillFile.h"
 
 namespace glimmet {
@@ -141,6 +142,13 @@ bool SampleBlock::MakeResident(const std::vector<const SampleBlock*>& blocks)
 {
     // Batches bound the memory read ahead of being handed to its block.
     constexpr size_t kBatch = 1024;
+    // Faulting in the memory to read into costs about as much as the reading
+    // itself; for a long read-back another core does it a batch ahead.
+    constexpr size_t kWarmedFrom = 64;
+    size_t pooled = 0;
+    for (const SampleBlock* block : blocks)
+        pooled += block != nullptr && !block->IsResident() && block->Bytes() == int64_t(BlockPool::kBlockBytes);
+    PoolWarmer warmer(BlockPool::Shared(), pooled >= kWarmedFrom ? pooled : 0, kBatch);
     bool ok = true;
     std::vector<ReadBack> batch;
     for (const SampleBlock* block : blocks) {
