@@ -37,7 +37,11 @@ SampleView::SampleView(Channel* channel, ChannelContainerView* container, QWidge
       summaries_(channel, rowTable_.data())
 {
     setObjectName("sample view");
-    setAttribute(Qt::WA_OpaquePaintEvent);
+    // Not marked opaque, although the picture covers the whole view: Qt cuts
+    // every opaque sibling out of a repaint region one by one, so that a
+    // repaint of the whole container would cost the square of the channel
+    // count. The container beneath fills the view's area first, which its
+    // picture then covers.
     // Focus comes with a click, so that no channel is focused when a window
     // opens.
     setFocusPolicy(Qt::ClickFocus);
