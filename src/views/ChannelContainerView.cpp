@@ -392,6 +392,16 @@ void ChannelContainerView::UpdateAll()
     CheckZoomSlider(true);
 }
 
+// Qt keeps a dirty region as a list of rectangles and cuts each child's
+// share out of it, so many small areas cost the square of their number;
+// the one rectangle around them costs a repaint of the views between,
+// whose pictures are up to date.
+void ChannelContainerView::RepaintArea(const QRect& area)
+{
+    pendingRepaint_ = pendingRepaint_.united(area);
+    update(pendingRepaint_);
+}
+
 void ChannelContainerView::MessageReceived(const Message& message)
 {
     if (message.what == kMsgSampleMoved) {
@@ -481,6 +491,7 @@ void ChannelContainerView::LayoutChildren()
 // the waveforms are the sample views' own.
 void ChannelContainerView::paintEvent(QPaintEvent* event)
 {
+    pendingRepaint_ = QRect();
     QPainter painter(this);
     painter.fillRect(event->rect(), kBackground);
     // A frame lies one pixel outside its view; frames wholly outside the
