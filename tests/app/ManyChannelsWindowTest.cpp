@@ -194,5 +194,24 @@ TEST(ManyChannelsWindow, RemovingAChannelRepaintsTheContainerInOneRectangle)
     EXPECT_EQ(viewWatcher.Paints(), 1);
 }
 
+// Selecting all re-renders every view at once; their repaints reach Qt as
+// one rectangle, not as a piece per view, and each view is painted once.
+TEST(ManyChannelsWindow, SelectingAllRepaintsTheViewsInOneRectangle)
+{
+    AppFixture fixture;
+    QuillexWindow* window = WindowWithChannels(fixture, 2, 32);
+    ChannelContainerView& container = *window->ContainerView();
+    ASSERT_EQ(container.CountChannelViews(), 64);
+    PaintWatcher containerWatcher(&container);
+    PaintWatcher viewWatcher(container.SampleViewAtIndex(40));
+
+    container.SelectAll();
+    Drain();
+
+    EXPECT_GE(containerWatcher.Paints(), 1);
+    EXPECT_EQ(containerWatcher.MostRects(), 1);
+    EXPECT_EQ(viewWatcher.Paints(), 1);
+}
+
 }  // namespace
 }  // namespace glimmet::test
