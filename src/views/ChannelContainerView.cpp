@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include <QPaintEvent>
 #include <QPainter>
 #include <QWheelEvent>
 
@@ -391,6 +392,16 @@ void ChannelContainerView::UpdateAll()
     CheckZoomSlider(true);
 }
 
+// Qt keeps a dirty region as a list of rectangles and cuts each child's
+// share out of it, so many small areas cost the square of their number;
+// the one rectangle around them costs a repaint of the views between,
+// whose pictures are up to date.
+void ChannelContainerView::RepaintArea(const QRect& area)
+{
+    pendingRepaint_ = pendingRepaint_.united(area);
+    update(pendingRepaint_);
+}
+
 void ChannelContainerView::MessageReceived(const Message& message)
 {
     if (message.what == kMsgSampleMoved) {
@@ -454,12 +465,21 @@ void ChannelContainerView::LayoutChildren()
         zoomSliderHeight_ = float(zoomSlider_->minimumSizeHint().height());
     const float count = float(sampleViews_.size());
     const float channelHeight = (bounds.Height() - zoomSliderHeight_ - 2 * count) / count;
+    // Every view is repainted whole after a layout anyway; with updates off
+    // while they are placed, Qt does not gather each moved view's old and
+    // new area into one ever larger dirty region, which costs the square of
+    // the channel count.
+    const bool updatesWereEnabled = updatesEnabled();
+    if (updatesWereEnabled)
+        setUpdatesEnabled(false);
     float previousBottom = 0;
     for (size_t i = 0; i < sampleViews_.size(); ++i) {
         const float top = i == 0 ? 1 : previousBottom + 3;
         const float bottom = i == 0 ? channelHeight : previousBottom + 3 + channelHeight;
         previousBottom = sampleViews_[i]->Layout({1, top, bounds.right - 1, bottom}).bottom;
     }
+    if (updatesWereEnabled)
+        setUpdatesEnabled(true);
     if (zoomSlider_ != nullptr) {
         const float top = sampleViews_.empty() ? bounds.bottom - zoomSliderHeight_ + 1 : previousBottom + 2;
         zoomSlider_->Layout({0, top, bounds.right, bounds.bottom});
@@ -469,12 +489,18 @@ void ChannelContainerView::LayoutChildren()
 
 // Drawing: only the frames around the sample views and the empty state;
 // the waveforms are the sample views' own.
-void ChannelContainerView::paintEvent(QPaintEvent*)
+void ChannelContainerView::paintEvent(QPaintEvent* event)
 {
+    pendingRepaint_ = QRect();
     QPainter painter(this);
-    painter.fillRect(rect(), kBackground);
-    for (SampleView* view : sampleViews_)
-        ContainerFrames::DrawViewFrame(painter, view->Frame(), view->IsFocus());
+    painter.fillRect(event->rect(), kBackground);
+    // A frame lies one pixel outside its view; frames wholly outside the
+    // exposed area are left out.
+    const QRect exposed = event->rect().adjusted(-1, -1, 1, 1);
+    for (SampleView* view : sampleViews_) {
+        if (view->geometry().intersects(exposed))
+            ContainerFrames::DrawViewFrame(painter, view->Frame(), view->IsFocus());
+    }
     if (sampleViews_.empty())
         ContainerFrames::DrawEmptyState(painter, Bounds(), zoomSliderHeight_, font());
 }

@@ -109,6 +109,9 @@ public:
 
     /// Redraws every channel view.
     void UpdateAll();
+    /// Repaints area (container coordinates), children included, together
+    /// with every area asked for since the last paint, as one rectangle.
+    void RepaintArea(const QRect& area);
     /// Views for added and removed channels; a redraw for changed data.
     void ObserverNotified(Observable* source, uint32_t mask, const Message* data) override;
 
@@ -197,6 +200,7 @@ private:
     // Channels were added since the slider was last told of the count.
     bool sliderCheckPending_ = false;
     int64_t layoutPasses_ = 0;  // LayoutChildren runs, to see one in a call
+    QRect pendingRepaint_;  // RepaintArea's areas since the last paint
 };
 
 }  // namespace glimmet

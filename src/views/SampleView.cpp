@@ -37,7 +37,11 @@ SampleView::SampleView(Channel* channel, ChannelContainerView* container, QWidge
       summaries_(channel, rowTable_.data())
 {
     setObjectName("sample view");
-    setAttribute(Qt::WA_OpaquePaintEvent);
+    // Not marked opaque, although the picture covers the whole view: Qt cuts
+    // every opaque sibling out of a repaint region one by one, so that a
+    // repaint of the whole container would cost the square of the channel
+    // count. The container beneath fills the view's area first, which its
+    // picture then covers.
     // Focus comes with a click, so that no channel is focused when a window
     // opens.
     setFocusPolicy(Qt::ClickFocus);
@@ -136,7 +140,14 @@ void SampleView::Update(ViewRect rect)
         RenderColumns(rect);
     const int left = int(std::floor(rect.left));
     const int top = int(std::floor(rect.top));
-    update(QRect(QPoint(left, top), QPoint(int(std::ceil(rect.right)), int(std::ceil(rect.bottom)))));
+    const QRect area(QPoint(left, top), QPoint(int(std::ceil(rect.right)), int(std::ceil(rect.bottom))));
+    // Inside its container the repaint is asked of the container, which
+    // gathers the areas of many views into one rectangle: Qt would otherwise
+    // keep one piece per view and cut each view's share out of all of them.
+    if (parentWidget() == container_)
+        container_->RepaintArea(area.translated(pos()));
+    else
+        update(area);
 }
 
 void SampleView::RenderColumns(const ViewRect& rect)

@@ -3,6 +3,11 @@
 #include <algorithm>
 #include <vector>
 
+#include <QEvent>
+#include <QObject>
+#include <QPaintEvent>
+#include <QRegion>
+
 #include "AppTestSupport.h"
 #include "sound/ChannelManager.h"
 #include "views/ChannelContainerView.h"
@@ -105,6 +110,107 @@ TEST(ManyChannelsWindow, AppendingAFileDrawsOnlyTheViewsOfItsChannels)
     const int64_t added = ColumnsRenderedBy(container, 2 * kFileChannels, 3 * kFileChannels);
     EXPECT_LE(added, kFileChannels * (width + 20));
     EXPECT_GE(added, kFileChannels * width);
+}
+
+/// Watches one widget's paint events: how many came and how many
+/// rectangles the region of the largest one had.
+class PaintWatcher : public QObject {
+public:
+    explicit PaintWatcher(QWidget* widget) { widget->installEventFilter(this); }
+
+    void Reset()
+    {
+        paints_ = 0;
+        mostRects_ = 0;
+    }
+    int Paints() const { return paints_; }
+    int MostRects() const { return mostRects_; }
+
+protected:
+    bool eventFilter(QObject*, QEvent* event) override
+    {
+        if (event->type() == QEvent::Paint) {
+            paints_++;
+            mostRects_ = std::max(mostRects_, int(static_cast<QPaintEvent*>(event)->region().rectCount()));
+        }
+        return false;
+    }
+
+private:
+    int paints_ = 0;
+    int mostRects_ = 0;
+};
+
+QuillexWindow* WindowWithChannels(AppFixture& fixture, int files, int channelsPerFile)
+{
+    const std::filesystem::path file = fixture.Dir() / "many.wav";
+    WriteWav(file, Channels(channelsPerFile, 500));
+    QuillexWindow* window = OpenWindow(fixture);
+    window->SetAppendOnLoad(true);
+    for (int i = 0; i < files; ++i) {
+        window->OpenFile(file);
+        Drain();
+    }
+    return window;
+}
+
+// The views leave the area beneath them to the container, so that Qt need
+// not cut each view out of the region it repaints: cutting them one by one
+// costs the square of the channel count. A repaint of the whole container
+// is then one rectangle, however many views it holds.
+TEST(ManyChannelsWindow, RepaintingTheWholeContainerKeepsItsRegionOneRectangle)
+{
+    AppFixture fixture;
+    QuillexWindow* window = WindowWithChannels(fixture, 2, 32);
+    ChannelContainerView& container = *window->ContainerView();
+    ASSERT_EQ(container.CountChannelViews(), 64);
+    PaintWatcher watcher(&container);
+
+    container.update();
+    Drain();
+
+    EXPECT_GE(watcher.Paints(), 1);
+    EXPECT_EQ(watcher.MostRects(), 1);
+}
+
+// Removing a channel moves every view below it. The moves are not gathered
+// into a dirty region of two pieces per view: the container is repainted
+// whole, in one rectangle, and each view once.
+TEST(ManyChannelsWindow, RemovingAChannelRepaintsTheContainerInOneRectangle)
+{
+    AppFixture fixture;
+    QuillexWindow* window = WindowWithChannels(fixture, 2, 32);
+    ChannelContainerView& container = *window->ContainerView();
+    ASSERT_EQ(container.CountChannelViews(), 64);
+    PaintWatcher containerWatcher(&container);
+    PaintWatcher viewWatcher(container.SampleViewAtIndex(40));
+
+    ASSERT_TRUE(window->Manager()->RemoveChannelAt(0));
+    Drain();
+
+    ASSERT_EQ(container.CountChannelViews(), 63);
+    EXPECT_GE(containerWatcher.Paints(), 1);
+    EXPECT_EQ(containerWatcher.MostRects(), 1);
+    EXPECT_EQ(viewWatcher.Paints(), 1);
+}
+
+// Selecting all re-renders every view at once; their repaints reach Qt as
+// one rectangle, not as a piece per view, and each view is painted once.
+TEST(ManyChannelsWindow, SelectingAllRepaintsTheViewsInOneRectangle)
+{
+    AppFixture fixture;
+    QuillexWindow* window = WindowWithChannels(fixture, 2, 32);
+    ChannelContainerView& container = *window->ContainerView();
+    ASSERT_EQ(container.CountChannelViews(), 64);
+    PaintWatcher containerWatcher(&container);
+    PaintWatcher viewWatcher(container.SampleViewAtIndex(40));
+
+    container.SelectAll();
+    Drain();
+
+    EXPECT_GE(containerWatcher.Paints(), 1);
+    EXPECT_EQ(containerWatcher.MostRects(), 1);
+    EXPECT_EQ(viewWatcher.Paints(), 1);
 }
 
 }  // namespace
