@@ -28,6 +28,9 @@ void SoakChannelRules::Insert(SoakChannelState& c, const SoakSamples& frames, in
     if (frames.Empty())
         return;
     const int64_t end = End(c);
+    const int64_t grown = at >= end ? at - c.first + frames.Size() : c.samples.Size() + frames.Size() + std::max<int64_t>(c.first - at, 0);
+    if (grown > kLongestData)
+        return;
     if (at >= c.first && at < end) {
         c.samples.Insert(at - c.first, frames);
     } else if (at >= end) {
@@ -65,8 +68,10 @@ void SoakChannelRules::Replace(SoakChannelState& c, const SoakSamples& frames, i
             fresh.AppendZeros(c.first - to - 1);
             fresh.Append(c.samples);
         }
-        c.first = from;
     }
+    if (fresh.Size() > kLongestData)
+        return;
+    c.first = std::min(from, c.first);
     c.samples = std::move(fresh);
 }
 

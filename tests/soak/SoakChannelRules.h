@@ -22,6 +22,11 @@ struct SoakChannelState {
 /// channel that never held data.
 class SoakChannelRules {
 public:
+    /// The most frames a channel holds: an edit that would make it longer
+    /// leaves it as it was (an undo of a Truncate far before frame 0 can ask
+    /// for more).
+    static constexpr int64_t kLongestData = int64_t(UINT32_MAX);
+
     static int64_t End(const SoakChannelState& c) { return c.first + c.samples.Size(); }
 
     /// False, leaving buffer alone, for a request starting exactly at the end.

@@ -87,6 +87,8 @@ void SoakModel::Insert(SoakChannel& c, const SoakSamples& frames, int64_t at)
 {
     if (frames.Empty())
         return;
+    if (frames.Size() > SoakChannelRules::kLongestData)
+        return;
     if (!c.hasData) {
         // Nothing to keep: the frames become the data where they go.
         c.state.samples = frames;
@@ -99,7 +101,7 @@ void SoakModel::Insert(SoakChannel& c, const SoakSamples& frames, int64_t at)
 
 void SoakModel::Replace(SoakChannel& c, const SoakSamples& frames, int64_t from, int64_t to)
 {
-    if (frames.Empty() || from > to || from < 0)
+    if (frames.Empty() || from > to || from < 0 || frames.Size() > SoakChannelRules::kLongestData)
         return;
     if (!c.hasData) {
         c.state.samples = frames;
