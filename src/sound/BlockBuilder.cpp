@@ -98,6 +98,11 @@ void BlockBuilder::AppendRepeated(int16_t sample, int64_t count, const BlockRef&
 {
     const bool shareable = repeated != nullptr && repeated->Count() == kBlockSamples;
     while (ok_ && count > 0) {
+        // Once the block at the seam is full it goes, so that the rest of
+        // the run shares the repeated block again instead of filling fresh
+        // blocks all the way (billions of zeros would take gigabytes).
+        if (pendingCount_ == kBlockSamples)
+            FlushPending();
         if (pendingCount_ == 0 && count >= kBlockSamples && shareable) {
             list_.Append(repeated);
             count -= kBlockSamples;

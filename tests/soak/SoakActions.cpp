@@ -4,7 +4,6 @@
 #include <cmath>
 #include <limits>
 
-#include "edit/ModelChannel.h"
 #include "edit/TransformReference.h"
 
 namespace glimmet::test {
@@ -36,21 +35,21 @@ void SoakActions::Pass(SoakModel& model, const SoakRecord& r, int64_t history,
     for (SoakChannel& c : model.channels) {
         if (!c.state.selected)
             continue;
-        std::vector<int16_t> filled;
-        if (ModelChannel::Fill(c.state, filled, r.start - history, n + history))
-            buffer = filled;
+        SoakSamples filled;
+        if (SoakChannelRules::Fill(c.state, filled, r.start - history, n + history))
+            buffer = filled.ToVector();
         if (history == 0) {
             // The working buffer is the range itself, transformed in place.
             change(buffer);
             if (write)
-                SoakModel::Replace(c, buffer, r.start, r.end);
+                SoakModel::Replace(c, SoakSamples(buffer), r.start, r.end);
             continue;
         }
         // The filter keeps what it read and writes its output elsewhere.
         std::vector<int16_t> output = buffer;
         change(output);
         if (write)
-            SoakModel::Replace(c, output, r.start, r.end);
+            SoakModel::Replace(c, SoakSamples(output), r.start, r.end);
     }
 }
 
@@ -119,7 +118,7 @@ void SoakActions::Stretch(SoakModel& model, const SoakRecord& r)
         return;
     for (SoakChannel& c : model.channels) {
         if (c.state.selected)
-            SoakModel::Replace(c, std::vector<int16_t>(size_t(count), 0), r.start, r.end);
+            SoakModel::Replace(c, SoakSamples::Zeros(count), r.start, r.end);
     }
 }
 
@@ -152,7 +151,7 @@ void SoakActions::Paste(SoakModel& model, SoakRecord& r)
     if (!r.hadBuffer)
         return;
     r.pasted = 0;
-    const int64_t frames = int64_t(model.copyBuffer[0].size());
+    const int64_t frames = model.copyBuffer[0].Size();
     const bool replace = r.firstChannel >= 0 && r.start >= 0 && r.start <= r.end;
     // Inserting goes into the channel focused now, which for a redo may not
     // be the one focused when the paste was first made; with none focused
@@ -183,7 +182,7 @@ void SoakActions::Truncate(SoakModel& model, const SoakRecord& r)
     for (SoakChannel& c : model.channels) {
         if (!c.state.selected)
             continue;
-        SoakModel::Remove(c, r.end + 1, ModelChannel::End(c.state) - 1);
+        SoakModel::Remove(c, r.end + 1, SoakChannelRules::End(c.state) - 1);
         SoakModel::Remove(c, 0, r.start - 1);
         c.state.selected = false;
     }

@@ -6,7 +6,6 @@
 #include <cmath>
 #include <string>
 
-#include "edit/ModelChannel.h"
 #include "files/DocumentLoader.h"
 #include "files/DocumentSaver.h"
 #include "sound/Channel.h"
@@ -68,24 +67,27 @@ std::vector<std::vector<int16_t>> SoakFiles::SaveMix(const std::vector<SoakChann
 {
     int64_t total = 0;
     for (const SoakChannel& c : channels)
-        total = std::max(total, ModelChannel::End(c.state));
+        total = std::max(total, SoakChannelRules::End(c.state));
     std::vector<std::vector<int16_t>> mix(2, std::vector<int16_t>(size_t(total), 0));
     // The save asks for the mix a buffer at a time, and the mixer reads
     // every channel's part of it as one request, with the quirks of such a
     // read: a part that cannot be read (it starts exactly at the channel's
     // end) is silence, and so is one that ends exactly at its first frame.
     std::vector<std::vector<int16_t>> parts(channels.size());
+    SoakSamples part;
     for (int64_t t0 = 0; t0 < total; t0 += kFramesPerBuffer) {
         const int64_t n = std::min(kFramesPerBuffer, total - t0);
         for (size_t k = 0; k < channels.size(); k++) {
-            if (!ModelChannel::Fill(channels[k].state, parts[k], t0, n))
+            if (SoakChannelRules::Fill(channels[k].state, part, t0, n))
+                parts[k] = part.ToVector();
+            else
                 parts[k].assign(size_t(n), 0);
         }
         for (int64_t i = 0; i < n; i++) {
             Side left;
             Side right;
             for (size_t k = 0; k < channels.size(); k++) {
-                const ChannelState& c = channels[k].state;
+                const SoakChannelState& c = channels[k].state;
                 if (c.muted)
                     continue;
                 const float value = float(parts[k][size_t(i)]) * 3.0517578125e-05f;
@@ -105,7 +107,7 @@ std::vector<SoakChannel> SoakFiles::Opened(const std::vector<std::vector<int16_t
 {
     std::vector<SoakChannel> opened(2);
     for (size_t k = 0; k < 2; k++) {
-        opened[k].state.samples = mix[k];
+        opened[k].state.samples = SoakSamples(mix[k]);
         opened[k].state.first = 0;
         opened[k].state.pan = k == 0 ? Channel::kPanLeft : Channel::kPanRight;
     }
@@ -125,6 +127,10 @@ std::string SoakFiles::SaveAndReopen(TestDocument& document, HistoryManager& his
 {
     if (model.Total() == 0)
         return "Save skipped: nothing to save";
+    // Undoing a Truncate of a range far before frame 0 can leave billions
+    // of silent frames, which would be gigabytes of file and of mix.
+    if (model.Total() > kLongestSave)
+        return "Save skipped: " + std::to_string(model.Total()) + " frames";
     const std::filesystem::path path = TemporaryPath("saved.wav");
     bool written = false;
     DocumentSaver::SaveFile(path, &document.manager, &history, &written);

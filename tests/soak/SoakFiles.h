@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "SoakModel.h"
+#include "edit/TestDocument.h"
 #include "edit/HistoryManager.h"
 
 namespace glimmet::test {
@@ -16,6 +17,8 @@ class SoakFiles {
 public:
     /// Frames the save mixes at a time.
     static constexpr int64_t kFramesPerBuffer = 1024;
+    /// Longer documents are not saved: their file would not be a soak's.
+    static constexpr int64_t kLongestSave = int64_t(1) << 24;
     /// The stereo 16-bit mix of channels from frame 0 to the end of the
     /// longest: left samples, then right samples.
     static std::vector<std::vector<int16_t>> SaveMix(const std::vector<SoakChannel>& channels);

@@ -5,7 +5,6 @@
 #include <limits>
 
 #include "SoakActions.h"
-#include "edit/ModelChannel.h"
 #include "sound/Channel.h"
 #include "support/FrameArithmetic.h"
 
@@ -55,7 +54,7 @@ int64_t SoakModel::Total() const
 {
     int64_t total = 0;
     for (const SoakChannel& c : channels)
-        total = std::max(total, ModelChannel::End(c.state));
+        total = std::max(total, SoakChannelRules::End(c.state));
     return total;
 }
 
@@ -84,9 +83,11 @@ SoakChannel* SoakModel::WithId(uint64_t id)
     return nullptr;
 }
 
-void SoakModel::Insert(SoakChannel& c, const std::vector<int16_t>& frames, int64_t at)
+void SoakModel::Insert(SoakChannel& c, const SoakSamples& frames, int64_t at)
 {
-    if (frames.empty())
+    if (frames.Empty())
+        return;
+    if (frames.Size() > SoakChannelRules::kLongestData)
         return;
     if (!c.hasData) {
         // Nothing to keep: the frames become the data where they go.
@@ -95,12 +96,12 @@ void SoakModel::Insert(SoakChannel& c, const std::vector<int16_t>& frames, int64
         c.hasData = true;
         return;
     }
-    ModelChannel::Insert(c.state, frames, at);
+    SoakChannelRules::Insert(c.state, frames, at);
 }
 
-void SoakModel::Replace(SoakChannel& c, const std::vector<int16_t>& frames, int64_t from, int64_t to)
+void SoakModel::Replace(SoakChannel& c, const SoakSamples& frames, int64_t from, int64_t to)
 {
-    if (frames.empty() || from > to || from < 0)
+    if (frames.Empty() || from > to || from < 0 || frames.Size() > SoakChannelRules::kLongestData)
         return;
     if (!c.hasData) {
         c.state.samples = frames;
@@ -108,19 +109,19 @@ void SoakModel::Replace(SoakChannel& c, const std::vector<int16_t>& frames, int6
         c.hasData = true;
         return;
     }
-    ModelChannel::Replace(c.state, frames, from, to);
+    SoakChannelRules::Replace(c.state, frames, from, to);
 }
 
 void SoakModel::Remove(SoakChannel& c, int64_t from, int64_t to)
 {
-    const int64_t end = ModelChannel::End(c.state);
+    const int64_t end = SoakChannelRules::End(c.state);
     if (from < 0 || from > to || from > end)
         return;
     // Both cutting branches build the data again, even when nothing is cut,
     // which gives a data-less channel an empty array of its own.
     if (c.state.first <= from || std::min(to, end - 1) >= c.state.first)
         c.hasData = true;
-    ModelChannel::Remove(c.state, from, to);
+    SoakChannelRules::Remove(c.state, from, to);
 }
 
 SoakRecord SoakModel::Bind(Kind kind, int64_t cursor, int32_t focused)
@@ -133,26 +134,26 @@ SoakRecord SoakModel::Bind(Kind kind, int64_t cursor, int32_t focused)
     r.focused = focused;
     const int64_t n = r.end - r.start + 1;
     for (size_t i = 0; i < channels.size(); i++) {
-        const ChannelState& c = channels[i].state;
+        const SoakChannelState& c = channels[i].state;
         if (!c.selected)
             continue;
         if (kind == Kind::Truncate) {
             SoakRecord::Kept k{int32_t(i), c.first, false, {}, {}};
             if (c.first <= r.start) {
                 k.hasHead = true;
-                if (!ModelChannel::Fill(c, k.head, c.first, r.start - c.first))
-                    k.head.assign(size_t(r.start - c.first), 0);
+                if (!SoakChannelRules::Fill(c, k.head, c.first, r.start - c.first))
+                    k.head = SoakSamples::Zeros(r.start - c.first);
             }
-            const int64_t tail = ModelChannel::End(c) - r.end - 1;
-            if (tail > 0 && !ModelChannel::Fill(c, k.tail, r.end + 1, tail))
-                k.tail.assign(size_t(tail), 0);
+            const int64_t tail = SoakChannelRules::End(c) - r.end - 1;
+            if (tail > 0 && !SoakChannelRules::Fill(c, k.tail, r.end + 1, tail))
+                k.tail = SoakSamples::Zeros(tail);
             r.kept.push_back(k);
         } else if (n >= 1) {
-            std::vector<int16_t> data;
+            SoakSamples data;
             // A transform's range starting before frame 0 is never written
             // back, so its frames need not be kept (they may be billions).
-            if (!(IsTransform(kind) && r.start < 0) && !ModelChannel::Fill(c, data, r.start, n))
-                data.assign(size_t(n), 0);
+            if (!(IsTransform(kind) && r.start < 0) && !SoakChannelRules::Fill(c, data, r.start, n))
+                data = SoakSamples::Zeros(n);
             r.snapshot.emplace_back(int32_t(i), data);
         }
     }
@@ -232,17 +233,17 @@ bool SoakModel::Redo()
 bool SoakModel::Copy()
 {
     const int64_t n = rangeEnd - rangeStart + 1;
-    std::vector<std::vector<int16_t>> copied;
+    std::vector<SoakSamples> copied;
     for (const SoakChannel& c : channels) {
         if (!c.state.selected)
             continue;
         if (n < 1)
             return false;
-        std::vector<int16_t> data;
+        SoakSamples data;
         // A range starting exactly at a channel's end reads nothing from it
         // ("what the....?"): its part of the copy is silence.
-        if (!ModelChannel::Fill(c.state, data, rangeStart, n))
-            data.assign(size_t(n), int16_t(0));
+        if (!SoakChannelRules::Fill(c.state, data, rangeStart, n))
+            data = SoakSamples::Zeros(n);
         copied.push_back(std::move(data));
     }
     if (copied.empty())
@@ -292,7 +293,7 @@ void SoakModel::UndoRecord(SoakRecord& r)
     for (const auto& entry : r.snapshot)
         indexes.push_back(entry.first);
     Walk(indexes, [&](SoakChannel& c, size_t k) {
-        const std::vector<int16_t>& data = r.snapshot[k].second;
+        const SoakSamples& data = r.snapshot[k].second;
         if (r.kind == Kind::Remove)
             Insert(c, data, r.start);
         else
@@ -311,7 +312,7 @@ void SoakModel::UndoTruncate(const SoakRecord& r)
         c.state.first = std::max<int64_t>(kept.first, 0);
         if (kept.hasHead)
             Insert(c, kept.head, kept.first);
-        if (!kept.tail.empty())
+        if (!kept.tail.Empty())
             Insert(c, kept.tail, r.end + 1);
     });
     RestoreRange(r);

@@ -5,18 +5,18 @@
 #include <string>
 #include <vector>
 
+#include "SoakChannelRules.h"
 #include "SoakEffects.h"
-#include "edit/TestDocument.h"
 
 namespace glimmet::test {
 
-/// One channel of the model document: plain samples on a timeline, with the
+/// One channel of the model document: samples on a timeline, with the
 /// flags the user sets, and whether it ever held data. A channel added by
 /// "Add Channel" holds none: the first edit that writes into it places its
 /// frames where they were written instead of after silence from frame 0.
 struct SoakChannel {
     uint64_t id = 0;
-    ChannelState state;
+    SoakChannelState state;
     bool hasData = true;
 };
 
@@ -35,7 +35,7 @@ struct SoakRecord {
     /// Channel index and its range at binding time; empty when the range
     /// has no frames or starts before frame 0 for a transform (nothing of it
     /// can be written back there).
-    std::vector<std::pair<int32_t, std::vector<int16_t>>> snapshot;
+    std::vector<std::pair<int32_t, SoakSamples>> snapshot;
     // Paste: what Go found.
     int64_t pasteStart = 0;
     int64_t pasteEnd = 0;
@@ -47,8 +47,8 @@ struct SoakRecord {
         int32_t index;
         int64_t first;
         bool hasHead;
-        std::vector<int16_t> head;
-        std::vector<int16_t> tail;
+        SoakSamples head;
+        SoakSamples tail;
     };
     std::vector<Kept> kept;
     // Move: which channel and by how much the drag moved it back.
@@ -71,14 +71,14 @@ struct SoakRecord {
 const char* SoakKindName(SoakRecord::Kind kind);
 
 /// The document as the user expects it after each edit, changed by the
-/// edits' own rules written out again over plain vectors, with a history of
+/// edits' own rules written out again over compact samples, with a history of
 /// records mirroring the undo and redo stacks.
 class SoakModel {
 public:
     std::vector<SoakChannel> channels;
     int64_t rangeStart = -1;
     int64_t rangeEnd = -1;
-    std::vector<std::vector<int16_t>> copyBuffer;
+    std::vector<SoakSamples> copyBuffer;
     /// The focused channel when an action runs (-1: none). A paste that
     /// inserts reads it then, also when redone, not when it was bound.
     int32_t focus = -1;
@@ -108,8 +108,8 @@ public:
     bool Copy();
 
     // The channel edits with the data-less case of a fresh channel.
-    static void Insert(SoakChannel& c, const std::vector<int16_t>& frames, int64_t at);
-    static void Replace(SoakChannel& c, const std::vector<int16_t>& frames, int64_t from, int64_t to);
+    static void Insert(SoakChannel& c, const SoakSamples& frames, int64_t at);
+    static void Replace(SoakChannel& c, const SoakSamples& frames, int64_t from, int64_t to);
     static void Remove(SoakChannel& c, int64_t from, int64_t to);
 
 private:

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <sstream>
 
+#include "SoakComparison.h"
 #include "SoakDialogs.h"
 #include "SoakFiles.h"
 
@@ -18,7 +19,6 @@
 #include "edit/RevertPhasesAction.h"
 #include "edit/SelectionCopier.h"
 #include "edit/TruncateAction.h"
-#include "edit/ModelChannel.h"
 #include "sound/SampleBlock.h"
 #include "support/FrameArithmetic.h"
 
@@ -51,37 +51,6 @@ std::unique_ptr<Action> MakeAction(Kind kind, const CopyBuffer* copyBuffer)
     return nullptr;
 }
 
-/// A channel as the program can see it, read span by span, as the mixer and
-/// the views read it.
-ChannelState Observe(Channel* channel)
-{
-    ChannelState state;
-    state.first = channel->FirstFrame();
-    state.selected = channel->IsSelected();
-    state.muted = channel->IsMuted();
-    state.pan = channel->PanPosition();
-    channel->ReadSpans(0, channel->FrameCount(), [&state](const SampleSpan& span) {
-        state.samples.insert(state.samples.end(), span.samples, span.samples + span.count);
-    });
-    return state;
-}
-
-std::string Mismatch(size_t index, const ChannelState& seen, const ChannelState& expected)
-{
-    std::ostringstream out;
-    out << "channel " << index << ": ";
-    if (seen.first != expected.first || seen.samples.size() != expected.samples.size())
-        out << "first frame " << seen.first << ", " << seen.samples.size() << " frames; expected "
-            << expected.first << ", " << expected.samples.size();
-    else if (seen.samples != expected.samples) {
-        const auto at = std::mismatch(seen.samples.begin(), seen.samples.end(), expected.samples.begin());
-        out << "sample " << (at.first - seen.samples.begin()) << " is " << *at.first << ", expected " << *at.second;
-    } else {
-        out << "flags " << seen << "; expected " << expected;
-    }
-    return out.str();
-}
-
 /// The actions made with a dialog, whose parameters the record carries.
 bool HasDialog(Kind kind)
 {
@@ -107,7 +76,9 @@ SoakSession::SoakSession(uint64_t seed) : random_(seed)
         Channel* channel = document_.AddChannel(RandomSamples(samples, length), first, true);
         channel->SetPanPosition(pans[c]);
         channel->SetMuted(c == 1);
-        model_.channels.push_back({channel->Id(), TestDocument::StateOf(channel), true});
+        const ChannelState state = TestDocument::StateOf(channel);
+        model_.channels.push_back(
+            {channel->Id(), {SoakSamples(state.samples), state.first, state.selected, state.muted, state.pan}, true});
     }
     document_.SetRange(0, 10);
     model_.SetRangeStart(0);
@@ -133,9 +104,9 @@ std::string SoakSession::Difference()
             out << "channel " << i << " is not the expected one";
             return out.str();
         }
-        const ChannelState seen = Observe(channel);
-        if (!(seen == expected.state))
-            return Mismatch(size_t(i), seen, expected.state);
+        const std::string difference = SoakComparison::Difference(size_t(i), channel, expected.state);
+        if (!difference.empty())
+            return difference;
     }
     if (document_.manager.RangeStart() != model_.rangeStart || document_.manager.RangeEnd() != model_.rangeEnd) {
         out << "range " << document_.manager.RangeStart() << ".." << document_.manager.RangeEnd() << ", expected "
@@ -264,9 +235,10 @@ std::string SoakSession::ForeignCopy(const SoakStep& step)
     std::vector<CopyBuffer::Samples> arrays;
     model_.copyBuffer.clear();
     for (size_t c = 0; c < channels; c++) {
-        model_.copyBuffer.push_back(RandomSamples(samples, frames));
+        const std::vector<int16_t> random = RandomSamples(samples, frames);
+        model_.copyBuffer.push_back(SoakSamples(random));
         arrays.push_back(Channel::Allocate(int64_t(frames)));
-        std::copy(model_.copyBuffer.back().begin(), model_.copyBuffer.back().end(), arrays.back().get());
+        std::copy(random.begin(), random.end(), arrays.back().get());
     }
     copyBuffer_.SetCopyBuffer(std::move(arrays), int64_t(frames));
     return "a copy from elsewhere: " + std::to_string(channels) + " x " + std::to_string(frames) + " frames";
