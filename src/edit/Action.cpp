@@ -286,11 +286,11 @@ bool Action::SupportsConfiguration()
     return false;
 }
 
-void Action::VisitKeptBlocks(const BlockVisitor& visit) const
+void Action::VisitKeptLists(const ListVisitor& visit) const
 {
     for (const SavedChannel& record : savedChannels_) {
         for (const SampleSlice* slice : {&record.data, &record.redo, &record.undone}) {
-            slice->blocks.ForEachBlock(visit);
+            visit(slice->blocks);
         }
     }
 }

@@ -71,12 +71,11 @@ public:
     /// shares with a channel count nothing.
     int64_t SnapshotBytes() const;
 
-    /// Calls visit once for every block reference the action keeps for its
-    /// undo and redo (a block kept twice is visited twice). The history
-    /// counts these to find the blocks only it holds; a reference left out
-    /// only keeps its block in memory.
-    using BlockVisitor = std::function<void(const BlockRef& block)>;
-    virtual void VisitKeptBlocks(const BlockVisitor& visit) const;
+    /// Calls visit once for every block list the action keeps for its undo
+    /// and redo. The history counts their references to find the blocks only
+    /// it holds; a list left out only keeps its blocks in memory.
+    using ListVisitor = std::function<void(const BlockList& list)>;
+    virtual void VisitKeptLists(const ListVisitor& visit) const;
 
     /// An uninitialised sample array of count samples, or null when count is
     /// not a size a channel can hold (below 1 or above 2^32 - 1) or memory

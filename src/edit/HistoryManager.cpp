@@ -114,9 +114,9 @@ bool HistoryManager::IsSaved()
 
 void HistoryManager::Trim()
 {
-    std::vector<const BlockRef*> kept;
+    std::vector<const BlockList*> kept;
     const auto collect = [&kept](const Entry& entry) {
-        entry.action->VisitKeptBlocks([&kept](const BlockRef& block) { kept.push_back(&block); });
+        entry.action->VisitKeptLists([&kept](const BlockList& list) { kept.push_back(&list); });
     };
     // Farthest from the document's state first: the next undo needs the top
     // of the undo stack and the next redo the top of the redo stack, so

@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <unistd.h>
 #include <unordered_map>
+#include <unordered_set>
 
 #include "sound/SpillFile.h"
 
@@ -52,18 +53,31 @@ int64_t HistorySpill::DefaultBudget()
     return int64_t(pages) * pageSize / 4;
 }
 
-void HistorySpill::Trim(const std::vector<const BlockRef*>& kept)
+void HistorySpill::Trim(const std::vector<const BlockList*>& kept)
 {
+    // A run of references held by none but the history's lists is the
+    // history's alone; blocks reach a channel or the copy buffer only
+    // through runs of theirs, which their lists hold.
+    std::unordered_map<const void*, long> runHolders;
+    for (const BlockList* list : kept)
+        list->ForEachRun([&runHolders](const void* run, long, const std::vector<BlockRef>&) { ++runHolders[run]; });
     std::unordered_map<const SampleBlock*, KeptBlock> counts;
-    counts.reserve(kept.size());
+    std::unordered_set<const void*> counted;
     size_t order = 0;
-    for (const BlockRef* ref : kept) {
-        // A block kept by several entries is ranked by the nearest of them,
-        // the one that will need it first.
-        KeptBlock& entry = counts[ref->get()];
-        entry.ref = ref;
-        entry.order = order++;
-        ++entry.references;
+    for (const BlockList* list : kept) {
+        list->ForEachRun([&](const void* run, long holders, const std::vector<BlockRef>& blocks) {
+            // Each run holds one reference per place a block has in it,
+            // however many lists share the run.
+            const bool countHere = holders == runHolders[run] && counted.insert(run).second;
+            for (const BlockRef& ref : blocks) {
+                // A block kept by several entries is ranked by the nearest
+                // of them, the one that will need it first.
+                KeptBlock& entry = counts[ref.get()];
+                entry.ref = &ref;
+                entry.order = order++;
+                entry.references += countHere ? 1 : 0;
+            }
+        });
     }
     // Blocks held by nothing but the history: a channel, the copy buffer, a
     // reader or the worker would each add a reference of their own.

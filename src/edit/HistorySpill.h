@@ -9,6 +9,7 @@
 #include <thread>
 #include <vector>
 
+#include "sound/BlockList.h"
 #include "sound/SampleBlock.h"
 
 namespace glimmet {
@@ -41,11 +42,11 @@ public:
     void SetBudget(int64_t bytes) { budget_ = bytes < 0 ? 0 : bytes; }
     int64_t Budget() const { return budget_; }
 
-    /// kept holds every reference the history keeps, the entries farthest
+    /// kept holds every block list the history keeps, the entries farthest
     /// from the document's state first (repeats included; a block counts as
     /// where it last appears). Drops what is already written and queues more
     /// for writing until the history's resident blocks fit the budget.
-    void Trim(const std::vector<const BlockRef*>& kept);
+    void Trim(const std::vector<const BlockList*>& kept);
 
     /// Called on the worker thread whenever it has written everything it
     /// was given, so the owner can have Trim run again on its own thread.

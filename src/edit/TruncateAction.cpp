@@ -113,12 +113,12 @@ const char* TruncateAction::Name()
     return "Truncate";
 }
 
-void TruncateAction::VisitKeptBlocks(const BlockVisitor& visit) const
+void TruncateAction::VisitKeptLists(const ListVisitor& visit) const
 {
-    Action::VisitKeptBlocks(visit);
+    Action::VisitKeptLists(visit);
     for (const KeptChannel& record : records_) {
         for (const SampleSlice* slice : {&record.head, &record.tail}) {
-            slice->blocks.ForEachBlock(visit);
+            visit(slice->blocks);
         }
     }
 }

@@ -23,7 +23,7 @@ public:
     status_t Undo() override;
     status_t Redo() override;
     const char* Name() override;
-    void VisitKeptBlocks(const BlockVisitor& visit) const override;
+    void VisitKeptLists(const ListVisitor& visit) const override;
 
     int32_t KeptChannelCount() const { return int32_t(records_.size()); }
 

@@ -82,6 +82,18 @@ public:
         }
     }
 
+    /// Calls f(const void* run, long holders, const std::vector<BlockRef>&
+    /// blocks) for every run of references in order, with how many lists
+    /// hold it: that is what tells whose a block is, since a block's own
+    /// count sees each run that holds it once, however many lists share the
+    /// run. The count may change while another thread copies such a list.
+    template <typename F>
+    void ForEachRun(F&& f) const
+    {
+        for (const std::shared_ptr<Run>& run : runs_)
+            f(static_cast<const void*>(run.get()), run.use_count(), run->blocks);
+    }
+
     /// Copies the samples index .. index + count - 1 (which must lie in the
     /// list) to destination.
     void CopyOut(int64_t index, int64_t count, int16_t* destination) const;

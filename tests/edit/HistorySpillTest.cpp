@@ -228,6 +228,48 @@ TEST_F(HistorySpillTest, WhatTheNextUndoNeedsStaysInMemoryLongest)
     EXPECT_EQ(history.Undo(), B_OK);
 }
 
+/// Blocks of the document that are not resident.
+int64_t DroppedBlocks(ChannelManager& manager)
+{
+    int64_t dropped = 0;
+    for (int32_t c = 0; Channel* channel = manager.ChannelAt(c); c++) {
+        channel->ReadSpans(0, channel->FrameCount(), [&dropped](const SampleSpan& span) {
+            dropped += span.block->IsResident() ? 0 : 1;
+        });
+    }
+    return dropped;
+}
+
+TEST_F(HistorySpillTest, BlocksTheDocumentSharesWithTheHistoryStayInMemory)
+{
+    // Long enough for whole runs of block references: after the fade the
+    // document and the fade's record of its result hold the same runs (after
+    // the undo, of what it undid), and those blocks are the document's,
+    // whatever their own counts say.
+    const int64_t frames = int64_t(3 * BlockList::kRunBlocks) * BlockBuilder::kBlockSamples + 777;
+    Samples samples(static_cast<size_t>(frames));
+    for (int64_t i = 0; i < frames; i++)
+        samples[size_t(i)] = int16_t(i * 7 % 20011 - 10000);
+    for (int c = 0; c < kChannels; c++)
+        document.AddChannel(samples);
+    document.SetRange(0, frames - 1);
+    HistoryManager history;
+    history.SetMemoryBudget(0);
+    Perform<FadeInAction>(document, history);
+    const Document faded = Read(document.manager);
+    history.SettleMemory();
+    EXPECT_EQ(DroppedBlocks(document.manager), 0) << "after the fade";
+    ASSERT_EQ(history.Undo(), B_OK);
+    history.SettleMemory();
+    ASSERT_GE(history.SpillDescriptor(), 0) << "nothing was ever moved out";
+    EXPECT_EQ(DroppedBlocks(document.manager), 0) << "after the undo";
+    EXPECT_EQ(Read(document.manager), Document(size_t(kChannels), samples));
+    ASSERT_EQ(history.Redo(), B_OK);
+    history.SettleMemory();
+    EXPECT_EQ(DroppedBlocks(document.manager), 0) << "after the redo";
+    EXPECT_EQ(Read(document.manager), faded);
+}
+
 int64_t FileBytes(int fd)
 {
     struct stat status {};
@@ -239,13 +281,11 @@ TEST(HistorySpillPause, TheWorkerLeavesTheFileAloneWhilePaused)
     HistorySpill spill;
     spill.SetBudget(0);
     const std::vector<int16_t> samples(size_t(BlockBuilder::kBlockSamples), 7);
-    std::vector<BlockRef> blocks;
+    // This list plays the history's: nothing else holds its blocks.
+    BlockList blocks;
     for (int i = 0; i < 16; i++)
-        blocks.push_back(SampleBlock::CopyOf(samples.data(), int64_t(samples.size())));
-    std::vector<const BlockRef*> kept;
-    // These references play the history's: nothing else holds the blocks.
-    for (const BlockRef& block : blocks)
-        kept.push_back(&block);
+        blocks.Append(SampleBlock::CopyOf(samples.data(), int64_t(samples.size())));
+    const std::vector<const BlockList*> kept{&blocks};
     spill.Pause();
     spill.Trim(kept);
     ASSERT_GE(spill.FileDescriptor(), 0) << "nothing was handed to the worker";
@@ -254,10 +294,9 @@ TEST(HistorySpillPause, TheWorkerLeavesTheFileAloneWhilePaused)
     EXPECT_EQ(FileBytes(spill.FileDescriptor()), 0);
     spill.Resume();
     spill.WaitUntilWritten();
-    EXPECT_EQ(FileBytes(spill.FileDescriptor()), int64_t(blocks.size()) * blocks.front()->Bytes());
+    EXPECT_EQ(FileBytes(spill.FileDescriptor()), blocks.Count() * int64_t(sizeof(int16_t)));
     spill.Trim(kept);
-    for (const BlockRef& block : blocks)
-        EXPECT_FALSE(block->IsResident());
+    blocks.ForEachBlock([](const BlockRef& block) { EXPECT_FALSE(block->IsResident()); });
 }
 
 /// Mixing reads the channels the whole time while the history writes
