@@ -185,8 +185,10 @@ std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* t
     }
 
     // Providing the pages of a long file's blocks is a good part of the
-    // work of loading it; another core does it ahead of the decoding.
-    PoolWarmer warmer(BlockPool::Shared(), size_t(claimed / int64_t(BlockPool::kBlockBytes)), kWarmAheadBlocks);
+    // work of loading it; another core does it ahead of the decoding. A
+    // short file is done before a second thread would have started.
+    const size_t pooledBlocks = size_t(claimed / int64_t(BlockPool::kBlockBytes));
+    PoolWarmer warmer(BlockPool::Shared(), pooledBlocks >= kWarmAheadBlocks ? pooledBlocks : 0, kWarmAheadBlocks);
     DecodedBlocks blocks{int32_t(channelCount)};
     int64_t seekTo = 0;
     track->SeekToFrame(&seekTo, 0);

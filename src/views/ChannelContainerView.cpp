@@ -16,6 +16,7 @@
 #include "views/ContainerFrames.h"
 #include "views/SampleView.h"
 #include "views/ViewColors.h"
+#include "views/ViewStack.h"
 #include "views/WheelNavigator.h"
 #include "views/ZoomSlider.h"
 
@@ -419,9 +420,7 @@ QSize ChannelContainerView::minimumSizeHint() const
     int height = kMinimumHeight;
     if (zoomSlider_ != nullptr)
         height += zoomSlider_->minimumSizeHint().height();
-    for (const SampleView* view : sampleViews_)
-        height += view->minimumSizeHint().height() + kFrameAllowance;
-    return {0, height};
+    return {0, height + ViewStack::MinimumHeight(sampleViews_, kFrameAllowance)};
 }
 
 QSize ChannelContainerView::sizeHint() const
@@ -463,23 +462,7 @@ void ChannelContainerView::LayoutChildren()
     const ViewRect bounds = Bounds();
     if (zoomSlider_ != nullptr)
         zoomSliderHeight_ = float(zoomSlider_->minimumSizeHint().height());
-    const float count = float(sampleViews_.size());
-    const float channelHeight = (bounds.Height() - zoomSliderHeight_ - 2 * count) / count;
-    // Every view is repainted whole after a layout anyway; with updates off
-    // while they are placed, Qt does not gather each moved view's old and
-    // new area into one ever larger dirty region, which costs the square of
-    // the channel count.
-    const bool updatesWereEnabled = updatesEnabled();
-    if (updatesWereEnabled)
-        setUpdatesEnabled(false);
-    float previousBottom = 0;
-    for (size_t i = 0; i < sampleViews_.size(); ++i) {
-        const float top = i == 0 ? 1 : previousBottom + 3;
-        const float bottom = i == 0 ? channelHeight : previousBottom + 3 + channelHeight;
-        previousBottom = sampleViews_[i]->Layout({1, top, bounds.right - 1, bottom}).bottom;
-    }
-    if (updatesWereEnabled)
-        setUpdatesEnabled(true);
+    const float previousBottom = ViewStack::Place(*this, sampleViews_, bounds, zoomSliderHeight_);
     if (zoomSlider_ != nullptr) {
         const float top = sampleViews_.empty() ? bounds.bottom - zoomSliderHeight_ + 1 : previousBottom + 2;
         zoomSlider_->Layout({0, top, bounds.right, bounds.bottom});
