@@ -10,10 +10,8 @@
 #include "files/MediaTrack.h"
 #include "files/MemoryBudget.h"
 #include "sound/BlockBuilder.h"
-#include "sound/BlockPool.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
-#include "sound/PoolWarmer.h"
 #include "support/Diagnostics.h"
 #include "support/MessageCodes.h"
 
@@ -22,8 +20,6 @@ namespace glimmet {
 namespace {
 
 constexpr const char* kTitlePrefix = "Glimmet - ";
-/// How far ahead of the decoding block memory is faulted in: a few slabs.
-constexpr size_t kWarmAheadBlocks = 256;
 
 bool IsAudio(const media_format& format)
 {
@@ -184,11 +180,6 @@ std::vector<std::unique_ptr<Channel>> DocumentLoader::LoadChannels(MediaTrack* t
         return {};
     }
 
-    // Providing the pages of a long file's blocks is a good part of the
-    // work of loading it; another core does it ahead of the decoding. A
-    // short file is done before a second thread would have started.
-    const size_t pooledBlocks = size_t(claimed / int64_t(BlockPool::kBlockBytes));
-    PoolWarmer warmer(BlockPool::Shared(), pooledBlocks >= kWarmAheadBlocks ? pooledBlocks : 0, kWarmAheadBlocks);
     DecodedBlocks blocks{int32_t(channelCount)};
     int64_t seekTo = 0;
     track->SeekToFrame(&seekTo, 0);

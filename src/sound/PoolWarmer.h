@@ -9,13 +9,14 @@ namespace glimmet {
 
 class BlockPool;
 
-/// Faults in a pool's blocks on a thread of its own, a few MiB ahead of a
-/// thread about to allocate a known number of them in a row (the loader of
-/// a long file), so that the kernel's work of providing the pages runs on
-/// another core while the decoding goes on.
+/// Faults in a pool's blocks on a thread of its own, a batch ahead of a
+/// thread about to allocate a known number of them in a row (a long
+/// read-back of blocks the history moved to its file), so that the kernel's
+/// work of providing the pages runs on another core while the reading goes
+/// on.
 ///
-/// It never makes more blocks warm than are still to be needed, so a load
-/// holds no more memory with it than without it.
+/// It never makes more blocks warm than are still to be needed, so the
+/// work holds no more memory with it than without it.
 class PoolWarmer {
 public:
     PoolWarmer(BlockPool& pool, size_t blocksNeeded, size_t blocksAhead);

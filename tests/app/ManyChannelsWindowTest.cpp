@@ -154,16 +154,28 @@ QuillexWindow* WindowWithChannels(AppFixture& fixture, int files, int channelsPe
     return window;
 }
 
+// A window of 64 channels, two files of 32, laid out and drawn.
+class SixtyFourChannels : public ::testing::Test {
+protected:
+    void SetUp() override
+    {
+        window = WindowWithChannels(fixture, 2, 32);
+        ASSERT_EQ(window->ContainerView()->CountChannelViews(), 64);
+    }
+
+    ChannelContainerView& Container() { return *window->ContainerView(); }
+
+    AppFixture fixture;
+    QuillexWindow* window = nullptr;
+};
+
 // The views leave the area beneath them to the container, so that Qt need
 // not cut each view out of the region it repaints: cutting them one by one
 // costs the square of the channel count. A repaint of the whole container
 // is then one rectangle, however many views it holds.
-TEST(ManyChannelsWindow, RepaintingTheWholeContainerKeepsItsRegionOneRectangle)
+TEST_F(SixtyFourChannels, RepaintingTheWholeContainerKeepsItsRegionOneRectangle)
 {
-    AppFixture fixture;
-    QuillexWindow* window = WindowWithChannels(fixture, 2, 32);
-    ChannelContainerView& container = *window->ContainerView();
-    ASSERT_EQ(container.CountChannelViews(), 64);
+    ChannelContainerView& container = Container();
     PaintWatcher watcher(&container);
 
     container.update();
@@ -176,12 +188,9 @@ TEST(ManyChannelsWindow, RepaintingTheWholeContainerKeepsItsRegionOneRectangle)
 // Removing a channel moves every view below it. The moves are not gathered
 // into a dirty region of two pieces per view: the container is repainted
 // whole, in one rectangle, and each view once.
-TEST(ManyChannelsWindow, RemovingAChannelRepaintsTheContainerInOneRectangle)
+TEST_F(SixtyFourChannels, RemovingAChannelRepaintsTheContainerInOneRectangle)
 {
-    AppFixture fixture;
-    QuillexWindow* window = WindowWithChannels(fixture, 2, 32);
-    ChannelContainerView& container = *window->ContainerView();
-    ASSERT_EQ(container.CountChannelViews(), 64);
+    ChannelContainerView& container = Container();
     PaintWatcher containerWatcher(&container);
     PaintWatcher viewWatcher(container.SampleViewAtIndex(40));
 
@@ -196,12 +205,9 @@ TEST(ManyChannelsWindow, RemovingAChannelRepaintsTheContainerInOneRectangle)
 
 // Selecting all re-renders every view at once; their repaints reach Qt as
 // one rectangle, not as a piece per view, and each view is painted once.
-TEST(ManyChannelsWindow, SelectingAllRepaintsTheViewsInOneRectangle)
+TEST_F(SixtyFourChannels, SelectingAllRepaintsTheViewsInOneRectangle)
 {
-    AppFixture fixture;
-    QuillexWindow* window = WindowWithChannels(fixture, 2, 32);
-    ChannelContainerView& container = *window->ContainerView();
-    ASSERT_EQ(container.CountChannelViews(), 64);
+    ChannelContainerView& container = Container();
     PaintWatcher containerWatcher(&container);
     PaintWatcher viewWatcher(container.SampleViewAtIndex(40));
 
