@@ -145,6 +145,7 @@ public:
     int64_t PeriodsServed() const { return periods_.PeriodsServed(); }
     int64_t LongestPeriodMicros() const { return periods_.LongestPeriodMicros(); }
     PlaymarkRelay& Relay() { return relay_; }
+    const PlaymarkRelay& Relay() const { return relay_; }
 
 private:
     bool IsOurSource(const MediaSource& source) const { return negotiator_.IsOurSource(source); }

@@ -1,5 +1,6 @@
 #include "playback/PlaybackController.h"
 
+#include "playback/AudioProducer.h"
 #include "playback/PlaybackWindow.h"
 #include "sound/ChannelManager.h"
 #include "support/Diagnostics.h"
@@ -44,7 +45,7 @@ bool PlaybackController::MessageReceived(const Message& message)
             TogglePlayback(message);
             return true;
         case kMsgStop:
-            Stop();
+            Stop(message);
             return true;
         case kMsgUpdatePlaymark:
             UpdatePlaymark(message);
@@ -98,8 +99,10 @@ void PlaybackController::TogglePlayback(const Message& message)
     playing_ = !playing_;
 }
 
-void PlaybackController::Stop()
+void PlaybackController::Stop(const Message& message)
 {
+    if (IsFromAnEndedRun(message))
+        return;
     if (playing_) {
         graph_.StopNodes();
         view_->SetPlayModeButtonMode(1);
@@ -107,18 +110,30 @@ void PlaybackController::Stop()
     }
     manager_->ResetCurrentFrame();
     view_->SetPlaymarkFrame(manager_->CurrentFrame());
+    // Updates the stopped playback posted before it stopped may still be on
+    // their way; were they shown, the mark would jump back from the start.
+    if (AudioProducer* producer = graph_.Producer())
+        producer->Relay().BeginNewRun();
 }
 
 void PlaybackController::UpdatePlaymark(const Message& message)
 {
     int64_t frame = 0;
-    if (message.FindInt64(kFieldCurrentFrame, &frame) != B_OK)
+    if (message.FindInt64(kFieldCurrentFrame, &frame) != B_OK || IsFromAnEndedRun(message))
         return;
     // One move at a time: the view acknowledges each with 'pmup'.
     if (!playmarkAcknowledged_)
         return;
     view_->SetPlaymarkFrame(frame);
     playmarkAcknowledged_ = false;
+}
+
+bool PlaybackController::IsFromAnEndedRun(const Message& message) const
+{
+    const AudioProducer* producer = graph_.Producer();
+    int32_t run = 0;
+    return producer != nullptr && message.FindInt32(kFieldPlaybackRun, &run) == B_OK &&
+           run != producer->Relay().CurrentRun();
 }
 
 void PlaybackController::SetPlayMode()

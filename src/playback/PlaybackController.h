@@ -49,8 +49,11 @@ private:
     void Play();
     void PlayFromCursor();
     void TogglePlayback(const Message& message);
-    void Stop();
+    void Stop(const Message& message);
     void UpdatePlaymark(const Message& message);
+    /// True for an update or a stop posted by a playback that has since
+    /// been stopped; messages without a run come from the window itself.
+    bool IsFromAnEndedRun(const Message& message) const;
     void SetPlayMode();
     void SetLoop();
 

@@ -33,12 +33,12 @@ PlaymarkRelay::~PlaymarkRelay()
 // have filled the rest.
 void PlaymarkRelay::Post(int64_t currentFrame, int64_t time)
 {
-    Store(Update{false, currentFrame, time}, kCapacity - 1);
+    Store(Update{false, CurrentRun(), currentFrame, time}, kCapacity - 1);
 }
 
 void PlaymarkRelay::PostStop()
 {
-    Store(Update{true, 0, 0}, kCapacity);
+    Store(Update{true, CurrentRun(), 0, 0}, kCapacity);
 }
 
 void PlaymarkRelay::Store(const Update& update, size_t limit)
@@ -91,12 +91,15 @@ void PlaymarkRelay::Deliver(const Update& update)
     if (window_ == nullptr)
         return;
     if (update.stop) {
-        window_->PostMessage(kMsgStop);
+        Message stop(kMsgStop);
+        stop.AddInt32(kFieldPlaybackRun, update.run);
+        window_->PostMessage(stop);
         return;
     }
     Message message(kMsgUpdatePlaymark);
     message.AddInt64(kFieldCurrentFrame, update.currentFrame);
     message.AddInt64(kFieldTime, update.time);
+    message.AddInt32(kFieldPlaybackRun, update.run);
     window_->PostMessage(message);
 }
 

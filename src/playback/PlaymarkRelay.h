@@ -21,6 +21,12 @@ class MessageTarget;
 /// with "current frame" and "time", or a bare 'stop', and posts it to the
 /// window. Sharing one ring keeps the stop in its place among the updates.
 ///
+/// Every entry carries the run it was posted in ("playback run"). The window
+/// begins a new run when it stops playback, so entries that were still on
+/// their way (in the ring or in the window's queue) can be told apart from
+/// those of the next playback and passed over: a stop puts the play mark
+/// back at the beginning and keeps it there.
+///
 /// Thread use: constructed, destroyed and drained on one thread with a Qt
 /// event loop (the window's); Post is called by one other thread at a time
 /// (the audio thread).
@@ -44,12 +50,19 @@ public:
     /// Window thread: posts every queued update now. Also run by the wake-up.
     void Drain();
 
+    /// Window thread, once the producer has stopped: what is posted from
+    /// now on belongs to a new run.
+    void BeginNewRun() { run_.fetch_add(1, std::memory_order_relaxed); }
+    /// The run that entries posted now belong to.
+    int32_t CurrentRun() const { return run_.load(std::memory_order_relaxed); }
+
     /// Entries lost because the window did not drain in time.
     int64_t DroppedUpdates() const { return dropped_.load(std::memory_order_relaxed); }
 
 private:
     struct Update {
         bool stop;
+        int32_t run;
         int64_t currentFrame;
         int64_t time;
     };
@@ -70,6 +83,7 @@ private:
     std::atomic<size_t> tail_{0};
     std::atomic<bool> wakePending_{false};
     std::atomic<int64_t> dropped_{0};
+    std::atomic<int32_t> run_{0};
 };
 
 }  // namespace glimmet

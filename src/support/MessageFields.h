@@ -28,6 +28,8 @@ inline constexpr const char* kFieldMode = "mode";
 inline constexpr const char* kFieldEnable = "enable";
 /// When a play position was reached, in microseconds of system time.
 inline constexpr const char* kFieldTime = "time";
+/// Which playback a play-position update or an end-of-range stop came from.
+inline constexpr const char* kFieldPlaybackRun = "playback run";
 
 // Files.
 inline constexpr const char* kFieldRefs = "refs";
