@@ -1,10 +1,15 @@
 #pragma once
 
 #include <chrono>
+#include <cstdlib>
+#include <filesystem>
 #include <cstdio>
 #include <cstring>
 #include <vector>
 
+#include "files/MediaFile.h"
+#include "files/MediaFormat.h"
+#include "files/MediaTrack.h"
 #include "sound/Channel.h"
 #include "sound/SampleBlock.h"
 
@@ -39,6 +44,29 @@ inline double MemcpyNanoseconds(size_t bytes, int rounds, int repetitions)
         std::memcpy(target.data(), source.data(), bytes);
         asm volatile("" : : "r"(target.data()) : "memory");
     });
+}
+
+/// Reads every frame of the file's first track and keeps none: what opening
+/// costs before anything is stored. Aborts when the file cannot be read.
+inline void DecodeOnly(const std::filesystem::path& file)
+{
+    MediaFile media(file);
+    MediaTrack* track = media.TrackAt(0);
+    media_format format;
+    format.type = B_MEDIA_RAW_AUDIO;
+    format.raw_audio.format = B_AUDIO_SHORT;
+    if (track == nullptr || track->DecodedFormat(&format) != B_OK)
+        std::abort();
+    const int16_t* frames = nullptr;
+    int64_t count = 0;
+    int64_t total = 0;
+    while (track->ReadFramesInPlace(&frames, &count) == B_OK) {
+        asm volatile("" : : "r"(frames) : "memory");
+        total += count;
+    }
+    if (total <= 0)
+        std::abort();
+    media.ReleaseTrack(track);
 }
 
 /// Seconds in a steady-clock duration.

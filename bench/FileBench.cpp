@@ -21,13 +21,12 @@
 #include "files/DocumentLoader.h"
 #include "files/DocumentSaver.h"
 #include "files/FrameWriter.h"
-#include "files/MediaFile.h"
-#include "files/MediaFormat.h"
-#include "files/MediaTrack.h"
 #include "sound/BlockPool.h"
 #include "sound/Channel.h"
 #include "sound/ChannelManager.h"
 #include "sound/SampleAllocator.h"
+
+#include "BenchSupport.h"
 
 namespace {
 
@@ -145,29 +144,6 @@ std::function<void()> Command(const std::string& command)
     };
 }
 
-/// Reads every frame of the file's first track and keeps none: what opening
-/// costs before anything is stored.
-void DecodeOnly(const std::filesystem::path& file)
-{
-    MediaFile media(file);
-    MediaTrack* track = media.TrackAt(0);
-    media_format format;
-    format.type = B_MEDIA_RAW_AUDIO;
-    format.raw_audio.format = B_AUDIO_SHORT;
-    if (track == nullptr || track->DecodedFormat(&format) != B_OK)
-        std::abort();
-    const int16_t* frames = nullptr;
-    int64_t count = 0;
-    int64_t total = 0;
-    while (track->ReadFramesInPlace(&frames, &count) == B_OK) {
-        benchmark::DoNotOptimize(frames);
-        total += count;
-    }
-    if (total <= 0)
-        std::abort();
-    media.ReleaseTrack(track);
-}
-
 void BM_OpenOneHourWav(benchmark::State& state)
 {
     const auto& file = SourceFile();
@@ -195,7 +171,7 @@ void BM_OpenOneHourWav(benchmark::State& state)
             SampleAllocator::Shared().ReleaseCached();
             BlockPool::Shared().ReleaseFree();
             const double baselineSeconds = SecondsOf(ffmpeg);
-            const double bareSeconds = SecondsOf([&] { DecodeOnly(file); });
+            const double bareSeconds = SecondsOf([&] { bench::DecodeOnly(file); });
             ours = round == 0 ? seconds : std::min(ours, seconds);
             baseline = round == 0 ? baselineSeconds : std::min(baseline, baselineSeconds);
             bare = round == 0 ? bareSeconds : std::min(bare, bareSeconds);

@@ -25,9 +25,6 @@
 #include "app/BatchRunner.h"
 #include "app/QuillexWindow.h"
 #include "files/DocumentLoader.h"
-#include "files/MediaFile.h"
-#include "files/MediaFormat.h"
-#include "files/MediaTrack.h"
 #include "sound/BlockPool.h"
 #include "sound/ChannelManager.h"
 #include "sound/SampleAllocator.h"
@@ -133,28 +130,6 @@ double LoadBare(const std::filesystem::path& file)
     });
 }
 
-/// Reads every frame of the file's first track and keeps none.
-double DecodeOnly(const std::filesystem::path& file)
-{
-    return SecondsOf([&] {
-        MediaFile media(file);
-        MediaTrack* track = media.TrackAt(0);
-        media_format format;
-        format.type = B_MEDIA_RAW_AUDIO;
-        format.raw_audio.format = B_AUDIO_SHORT;
-        if (track == nullptr || track->DecodedFormat(&format) != B_OK)
-            std::exit(1);
-        const int16_t* frames = nullptr;
-        int64_t count = 0;
-        int64_t total = 0;
-        while (track->ReadFramesInPlace(&frames, &count) == B_OK)
-            total += count;
-        if (total <= 0)
-            std::exit(1);
-        media.ReleaseTrack(track);
-    });
-}
-
 int Main(int argc, char** argv)
 {
     if (qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM"))
@@ -174,7 +149,7 @@ int Main(int argc, char** argv)
         ReleaseMemory();
         const double b = LoadBare(file);
         ReleaseMemory();
-        const double d = DecodeOnly(file);
+        const double d = SecondsOf([&] { bench::DecodeOnly(file); });
         const double f = SecondsOf([&] { Run(ffmpeg); });
         std::printf("round %d: window %.3f s, bare load %.3f s, bare decode %.3f s, ffmpeg %.3f s\n", round + 1, w,
             b, d, f);
