@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <cmath>
+#include <system_error>
+#include <thread>
 
 #include <QApplication>
 #include <QKeyEvent>
@@ -181,14 +183,46 @@ void SampleView::RenderColumns(const ViewRect& rect)
         drawnFrom_ = std::move(source);
     }
     const int32_t rows = int32_t(bounds.Height() + 1);
-    WaveformRenderer renderer(bitmap_, rowTable_.data(), rows, scene);
     // Summaries are made after the picture, so a long channel's first
     // picture costs one reading of its samples and not more.
     wantedSummaries_.clear();
-    renderer.DeferSummaries(&wantedSummaries_);
-    renderedColumns_ += renderer.RenderColumns(rect.left, int32_t(rect.right - rect.left + 1), &drawn_);
+    renderedColumns_ += RenderColumnRun(scene, rows, rect.left, int32_t(rect.right - rect.left + 1));
     if (!wantedSummaries_.empty())
         summaries_.Request(spans_, wantedSummaries_);
+}
+
+// The first picture of a long channel reads every sample it shows; the
+// right half of the columns is read on a second core meanwhile.
+int32_t SampleView::RenderColumnRun(const WaveformScene& scene, int32_t rows, float left, int32_t count)
+{
+    // Sized here, so that neither half resizes the memo under the other.
+    if (drawn_.size() != size_t(bitmap_.width()))
+        drawn_.assign(size_t(bitmap_.width()), RenderedColumn{});
+    WaveformRenderer first(bitmap_, rowTable_.data(), rows, scene);
+    first.DeferSummaries(&wantedSummaries_);
+    if (left < 0 || count < 2 || double(count) * scene.framesPerColumn < kFramesWorthASecondThread)
+        return first.RenderColumns(left, count, &drawn_);
+
+    // Both renderers take the bitmap's pixels here, on this thread. Then each
+    // writes only its own columns and their memo entries, and the blocks
+    // both read never change.
+    const int32_t firstCount = count / 2;
+    WaveformRenderer second(bitmap_, rowTable_.data(), rows, scene);
+    std::vector<const SampleBlock*> wantedBySecond;
+    second.DeferSummaries(&wantedBySecond);
+    int32_t renderedBySecond = 0;
+    std::thread helper;
+    try {
+        helper = std::thread([&] {
+            renderedBySecond = second.RenderColumns(left + float(firstCount), count - firstCount, &drawn_);
+        });
+    } catch (const std::system_error&) {
+        return first.RenderColumns(left, count, &drawn_);
+    }
+    const int32_t rendered = first.RenderColumns(left, firstCount, &drawn_);
+    helper.join();
+    wantedSummaries_.insert(wantedSummaries_.end(), wantedBySecond.begin(), wantedBySecond.end());
+    return rendered + renderedBySecond;
 }
 
 bool SampleView::IsFocus() const

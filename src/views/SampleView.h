@@ -31,6 +31,11 @@ class SampleView : public MessageView {
     Q_OBJECT
 
 public:
+    /// A render reading at least this many frames (about 95 s of sound, 4 ms
+    /// or more of work) is split between two threads. A cursor step or a
+    /// range drag reads far less and is not worth starting one.
+    static constexpr double kFramesWorthASecondThread = double(int64_t(1) << 22);
+
     /// Time source in microseconds; system_time() unless a test replaces it.
     using Clock = int64_t (*)();
 
@@ -94,6 +99,9 @@ private:
 
     void BuildRowTable(int32_t rows);
     void RenderColumns(const ViewRect& rect);
+    /// Renders count columns from left, on two threads when they read
+    /// enough frames to be worth it; returns how many it rendered.
+    int32_t RenderColumnRun(const WaveformScene& scene, int32_t rows, float left, int32_t count);
     /// The key as one character of the original key map (arrows 0x1c to
     /// 0x1f, Delete 0x7f); 0 for a key that produces no character.
     static int KeyByte(const QKeyEvent* event);
