@@ -60,6 +60,7 @@ SampleView::~SampleView() = default;
 
 ViewRect SampleView::Layout(const ViewRect& frame)
 {
+    placed_ = true;
     inLayout_ = true;
     PlaceAt(frame);
     inLayout_ = false;
@@ -138,8 +139,8 @@ void SampleView::Update(ViewRect rect)
     if (rect.bottom < bounds.top)
         return;
 
-    if (!bitmap_.isNull())
-        RenderColumns(rect);
+    if (!bitmap_.isNull() && !AwaitingLayout())
+        NotePending(rect);
     const int left = int(std::floor(rect.left));
     const int top = int(std::floor(rect.top));
     const QRect area(QPoint(left, top), QPoint(int(std::ceil(rect.right)), int(std::ceil(rect.bottom))));
@@ -191,6 +192,52 @@ void SampleView::RenderColumns(const ViewRect& rect)
         summaries_.Request(spans_, wantedSummaries_);
 }
 
+// The columns RenderColumns would render for rect.
+void SampleView::NotePending(const ViewRect& rect)
+{
+    const int32_t first = int32_t(rect.left);
+    const int32_t last = int32_t(rect.left + float(int32_t(rect.right - rect.left + 1) - 1));
+    if (last < first)
+        return;
+    if (pendingLast_ < pendingFirst_) {
+        pendingFirst_ = first;
+        pendingLast_ = last;
+    } else {
+        pendingFirst_ = std::min(pendingFirst_, first);
+        pendingLast_ = std::max(pendingLast_, last);
+    }
+}
+
+void SampleView::RenderPending()
+{
+    if (pendingLast_ < pendingFirst_)
+        return;
+    ViewRect rect = Bounds();
+    rect.left = float(pendingFirst_);
+    rect.right = float(pendingLast_);
+    pendingFirst_ = 0;
+    pendingLast_ = -1;
+    if (!bitmap_.isNull() && !AwaitingLayout() && channel_ != nullptr && container_ != nullptr)
+        RenderColumns(rect);
+}
+
+int64_t SampleView::RenderedColumns()
+{
+    RenderPending();
+    return renderedColumns_;
+}
+
+const QImage& SampleView::Bitmap()
+{
+    RenderPending();
+    return bitmap_;
+}
+
+bool SampleView::AwaitingLayout() const
+{
+    return !placed_ && parentWidget() == container_;
+}
+
 // The first picture of a long channel reads every sample it shows; the
 // right half of the columns is read on a second core meanwhile.
 int32_t SampleView::RenderColumnRun(const WaveformScene& scene, int32_t rows, float left, int32_t count)
@@ -238,7 +285,9 @@ void SampleView::MessageReceived(const Message& message)
 
 void SampleView::paintEvent(QPaintEvent* event)
 {
-    if (!bitmap_.isNull()) {
+    // Until then the container's background shows where the view will be.
+    RenderPending();
+    if (!bitmap_.isNull() && !AwaitingLayout()) {
         QPainter painter(this);
         painter.drawImage(event->rect(), bitmap_, event->rect());
     }

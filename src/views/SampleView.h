@@ -53,16 +53,19 @@ public:
 
     /// Brings the whole view up to date: for changed data or display range.
     void Update();
-    /// Brings the columns of rect up to date (always over the full height)
-    /// and schedules a repaint of it. The image is kept between renders, so
-    /// only columns whose frames, range, cursor or play mark state changed
-    /// since they were last rendered are rendered again; a change of the
-    /// channel's data, first frame or of the view's size renders them all.
+    /// Marks the columns of rect (always over the full height) to be brought
+    /// up to date and schedules a repaint of it. The columns are rendered
+    /// when the view is next painted, or its image or render count read, so
+    /// that display ranges passing before the window draws cost nothing. The
+    /// image is kept between renders, so only columns whose frames, range,
+    /// cursor or play mark state changed since they were last rendered are
+    /// rendered again; a change of the channel's data, first frame or of the
+    /// view's size renders them all.
     void Update(ViewRect rect);
 
     /// Columns rendered since the view was made: lets tests see that an
-    /// update rendered only what changed.
-    int64_t RenderedColumns() const { return renderedColumns_; }
+    /// update rendered only what changed. Renders what is pending first.
+    int64_t RenderedColumns();
     /// Makes the summaries renders asked for, which otherwise happens while
     /// the window is idle.
     SummaryBuilder& Summaries() { return summaries_; }
@@ -70,7 +73,8 @@ public:
 
     /// The off-screen image: one pixel per view pixel, null when it could not
     /// be made.
-    const QImage& Bitmap() const { return bitmap_; }
+    /// Renders what is pending first.
+    const QImage& Bitmap();
     /// The pixel row of a sample value.
     int32_t RowOf(int16_t sample) const;
 
@@ -102,6 +106,14 @@ private:
     /// Renders count columns from left, on two threads when they read
     /// enough frames to be worth it; returns how many it rendered.
     int32_t RenderColumnRun(const WaveformScene& scene, int32_t rows, float left, int32_t count);
+    /// A view its container has made but not placed yet renders nothing:
+    /// the layout, already on its way, renders the whole picture at the
+    /// size it gives.
+    bool AwaitingLayout() const;
+    /// Adds the columns rect touches to those waiting for a render.
+    void NotePending(const ViewRect& rect);
+    /// Renders the columns waiting since the last render.
+    void RenderPending();
     /// The key as one character of the original key map (arrows 0x1c to
     /// 0x1f, Delete 0x7f); 0 for a key that produces no character.
     static int KeyByte(const QKeyEvent* event);
@@ -138,6 +150,13 @@ private:
     SummaryBuilder summaries_;
     int64_t renderedColumns_ = 0;
     bool inLayout_ = false;
+    // Whether the container has placed the view yet. A view it has only
+    // just made still has the size it was made with, and a picture at that
+    // size is drawn again at once by the layout.
+    bool placed_ = false;
+    // Columns waiting for a render, first to last; none when first > last.
+    int32_t pendingFirst_ = 0;
+    int32_t pendingLast_ = -1;
     // A press was handled and its release has not come yet.
     bool pressHandled_ = false;
 };

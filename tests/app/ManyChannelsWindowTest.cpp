@@ -57,7 +57,7 @@ TEST(ManyChannelsWindow, AppendingFilesOfManyChannelsDrawsEachViewAFewTimes)
     EXPECT_LE(WholeRendersPerView(container), 6.0);
     // Every view has its place and its picture at the end.
     for (int32_t i = 0; i < container.CountChannelViews(); ++i) {
-        const SampleView* view = container.SampleViewAtIndex(i);
+        SampleView* view = container.SampleViewAtIndex(i);
         ASSERT_GT(view->height(), 0) << i;
         EXPECT_EQ(view->Bitmap().height(), view->height()) << i;
         if (i > 0) {

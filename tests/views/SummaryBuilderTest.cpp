@@ -35,11 +35,13 @@ protected:
         // Zoomed in, no column reads enough of a block to want a summary;
         // then the same samples in new blocks, which have none yet.
         fixture.container->SetDisplayRange(0, 9999);
+        Paint();
         view->Summaries().Finish();
         auto* data = new int16_t[samples.size()];
         std::copy(samples.begin(), samples.end(), data);
         ASSERT_TRUE(view->GetChannel()->SetTo(data, int64_t(samples.size())));
         fixture.container->SetDisplayRange(0, 9998);
+        Paint();
         made = view->Summaries().SummariesMade();
     }
 
@@ -55,6 +57,10 @@ protected:
 
     void ExpectAsFullRender() { ExpectRendered(fixture, 0, samples); }
 
+    /// The view renders what changed when it is painted; asking for its
+    /// image does the same at once.
+    void Paint() { view->Bitmap(); }
+
     ViewFixture fixture{302, 120};
     std::vector<int16_t> samples;
     SampleView* view = nullptr;
@@ -65,6 +71,7 @@ TEST_F(SummaryBuilderTest, TheFirstPictureReadsTheSamplesAndTheIdleWindowMakesTh
 {
     ASSERT_EQ(BlocksWithSummaries(), 0);
     fixture.container->SetDisplayRange(0, kFrames - 1);
+    Paint();
     // The picture is complete before any summary exists.
     EXPECT_EQ(BlocksWithSummaries(), 0);
     EXPECT_FALSE(view->Summaries().Idle());
@@ -84,6 +91,7 @@ TEST_F(SummaryBuilderTest, TheFirstPictureReadsTheSamplesAndTheIdleWindowMakesTh
 TEST_F(SummaryBuilderTest, SummariesFitTheHeightTheViewHasWhenTheyAreMade)
 {
     fixture.container->SetDisplayRange(0, kFrames - 1);
+    Paint();
     ASSERT_FALSE(view->Summaries().Idle());
     fixture.container->resize(302, 77);
     fixture.container->SetDisplayRange(0, kFrames - 2);
@@ -97,6 +105,7 @@ TEST_F(SummaryBuilderTest, SummariesFitTheHeightTheViewHasWhenTheyAreMade)
 TEST_F(SummaryBuilderTest, ABlockThatLeftTheChannelBeforeItsTurnIsSkipped)
 {
     fixture.container->SetDisplayRange(0, kFrames - 1);
+    Paint();
     ASSERT_FALSE(view->Summaries().Idle());
     // Every block moves: the first is rebuilt, the others start 10 frames
     // earlier than the requests say.
