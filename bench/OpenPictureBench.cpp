@@ -26,6 +26,7 @@
 #include "app/QuillexWindow.h"
 #include "files/DocumentLoader.h"
 #include "sound/BlockPool.h"
+#include "support/MessageEvent.h"
 #include "sound/ChannelManager.h"
 #include "sound/SampleAllocator.h"
 #include "views/ChannelContainerView.h"
@@ -80,18 +81,23 @@ void ReleaseMemory()
     BlockPool::Shared().ReleaseFree();
 }
 
-/// Whether both views have rendered every column of the whole hour.
+/// Whether both views show the whole hour: the document is in, the views
+/// are laid out across the window, no zoom slider message that sets their
+/// display range is on its way, and every column has been rendered (asking
+/// renders what a paint would).
 bool PictureComplete(QuillexWindow& window)
 {
     ChannelContainerView* container = window.ContainerView();
-    if (container == nullptr || window.Manager()->CountChannels() != 2)
+    if (container == nullptr || window.Manager()->CountChannels() != 2
+        || container->LastDisplayedFrame() < window.Manager()->ChannelAt(0)->FrameCount() - 1
+        || MessageEvent::CountPendingFromMainThread() != 0)
         return false;
     for (int32_t i = 0; i < 2; ++i) {
         SampleView* view = container->SampleViewAtIndex(i);
-        if (view == nullptr || view->RenderedColumns() < view->width())
+        if (view == nullptr || view->width() < container->width() / 2 || view->RenderedColumns() < view->width())
             return false;
     }
-    return container->LastDisplayedFrame() >= window.Manager()->ChannelAt(0)->FrameCount() - 1;
+    return true;
 }
 
 double OpenInWindow(const std::filesystem::path& file)
@@ -118,6 +124,10 @@ double OpenInWindow(const std::filesystem::path& file)
         std::fprintf(stderr, "the window did not show the whole picture\n");
         std::exit(1);
     }
+    // More than one width means the views drew pictures nobody saw.
+    SampleView* view = window.ContainerView()->SampleViewAtIndex(0);
+    std::printf("  columns rendered by the first view: %lld for a width of %d\n",
+        static_cast<long long>(view->RenderedColumns()), view->width());
     return seconds;
 }
 
