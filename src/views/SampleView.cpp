@@ -285,8 +285,9 @@ void SampleView::MessageReceived(const Message& message)
 
 void SampleView::paintEvent(QPaintEvent* event)
 {
-    // Until then the container's background shows where the view will be.
     RenderPending();
+    // A view not placed yet draws nothing: the container's background shows
+    // where it will be.
     if (!bitmap_.isNull() && !AwaitingLayout()) {
         QPainter painter(this);
         painter.drawImage(event->rect(), bitmap_, event->rect());
