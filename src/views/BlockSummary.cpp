@@ -92,9 +92,14 @@ void BlockSummary::CountChunks(const int16_t* samples, const int16_t* rowTable)
     uint32_t* second = first + span;
     uint32_t* third = second + span;
     uint32_t* fourth = third + span;
-    const int16_t* rows = rowTable;
-    const int32_t low = lowRow_;
-    const auto slotOf = [rows, low](int16_t sample) { return size_t(rows[IndexOf(sample)] - low); };
+    // Every sample of the block lies between rows lowRow_ and
+    // lowRow_ + rowSpan_ - 1, so its slot is its row less lowRow_; one table
+    // lookup per sample instead of a lookup and a subtraction.
+    std::vector<uint16_t> slots(kRowTableSize, 0);
+    for (int i = 0; i < kRowTableSize; ++i)
+        slots[size_t(i)] = uint16_t(std::clamp(int32_t(rowTable[i]) - lowRow_, 0, rowSpan_ - 1));
+    const uint16_t* slotTable = slots.data();
+    const auto slotOf = [slotTable](int16_t sample) { return size_t(slotTable[IndexOf(sample)]); };
     for (int64_t chunk = 0; chunk < chunks_; ++chunk) {
         const int16_t* sample = samples + chunk * chunkSize;
         // Chunks hold a multiple of four samples.

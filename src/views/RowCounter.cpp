@@ -45,8 +45,13 @@ void PrefetchSamples(const int16_t* samples, int64_t count)
 }  // namespace
 
 RowCounter::RowCounter(const int16_t* rowTable, uint32_t slots)
-    : rowTable_(rowTable), slots_(std::max<uint32_t>(slots, 1)), lastSlot_(slots_ - 1), partials_(4 * size_t(slots_), 0)
+    : rowTable_(rowTable), slots_(std::clamp<uint32_t>(slots, 1, 65536)), lastSlot_(slots_ - 1),
+      slotTable_(kRowTableSize), partials_(4 * size_t(slots_), 0)
 {
+    // A negative table entry converts to a huge slot and is clamped like
+    // any other row past the last.
+    for (int i = 0; i < kRowTableSize; ++i)
+        slotTable_[size_t(i)] = uint16_t(std::min(size_t(rowTable_[i]), size_t(lastSlot_)));
 }
 
 void RowCounter::Clear()
@@ -65,11 +70,8 @@ void RowCounter::Count(const int16_t* samples, int64_t count, uint32_t step)
 {
     uint32_t* partial = partials_.data();
     const size_t slots = slots_;
-    // A negative table entry converts to a huge slot and is clamped like
-    // any other row past the last.
-    const auto slotOf = [&](int16_t value) {
-        return std::min(size_t(rowTable_[(int32_t(value) + 32768) >> 3]), size_t(lastSlot_));
-    };
+    const uint16_t* slotTable = slotTable_.data();
+    const auto slotOf = [slotTable](int16_t value) { return size_t(slotTable[uint16_t(value ^ 0x8000) >> 3]); };
     int64_t i = 0;
     for (; i + 4 <= count; i += 4) {
         partial[slotOf(samples[i])] += step;
