@@ -73,7 +73,13 @@ void LoadQueue::StartNext()
     }
     Waiting next = std::move(waiting_.front());
     waiting_.pop_front();
-    running_ = std::make_unique<BackgroundLoad>(std::move(next.file), next.append, next.hasDocument);
+    // The worker asks for a look as soon as it is done, so a finished file
+    // is handed over at once rather than at the next poll. Posted events
+    // for this object are dropped if it goes first, and it outlives the
+    // worker anyway.
+    running_ = std::make_unique<BackgroundLoad>(std::move(next.file), next.append, next.hasDocument, [this] {
+        QMetaObject::invokeMethod(this, &LoadQueue::Poll, Qt::QueuedConnection);
+    });
     ShowProgress();
     timer_.start();
 }

@@ -24,8 +24,8 @@ BackgroundLoad::WorkerHook CurrentHook()
 
 }  // namespace
 
-BackgroundLoad::BackgroundLoad(std::filesystem::path file, bool append, bool hasDocument)
-    : file_(std::move(file)), append_(append), hasDocument_(hasDocument),
+BackgroundLoad::BackgroundLoad(std::filesystem::path file, bool append, bool hasDocument, DoneHook whenDone)
+    : file_(std::move(file)), append_(append), hasDocument_(hasDocument), whenDone_(std::move(whenDone)),
       loaded_(std::make_unique<ChannelManager>(nullptr))
 {
     worker_ = std::thread([this, hook = CurrentHook()] { Run(hook); });
@@ -56,6 +56,8 @@ void BackgroundLoad::Run(WorkerHook hook)
         status_ = DocumentLoader::Load(file_, hasDocument_ ? loaded_.get() : nullptr, append_, &report_);
     }
     done_.store(true, std::memory_order_release);
+    if (whenDone_)
+        whenDone_();
 }
 
 status_t BackgroundLoad::Finish(LoadTarget& target)

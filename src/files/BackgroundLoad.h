@@ -31,10 +31,15 @@ public:
     /// Runs in the worker before it opens the file; tests hold a load there.
     using WorkerHook = std::function<void(const std::filesystem::path&, const LoadProgress&)>;
 
+    /// Runs in the worker once it has finished (IsDone() is then true), so
+    /// that its owner can hand the result over without waiting for a poll.
+    using DoneHook = std::function<void()>;
+
     /// Starts at once. append and hasDocument are the target's flag and
     /// whether it has a document, read now: a load into a window without a
-    /// document skips the audio tracks, as the loader does.
-    BackgroundLoad(std::filesystem::path file, bool append, bool hasDocument);
+    /// document skips the audio tracks, as the loader does. whenDone may be
+    /// empty.
+    BackgroundLoad(std::filesystem::path file, bool append, bool hasDocument, DoneHook whenDone = {});
     ~BackgroundLoad();
     BackgroundLoad(const BackgroundLoad&) = delete;
     BackgroundLoad& operator=(const BackgroundLoad&) = delete;
@@ -64,6 +69,7 @@ private:
     std::filesystem::path file_;
     bool append_;
     bool hasDocument_;
+    DoneHook whenDone_;
     // Written by the worker only, read after it is joined.
     std::unique_ptr<ChannelManager> loaded_;
     LoadReport report_;

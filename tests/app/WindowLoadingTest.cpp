@@ -139,6 +139,26 @@ TEST(WindowLoading, ProgressShowsAndTheWindowKeepsWorkingWhileAFileLoads)
     EXPECT_EQ(window->windowTitle(), "Glimmet - slow.wav");
 }
 
+// The progress line is refreshed on a timer; the hand-over does not wait
+// for it. Only the load's own posted call runs here, never a timer.
+TEST(WindowLoading, AFinishedLoadIsHandedOverWithoutWaitingForTheProgressTimer)
+{
+    AppFixture fixture;
+    const auto file = fixture.MakeSound("prompt.wav", 2, 3000);
+    QuillexWindow* window = fixture.App().NewWindow();
+    window->OpenFile(file);
+    ASSERT_TRUE(window->IsLoading());
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+    while (window->IsLoading() && std::chrono::steady_clock::now() < deadline) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        QCoreApplication::sendPostedEvents(window->Loads(), QEvent::MetaCall);
+    }
+    EXPECT_FALSE(window->IsLoading());
+    ASSERT_EQ(window->Manager()->CountChannels(), 2);
+    EXPECT_EQ(window->Manager()->ChannelAt(0)->FrameCount(), 3000);
+    EXPECT_EQ(LoadQueue::CountInFlight(), 0);
+}
+
 TEST(WindowLoading, ClosingTheWindowDuringALoadGivesTheLoadUp)
 {
     AppFixture fixture;

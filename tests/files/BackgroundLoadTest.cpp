@@ -177,6 +177,32 @@ TEST_F(BackgroundLoadTest, DestroyingAnUnfinishedLoadEndsItsWorker)
     EXPECT_TRUE(sawCancel);
 }
 
+TEST_F(BackgroundLoadTest, TheDoneHookRunsOnceTheLoadIsDone)
+{
+    const auto file = fixtures.Encode("told.wav", SoundFixtures::Pattern(3000, 2), 44100, 2);
+    std::atomic<int> calls{0};
+    std::atomic<bool> doneWhenCalled{false};
+    BackgroundLoad* self = nullptr;
+    std::atomic<bool> ready{false};
+    BackgroundLoad load(file, false, true, [&] {
+        while (!ready.load())
+            std::this_thread::yield();
+        doneWhenCalled = self->IsDone();
+        ++calls;
+    });
+    self = &load;
+    ready = true;
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+    while (calls.load() == 0 && std::chrono::steady_clock::now() < deadline)
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    EXPECT_EQ(calls.load(), 1);
+    EXPECT_TRUE(doneWhenCalled.load());
+    RecordingTarget target;
+    EXPECT_EQ(load.Finish(target), B_OK);
+    EXPECT_EQ(target.manager.CountChannels(), 2);
+    EXPECT_EQ(calls.load(), 1);
+}
+
 TEST(LoadProgress, ACancelledLoadStopsReadingTheFile)
 {
     SoundFixtures fixtures;
