@@ -10,7 +10,6 @@ namespace glimmet {
 SummaryBuilder::SummaryBuilder(Channel* channel, const int16_t* rowTable) : channel_(channel), rowTable_(rowTable)
 {
     timer_.setSingleShot(true);
-    timer_.setInterval(0);
     QObject::connect(&timer_, &QTimer::timeout, this, [this] { BuildSlice(kSliceNanoseconds); });
 }
 
@@ -23,8 +22,8 @@ void SummaryBuilder::Request(std::span<const SampleSpan> spans, const std::vecto
             jobs_.push_back(Job{start - span.offset, span.block->Id()});
         start += span.count;
     }
-    if (!jobs_.empty() && !timer_.isActive())
-        timer_.start();
+    if (!jobs_.empty())
+        timer_.start(kQuietMilliseconds);
 }
 
 void SummaryBuilder::Finish()
@@ -50,7 +49,7 @@ void SummaryBuilder::BuildSlice(int64_t nanoseconds)
             break;
     }
     if (!jobs_.empty())
-        timer_.start();
+        timer_.start(0);
 }
 
 void SummaryBuilder::Build(const Job& job, uint64_t tableKey)

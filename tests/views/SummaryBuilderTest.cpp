@@ -3,6 +3,7 @@
 #include <cmath>
 #include <vector>
 
+#include <QElapsedTimer>
 #include <QTest>
 
 #include "ViewWaveformCheck.h"
@@ -86,6 +87,25 @@ TEST_F(SummaryBuilderTest, TheFirstPictureReadsTheSamplesAndTheIdleWindowMakesTh
     fixture.container->SetDisplayRange(0, kFrames - 1);
     ExpectAsFullRender();
     EXPECT_TRUE(view->Summaries().Idle());
+}
+
+TEST_F(SummaryBuilderTest, NoSummaryIsMadeWhileRendersFollowEachOther)
+{
+    QElapsedTimer clock;
+    clock.start();
+    // Renders that keep wanting summaries, every 20 ms for a third of a
+    // second, as a drag of the zoom slider would ask for them.
+    for (int64_t step = 0; clock.elapsed() < 330; ++step) {
+        fixture.container->SetDisplayRange(step % 2, kFrames - 1);
+        Paint();
+        QTest::qWait(20);
+        ASSERT_EQ(view->Summaries().SummariesMade(), made) << "after " << clock.elapsed() << " ms";
+    }
+    // Once the renders stop, the builder gets going.
+    QTRY_VERIFY_WITH_TIMEOUT(view->Summaries().SummariesMade() > made, 2000);
+    QTRY_VERIFY_WITH_TIMEOUT(view->Summaries().Idle(), 20000);
+    fixture.container->SetDisplayRange(0, kFrames - 1);
+    ExpectAsFullRender();
 }
 
 TEST_F(SummaryBuilderTest, SummariesFitTheHeightTheViewHasWhenTheyAreMade)
