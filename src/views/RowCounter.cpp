@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <cstring>
 
 #include "views/BlockSummary.h"
 
@@ -72,12 +73,19 @@ void RowCounter::Count(const int16_t* samples, int64_t count, uint32_t step)
     const size_t slots = slots_;
     const uint16_t* slotTable = slotTable_.data();
     const auto slotOf = [slotTable](int16_t value) { return size_t(slotTable[uint16_t(value ^ 0x8000) >> 3]); };
+    // Four samples per load, each table index cut out of the word: fewer
+    // loads than one per sample, and the counts do not care which set of
+    // counters a sample lands in.
+    const auto indexAt = [](uint64_t word, int shift) { return size_t((word >> shift) & 0x1fff); };
     int64_t i = 0;
     for (; i + 4 <= count; i += 4) {
-        partial[slotOf(samples[i])] += step;
-        partial[slots + slotOf(samples[i + 1])] += step;
-        partial[2 * slots + slotOf(samples[i + 2])] += step;
-        partial[3 * slots + slotOf(samples[i + 3])] += step;
+        uint64_t word;
+        std::memcpy(&word, samples + i, sizeof(word));
+        word ^= 0x8000800080008000ull;
+        partial[slotTable[indexAt(word, 3)]] += step;
+        partial[slots + slotTable[indexAt(word, 19)]] += step;
+        partial[2 * slots + slotTable[indexAt(word, 35)]] += step;
+        partial[3 * slots + slotTable[indexAt(word, 51)]] += step;
     }
     for (; i < count; ++i)
         partial[slotOf(samples[i])] += step;

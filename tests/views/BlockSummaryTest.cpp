@@ -75,6 +75,31 @@ TEST(BlockSummary, QuietBlocksGetFinerChunksThanLoudOnes)
     EXPECT_LT(quietSummary->ChunkSize(), loudSummary->ChunkSize());
 }
 
+// The block's extremes decide which rows the summary keeps; a loud sample
+// anywhere, at the start, between two vectors' worth of samples or in the
+// last few, must still be counted in its own row.
+TEST(BlockSummary, ALoneLoudSampleAnywhereIsCountedInItsRow)
+{
+    const RowTable table = TableFor(200);
+    for (int64_t count : {int64_t(256), int64_t(272), int64_t(300), int64_t(1039)}) {
+        for (int64_t position : {int64_t(0), int64_t(1), int64_t(15), int64_t(16), int64_t(17), count / 2, count - 17,
+                 int64_t(255), count - 1}) {
+            for (int16_t loud : {int16_t(32767), int16_t(-32768)}) {
+                std::shared_ptr<SampleBlock> block = NoiseBlock(count, uint32_t(count + position), 100);
+                block->MutableSamples()[position] = loud;
+                const auto summary = BlockSummary::Make(block->Samples(), block->Count(), table.data(), 1);
+                ASSERT_NE(summary, nullptr);
+                const int64_t summarised = summary->CountChunks() * summary->ChunkSize();
+                std::vector<uint32_t> counts(200, 0);
+                summary->AddChunks(counts.data(), 199, 0, summary->CountChunks());
+                const std::vector<uint16_t> expected = CountedByHand(*block, table, 200, 0, summarised);
+                for (size_t row = 0; row < counts.size(); ++row)
+                    ASSERT_EQ(uint16_t(counts[row]), expected[row]) << count << " " << position << " " << loud << " row " << row;
+            }
+        }
+    }
+}
+
 TEST(BlockSummary, RefusesBlocksOutsideItsLimits)
 {
     const RowTable table = TableFor(100);
