@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <chrono>
 #include <cstdlib>
 #include <filesystem>
@@ -15,6 +16,13 @@
 
 
 namespace glimmet::bench {
+
+/// How long the benchmark's document is: GLIMMET_BENCH_SECONDS, or an hour.
+inline int64_t DocumentSeconds()
+{
+    const char* seconds = std::getenv("GLIMMET_BENCH_SECONDS");
+    return seconds != nullptr ? std::max(1L, std::atol(seconds)) : 3600;
+}
 
 /// Best (lowest) mean wall time in nanoseconds of calling work `repetitions`
 /// times, over `rounds` rounds: the least disturbed measurement.

@@ -34,12 +34,6 @@ using namespace glimmet;
 
 constexpr int kRounds = 3;
 
-int64_t DocumentSeconds()
-{
-    const char* seconds = std::getenv("GLIMMET_BENCH_SECONDS");
-    return seconds != nullptr ? std::max(1L, std::atol(seconds)) : 3600;
-}
-
 /// A private directory for the benchmark's files, removed at exit.
 class WorkDirectory {
 public:
@@ -81,7 +75,7 @@ const std::filesystem::path& SourceFile()
     static const std::filesystem::path file = [] {
         const auto path = WorkDirectory::Path() / "hour.wav";
         const std::string command = "sox -n -r 44100 -c 2 -b 16 -e signed " + Quote(path) + " synth "
-            + std::to_string(DocumentSeconds()) + " sine 100-8000 sine 300-3000 vol 0.8";
+            + std::to_string(bench::DocumentSeconds()) + " sine 100-8000 sine 300-3000 vol 0.8";
         if (std::system(command.c_str()) != 0)
             std::abort();
         return path;

@@ -44,12 +44,6 @@ namespace {
 constexpr int kRounds = 3;
 constexpr int kColdPauseSeconds = 4;
 
-int64_t DocumentSeconds()
-{
-    const char* seconds = std::getenv("GLIMMET_BENCH_SECONDS");
-    return seconds != nullptr ? std::max(1L, std::atol(seconds)) : 3600;
-}
-
 std::string Quote(const std::filesystem::path& path)
 {
     return "'" + path.string() + "'";
@@ -67,7 +61,7 @@ void Run(const std::string& command)
 std::filesystem::path MakeSourceFile(const std::filesystem::path& directory)
 {
     const auto path = directory / "hour.wav";
-    Run("sox -n -r 44100 -c 2 -b 16 -e signed " + Quote(path) + " synth " + std::to_string(DocumentSeconds())
+    Run("sox -n -r 44100 -c 2 -b 16 -e signed " + Quote(path) + " synth " + std::to_string(bench::DocumentSeconds())
         + " sine 100-8000 sine 300-3000 vol 0.8");
     return path;
 }

@@ -42,13 +42,7 @@ namespace {
 constexpr int64_t kRate = 44100;
 constexpr int kChannels = 2;
 
-int64_t DocumentSeconds()
-{
-    const char* seconds = std::getenv("GLIMMET_BENCH_SECONDS");
-    return seconds != nullptr ? std::max(1L, std::atol(seconds)) : 3600;
-}
-
-const int64_t kFrames = DocumentSeconds() * kRate;
+const int64_t kFrames = bench::DocumentSeconds() * kRate;
 const int64_t kDocumentBytes = kChannels * kFrames * int64_t(sizeof(int16_t));
 
 double Milliseconds(std::chrono::steady_clock::duration duration)
