@@ -10,11 +10,14 @@ namespace glimmet {
 SummaryBuilder::SummaryBuilder(Channel* channel, const int16_t* rowTable) : channel_(channel), rowTable_(rowTable)
 {
     timer_.setSingleShot(true);
+    // Never early: the wait is there to let other work go first.
+    timer_.setTimerType(Qt::PreciseTimer);
     QObject::connect(&timer_, &QTimer::timeout, this, [this] { BuildSlice(kSliceNanoseconds); });
 }
 
 void SummaryBuilder::Request(std::span<const SampleSpan> spans, const std::vector<const SampleBlock*>& wanted)
 {
+    const bool wasIdle = jobs_.empty();
     const std::unordered_set<const SampleBlock*> blocks(wanted.begin(), wanted.end());
     int64_t start = 0;
     for (const SampleSpan& span : spans) {
@@ -22,7 +25,9 @@ void SummaryBuilder::Request(std::span<const SampleSpan> spans, const std::vecto
             jobs_.push_back(Job{start - span.offset, span.block->Id()});
         start += span.count;
     }
-    if (!jobs_.empty())
+    // Later requests join the work under way and do not put it off again:
+    // the play mark asks on every step.
+    if (wasIdle && !jobs_.empty())
         timer_.start(kQuietMilliseconds);
 }
 

@@ -21,10 +21,10 @@ class Channel;
 /// summaries. The picture is the same either way; only its cost changes.
 ///
 /// Work runs on the window's thread in slices of a few milliseconds, between
-/// other events, once no render has asked for a while. That thread is also
-/// the one that edits channels, so a block found in the channel at the start
-/// of a slice stays alive for the slice; a block that left the channel
-/// before its turn is simply skipped.
+/// other events, from a short while after the render that asked. That
+/// thread is also the one that edits channels, so a block found in the
+/// channel at the start of a slice stays alive for the slice; a block that
+/// left the channel before its turn is simply skipped.
 class SummaryBuilder : public QObject {
 public:
     /// rowTable (8192 entries) is the view's, read when a summary is made:
@@ -48,8 +48,8 @@ private:
 
     // A slice is short enough that input never waits noticeably for it.
     static constexpr int64_t kSliceNanoseconds = 8'000'000;
-    // The first slice waits until no render has asked for this long: a
-    // render comes with the messages that settle the window (the zoom
+    // The first slice waits this long after the render that asked: a new
+    // picture comes with the messages that settle the window (the zoom
     // slider's, a layout's), and those go first.
     static constexpr int kQuietMilliseconds = 100;
 
