@@ -99,8 +99,9 @@ TEST_F(SummaryBuilderTest, TheFirstSummaryWaitsAWhileAfterTheRenderThatAskedForI
     // The messages that settle a new picture are handled meanwhile.
     while (clock.elapsed() < 300 && view->Summaries().SummariesMade() == made) {
         QCoreApplication::processEvents(QEventLoop::AllEvents, 5);
-        if (view->Summaries().SummariesMade() != made)
+        if (view->Summaries().SummariesMade() != made) {
             EXPECT_GE(clock.elapsed(), 100);
+        }
     }
     EXPECT_GT(view->Summaries().SummariesMade(), made);
 }
