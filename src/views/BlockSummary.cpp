@@ -17,12 +17,13 @@ inline int32_t IndexOf(int16_t sample)
     return (int32_t(sample) + 32768) >> 3;
 }
 
-// Sixteen lanes of running extremes in one vector register: one sample at
-// a time, the compiler makes a chain of compares that costs more than
-// counting the whole block.
+// Eight lanes of running extremes in one vector register: one sample at a
+// time, the compiler makes a chain of compares that costs more than counting
+// the whole block. Eight, not sixteen: without AVX a wider vector does not
+// fit one register and goes through the stack at every step.
 std::pair<int16_t, int16_t> Extremes(const int16_t* samples, int64_t count)
 {
-    using Lanes = int16_t __attribute__((vector_size(32)));
+    using Lanes = int16_t __attribute__((vector_size(16)));
     constexpr int64_t kLanes = int64_t(sizeof(Lanes) / sizeof(int16_t));
     int16_t smallest = samples[0];
     int16_t largest = samples[0];
@@ -75,12 +76,10 @@ std::shared_ptr<const BlockSummary> BlockSummary::Make(const int16_t* samples, i
     // The rows the block reaches: those of the table entries between its
     // smallest and largest sample (the table need not be monotonic).
     const auto [smallest, largest] = Extremes(samples, count);
-    int32_t low = rowTable[IndexOf(smallest)];
-    int32_t high = low;
-    for (int32_t i = IndexOf(smallest); i <= IndexOf(largest); ++i) {
-        low = std::min(low, int32_t(rowTable[i]));
-        high = std::max(high, int32_t(rowTable[i]));
-    }
+    // The same for the table's entries: a loud block reaches thousands.
+    const auto [lowest, highest] = Extremes(rowTable + IndexOf(smallest), IndexOf(largest) - IndexOf(smallest) + 1);
+    const int32_t low = lowest;
+    const int32_t high = highest;
     // A row table of negative rows is not one a view builds; nothing to keep.
     if (low < 0)
         return nullptr;
@@ -98,33 +97,31 @@ std::shared_ptr<const BlockSummary> BlockSummary::Make(const int16_t* samples, i
         return summary;
     // At most a quarter of the block's samples, which are bounded above.
     summary->running_.assign(size_t(summary->chunks_ + 1) * size_t(summary->rowSpan_), uint16_t(0));
-    summary->CountChunks(samples, rowTable, IndexOf(smallest), IndexOf(largest));
+    summary->CountChunks(samples, rowTable);
     return summary;
 }
 
 // Boundary 0 stays all zero; boundary j + 1 is boundary j plus chunk j.
 // Four interleaved sets of running counts keep consecutive samples of the
 // same row from waiting on each other; a boundary holds their sum.
-void BlockSummary::CountChunks(const int16_t* samples, const int16_t* rowTable, int32_t firstIndex, int32_t lastIndex)
+void BlockSummary::CountChunks(const int16_t* samples, const int16_t* rowTable)
 {
     const int64_t chunkSize = ChunkSize();
+    const size_t low = size_t(lowRow_);
     const size_t span = size_t(rowSpan_);
-    std::vector<uint32_t> running(4 * span, 0);
+    // Counters for rows 0 .. lowRow_ + rowSpan_ - 1, of which only the
+    // block's own rows are touched: the table's row is the counter, with
+    // nothing to build or subtract per sample.
+    const size_t rows = low + span;
+    std::vector<uint32_t> running(4 * rows, 0);
     uint32_t* first = running.data();
-    uint32_t* second = first + span;
-    uint32_t* third = second + span;
-    uint32_t* fourth = third + span;
-    // Every sample of the block lies between rows lowRow_ and
-    // lowRow_ + rowSpan_ - 1, so its slot is its row less lowRow_; one table
-    // lookup per sample instead of a lookup and a subtraction. Only the
-    // block's own indices are filled: the whole table would cost a quarter
-    // of counting a block.
-    std::vector<uint16_t> slots(kRowTableSize, 0);
-    for (int32_t i = firstIndex; i <= lastIndex; ++i)
-        slots[size_t(i)] = uint16_t(rowTable[i] - lowRow_);
-    const uint16_t* slotTable = slots.data();
+    uint32_t* second = first + rows;
+    uint32_t* third = second + rows;
+    uint32_t* fourth = third + rows;
     // Four samples per load, each table index cut out of the word.
-    const auto slotAt = [slotTable](uint64_t word, int shift) { return size_t(slotTable[(word >> shift) & 0x1fff]); };
+    const auto rowAt = [rowTable](uint64_t word, int shift) {
+        return size_t(uint16_t(rowTable[(word >> shift) & 0x1fff]));
+    };
     for (int64_t chunk = 0; chunk < chunks_; ++chunk) {
         const int16_t* sample = samples + chunk * chunkSize;
         // Chunks hold a multiple of four samples.
@@ -132,14 +129,14 @@ void BlockSummary::CountChunks(const int16_t* samples, const int16_t* rowTable, 
             uint64_t word;
             std::memcpy(&word, sample + i, sizeof(word));
             word ^= 0x8000800080008000ull;
-            ++first[slotAt(word, 3)];
-            ++second[slotAt(word, 19)];
-            ++third[slotAt(word, 35)];
-            ++fourth[slotAt(word, 51)];
+            ++first[rowAt(word, 3)];
+            ++second[rowAt(word, 19)];
+            ++third[rowAt(word, 35)];
+            ++fourth[rowAt(word, 51)];
         }
         uint16_t* boundary = running_.data() + size_t(chunk + 1) * span;
         for (size_t row = 0; row < span; ++row)
-            boundary[row] = uint16_t(first[row] + second[row] + third[row] + fourth[row]);
+            boundary[row] = uint16_t(first[low + row] + second[low + row] + third[low + row] + fourth[low + row]);
     }
 }
 

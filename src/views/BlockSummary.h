@@ -61,8 +61,8 @@ private:
     static constexpr int kRowTableSize = 8192;
     static constexpr int kSmallestChunkShift = 8;
 
-    /// Every sample's table index lies in firstIndex..lastIndex.
-    void CountChunks(const int16_t* samples, const int16_t* rowTable, int32_t firstIndex, int32_t lastIndex);
+    /// Every sample's row lies in lowRow_ .. lowRow_ + rowSpan_ - 1.
+    void CountChunks(const int16_t* samples, const int16_t* rowTable);
 
     uint64_t tableKey_ = 0;
     int32_t lowRow_ = 0;
