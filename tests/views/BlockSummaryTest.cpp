@@ -100,6 +100,28 @@ TEST(BlockSummary, ALoneLoudSampleAnywhereIsCountedInItsRow)
     }
 }
 
+// The views build tables whose rows grow with the sample, but a summary
+// takes any table: the rows it keeps are those of every entry its samples
+// can reach, wherever in that stretch the lowest and highest rows lie.
+TEST(BlockSummary, AScrambledTableIsCountedAsByHand)
+{
+    RowTable table{};
+    std::mt19937 random(7);
+    for (int16_t& row : table)
+        row = int16_t(random() % 200u);
+    for (int amplitude : {5, 120, 3000, 32768}) {
+        const auto block = NoiseBlock(4096 + 12, uint32_t(amplitude), amplitude);
+        const auto summary = BlockSummary::Make(block->Samples(), block->Count(), table.data(), 1);
+        ASSERT_NE(summary, nullptr);
+        const int64_t summarised = summary->CountChunks() * summary->ChunkSize();
+        std::vector<uint32_t> counts(200, 0);
+        summary->AddChunks(counts.data(), 199, 0, summary->CountChunks());
+        const std::vector<uint16_t> expected = CountedByHand(*block, table, 200, 0, summarised);
+        for (size_t row = 0; row < counts.size(); ++row)
+            ASSERT_EQ(uint16_t(counts[row]), expected[row]) << amplitude << " row " << row;
+    }
+}
+
 TEST(BlockSummary, RefusesBlocksOutsideItsLimits)
 {
     const RowTable table = TableFor(100);
