@@ -3,6 +3,7 @@
 #include <array>
 #include <memory>
 #include <random>
+#include <string>
 #include <vector>
 
 #include "sound/SampleBlock.h"
@@ -52,6 +53,20 @@ std::vector<uint16_t> Counted(RowCounter& counter, const SampleSpan& span, int s
     return counts;
 }
 
+/// Every row of the summary's whole chunks, for a 200-row view, holds what
+/// counting those samples one at a time gives.
+void ExpectWholeChunksAsByHand(const SampleBlock& block, const RowTable& table, const std::string& context)
+{
+    const auto summary = BlockSummary::Make(block.Samples(), block.Count(), table.data(), 1);
+    ASSERT_NE(summary, nullptr) << context;
+    const int64_t summarised = summary->CountChunks() * summary->ChunkSize();
+    std::vector<uint32_t> counts(200, 0);
+    summary->AddChunks(counts.data(), 199, 0, summary->CountChunks());
+    const std::vector<uint16_t> expected = CountedByHand(block, table, 200, 0, summarised);
+    for (size_t row = 0; row < counts.size(); ++row)
+        ASSERT_EQ(uint16_t(counts[row]), expected[row]) << context << " row " << row;
+}
+
 TEST(BlockSummary, StaysWithinAQuarterOfItsBlock)
 {
     for (int rows : {1, 15, 200, 2001}) {
@@ -87,14 +102,8 @@ TEST(BlockSummary, ALoneLoudSampleAnywhereIsCountedInItsRow)
             for (int16_t loud : {int16_t(32767), int16_t(-32768)}) {
                 std::shared_ptr<SampleBlock> block = NoiseBlock(count, uint32_t(count + position), 100);
                 block->MutableSamples()[position] = loud;
-                const auto summary = BlockSummary::Make(block->Samples(), block->Count(), table.data(), 1);
-                ASSERT_NE(summary, nullptr);
-                const int64_t summarised = summary->CountChunks() * summary->ChunkSize();
-                std::vector<uint32_t> counts(200, 0);
-                summary->AddChunks(counts.data(), 199, 0, summary->CountChunks());
-                const std::vector<uint16_t> expected = CountedByHand(*block, table, 200, 0, summarised);
-                for (size_t row = 0; row < counts.size(); ++row)
-                    ASSERT_EQ(uint16_t(counts[row]), expected[row]) << count << " " << position << " " << loud << " row " << row;
+                ExpectWholeChunksAsByHand(*block, table,
+                    std::to_string(count) + " " + std::to_string(position) + " " + std::to_string(loud));
             }
         }
     }
@@ -111,14 +120,7 @@ TEST(BlockSummary, AScrambledTableIsCountedAsByHand)
         row = int16_t(random() % 200u);
     for (int amplitude : {5, 120, 3000, 32768}) {
         const auto block = NoiseBlock(4096 + 12, uint32_t(amplitude), amplitude);
-        const auto summary = BlockSummary::Make(block->Samples(), block->Count(), table.data(), 1);
-        ASSERT_NE(summary, nullptr);
-        const int64_t summarised = summary->CountChunks() * summary->ChunkSize();
-        std::vector<uint32_t> counts(200, 0);
-        summary->AddChunks(counts.data(), 199, 0, summary->CountChunks());
-        const std::vector<uint16_t> expected = CountedByHand(*block, table, 200, 0, summarised);
-        for (size_t row = 0; row < counts.size(); ++row)
-            ASSERT_EQ(uint16_t(counts[row]), expected[row]) << amplitude << " row " << row;
+        ExpectWholeChunksAsByHand(*block, table, "amplitude " + std::to_string(amplitude));
     }
 }
 
